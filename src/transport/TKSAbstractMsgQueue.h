@@ -1,0 +1,20 @@
+// The interface of a transport under TKSMsgQueue.
+#ifndef LINEPROBE_TRANSPORT_TKSABSTRACTMSGQUEUE_H
+#define LINEPROBE_TRANSPORT_TKSABSTRACTMSGQUEUE_H
+
+#include "platform/tkhost/tkhost.h"
+
+class TKSAbstractMsgQueue {
+  public:
+    // Blocks for the next message; 0 when *out holds a new block that the caller now owns.
+    virtual int msgRead(TKMsg32Bit** out) = 0;
+    // 0: the block went to the transport. Any other status: it stays with the caller.
+    virtual int msgWrite(TKMsg32Bit* msg) = 0;
+    virtual ~TKSAbstractMsgQueue() = default;
+    // Makes a blocked msgRead return at shutdown.
+    virtual void sendLastMessage() {}
+
+    TKCompDesc hostDesc{};
+};
+
+#endif

@@ -1,0 +1,90 @@
+// One transport and one reader thread: sends, and sorts what arrives into the awaited reply and
+// everything else, which goes to the registered callback.
+#ifndef LINEPROBE_TRANSPORT_TKSMSGQUEUE_H
+#define LINEPROBE_TRANSPORT_TKSMSGQUEUE_H
+
+#include <condition_variable>
+#include <mutex>
+#include <string>
+
+#include "transport/TKSAbstractMsgQueue.h"
+#include "transport/TKSCommon.h"
+#include "transport/TKSMsgRef.h"
+
+class TKSMsgQueue : public TKSRunnable {
+  public:
+    class CreationError : public TKSResource_CreationError {
+      public:
+        explicit CreationError(const char* hostName);
+        const char* getHostName() const { return hostName; }
+
+      private:
+        char hostName[100];
+    };
+
+    // remoteHost null: "REMOTE_TKHOST" decides; a host whose name begins with "HOST" is this one.
+    TKSMsgQueue(TKCompDesc addr, unsigned int maxRetMsgSize, unsigned int depth,
+                const char* remoteHost);
+    ~TKSMsgQueue() override;
+    TKSMsgQueue(const TKSMsgQueue&) = delete;
+    TKSMsgQueue& operator=(const TKSMsgQueue&) = delete;
+
+    // Sends msg's block (taken over in every outcome) and waits up to timeoutMs for the reply:
+    // same transaction id, type 0, 0x800001 or retMsgType, from msg's target unless anySource.
+    // Returns a handle on the reply (the caller owns the block) or an empty handle on time-out.
+    // timeoutMs 0 sends and returns a new empty message of size 0 at once.
+    TKSMsgRef request(TKSMsgRef& msg, unsigned int timeoutMs, unsigned int retMsgType,
+                      int anySource);
+
+    // Registering one kind of callback clears the other, so a block has one owner.
+    void registerAsyncCallback(TKSAsyncMsgReceiver* obj, TKSAsyncMethod method);
+    void registerAsyncFunction(TKSAsyncFn fn);
+    TKCompDesc getHostDesc() const { return hostDesc; }
+
+    // Blocks left for a direct reader while no callback is registered: waits up to timeoutMs,
+    // returns an empty handle if none came.
+    TKSMsgRef pickup(unsigned int timeoutMs);
+
+    // Exceptions that left a callback and were reported, for tests and diagnostics.
+    unsigned int callbackFailures() const;
+    // True once the transport failed for good and the reader stopped receiving.
+    bool transportFailed() const;
+
+  private:
+    void* readNroute(void* control, void* arg);
+    void route(TKMsg32Bit* block);
+    void deliverAsync(TKMsg32Bit* block);
+    void waitForStop();
+
+    TKSThread readerThread;
+    TKSAbstractMsgQueue* transport = nullptr;
+    TKCompDesc hostDesc{};
+
+    mutable std::mutex callbackLock;
+    TKSAsyncFn asyncFn = nullptr;
+    TKSAsyncMsgReceiver* asyncObj = nullptr;
+    TKSAsyncMethod asyncMethod = nullptr;
+
+    // The wait record, the reply slot and the pickup slot.
+    mutable std::mutex waitLock;
+    TKMsg32Bit* replySlot = nullptr;
+    TKMsg32Bit* pickupSlot = nullptr;
+    unsigned int waitTrans = 0;
+    unsigned int waitRetType = 0;
+    TKCompDesc waitTarget{};
+    bool waiting = false;
+    int waitAnySource = 0;
+    unsigned int failures = 0;
+    bool failed = false;
+
+    std::mutex stopLock;
+    std::condition_variable stopCond;
+    bool stop = false;
+    bool readerDone = false;
+
+    TKSMutex replyGate;
+    TKSMutex pickupReady;
+    TKSMutex pickupFree;
+};
+
+#endif

@@ -1,0 +1,53 @@
+// Transport over one TCP connection to a relay host.
+#ifndef LINEPROBE_TRANSPORT_TKSREMOTEMSGQUEUE_H
+#define LINEPROBE_TRANSPORT_TKSREMOTEMSGQUEUE_H
+
+#include <atomic>
+#include <mutex>
+
+#include "transport/TKSAbstractMsgQueue.h"
+#include "transport/TKSCommon.h"
+
+class sock;
+
+class TKSRemoteService_ComFailure : public TKSException {
+  public:
+    TKSRemoteService_ComFailure(const char* hostName, int port);
+    const char* getHostName() const { return hostName; }
+    int getPort() const { return port; }
+
+  private:
+    char hostName[100];
+    int port;
+};
+
+class TKSRemoteMsgQueue : public TKSAbstractMsgQueue {
+  public:
+    // hostName: a name or dotted address, optionally ":port" (decimal, or hex with an x).
+    TKSRemoteMsgQueue(TKCompDesc addr, unsigned int maxRetMsgSize, unsigned int depth,
+                      const char* hostName);
+    ~TKSRemoteMsgQueue() override;
+
+    int msgRead(TKMsg32Bit** out) override;
+    int msgWrite(TKMsg32Bit* msg) override;
+    // Runs the close exchange while the reader still reads (it collects the acknowledgement),
+    // then wakes the reader for good.
+    void sendLastMessage() override;
+
+    const char* getHostName() const { return hostName; }
+    int getPort() const { return port; }
+
+  private:
+    bool sendClose();
+
+    char* hostName = nullptr;
+    int retries = 10;
+    int port = 6554;
+    TKSMutex closeSignal;
+    sock* socket = nullptr;
+    std::mutex writeLock;
+    std::atomic<bool> closeSent{false};
+    std::atomic<bool> closing{false};
+};
+
+#endif

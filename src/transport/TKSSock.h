@@ -1,0 +1,72 @@
+// The small TCP socket wrapper under the remote transport, and its text helpers.
+#ifndef LINEPROBE_TRANSPORT_TKSSOCK_H
+#define LINEPROBE_TRANSPORT_TKSSOCK_H
+
+#include <netinet/in.h>
+
+#include <atomic>
+#include <cstddef>
+
+#include "transport/TKSFrame.h"
+
+class sock {
+  public:
+    sock(const char* name, int port);
+    sock(unsigned long address, int port);
+    sock(int fd, sockaddr_in& peer);
+    explicit sock(int fd);
+    sock();
+    ~sock();
+    sock(const sock&) = delete;
+    sock& operator=(const sock&) = delete;
+
+    int connect();
+    int close();
+    int shutdown(int how);
+
+    int bind();
+    int listen(int backlog);
+    sock* accept();
+    sock* accept(sockaddr_in& peer);
+
+    // mode 'r', 'w' or 'e'; -1 and -1 mean no time limit.
+    bool ready(char mode, long seconds, long microseconds);
+    bool ready(long seconds, long microseconds) { return ready('r', seconds, microseconds); }
+
+    // 0 when all bytes moved; a negative result on error; the bytes still missing when the peer
+    // closed. Either failure sets `failed`.
+    long readblock(void* dst, long n);
+    long writeblock(const void* src, long n);
+
+    int snd_msg(const msg_t& m);
+    int get_msg(msg_t& m);
+
+    // Makes a blocked readblock return a failure from now on (used at shutdown).
+    void interrupt();
+
+    int getFd() const { return fd; }
+    bool isFailed() const { return failed.load() != 0; }
+    int getPort() const { return ntohs(peer.sin_port); }
+
+  private:
+    friend class SockByteSource;
+
+    void makeSocket(unsigned long address, int port);
+
+    int fd = 0;
+    std::atomic<int> failed{0};
+    std::atomic<bool> interrupted{false};
+    sockaddr_in peer{};
+    // Received bytes not yet handed out: fewer system calls per frame.
+    unsigned char inBuf[16384];
+    std::size_t inPos = 0;
+    std::size_t inLen = 0;
+};
+
+bool is_dn(const char* text);
+void dntoip(char* dst, const char* name);  // dst needs 16 bytes
+int stn(const char* text);
+void print_msg(const char* title, const msg_t& m);
+void byte_print_msg(const char* bytes, int n);
+
+#endif
