@@ -1,0 +1,18 @@
+#pragma once
+
+#include "catalogue/tsc/TSC.h"
+#include "model/EventPublication.h"
+
+namespace vx7diag {
+
+class TSCCallState : public EventPublication<TSCCallState, tolk::TSC::EvtCallState_t> {
+  public:
+    static constexpr int ComponentKind = VX7EventPublisher::TSC_COMPONENT;
+    static constexpr unsigned int GroupNumber = 0x1230;
+
+    ~TSCCallState() override;
+    tolk::staticList<unsigned int> EventTypeList() const override;
+    void Format(char* text);
+};
+
+}  // namespace vx7diag
