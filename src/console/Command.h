@@ -1,0 +1,32 @@
+#pragma once
+
+#include <string>
+
+namespace lineprobe {
+
+class View;
+
+// A command of the prompt. The processor calls the Execute overload that matches the
+// number of fields the operator typed; a command gives a field count meaning by
+// overriding that overload. The base versions do nothing and return 0. A result other
+// than 0 tells the processor to stop. Commands live until the process ends.
+class Command {
+  public:
+    explicit Command(std::string name) : name_(std::move(name)) {}
+
+    virtual std::string GetCommandName();
+    virtual int Execute();
+    virtual int Execute(int board, int line);
+    virtual int Execute(int board, int line, int chan);
+    virtual int Execute(int board, int line, int chan, char* text);
+    virtual int Execute(std::string text);
+
+    // The window on which the command reports; a null view is ignored.
+    void SetView(View* view);
+
+  protected:
+    View* view_ = nullptr;
+    std::string name_;
+};
+
+}  // namespace lineprobe

@@ -1,0 +1,55 @@
+#include "console/HelpCmd.h"
+
+#include <sys/wait.h>
+
+#include <cstdlib>
+#include <iostream>
+
+#include "console/ConsoleDisplay.h"
+
+namespace lineprobe {
+
+std::optional<std::string> HelpCmd::BuildPagerCommand(const std::string& directory,
+                                                      const std::string& fileName) {
+    std::string command = "less " + directory + "bin/" + fileName;
+    if (command.size() >= MAX_FILENAME_SIZE) {
+        return std::nullopt;
+    }
+    return command;
+}
+
+int HelpCmd::Execute() {
+    ConsoleDisplay* display = ConsoleDisplay::GetDisplay();
+    display->Suspend();
+
+    const char* directory = std::getenv(envVarName_);
+    if (directory != nullptr) {
+        orvaneDir_ = directory;
+        const std::optional<std::string> command = BuildPagerCommand(orvaneDir_, helpFileName_);
+        if (!command) {
+            std::cerr << "help not shown: the pager command line for " << envVarName_ << "="
+                      << orvaneDir_ << " would be longer than " << MAX_FILENAME_SIZE - 1
+                      << " characters" << std::endl;
+        } else {
+            std::cout << *command << std::endl;
+            // The pager's own messages (a missing file, say) are on the screen it
+            // leaves; the log only records that it did not end cleanly.
+            const int status = std::system(command->c_str());
+            if (status == -1) {
+                std::cerr << "help: unable to run \"" << *command << "\"" << std::endl;
+            } else if (!WIFEXITED(status) || WEXITSTATUS(status) != 0) {
+                std::cerr << "help: \"" << *command << "\" ended with status "
+                          << (WIFEXITED(status) ? WEXITSTATUS(status) : -1) << std::endl;
+            }
+        }
+    }
+
+    display->Resume();
+    return 0;
+}
+
+int HelpCmd::Execute(int, int, int) {
+    return 0;
+}
+
+}  // namespace lineprobe

@@ -1,0 +1,97 @@
+#include "console/Lifecycle.h"
+
+#include <unistd.h>
+
+#include <atomic>
+#include <chrono>
+#include <csignal>
+#include <cstdlib>
+#include <iostream>
+#include <string>
+#include <thread>
+
+#include "console/ConsoleDisplay.h"
+#include "console/DisplayGuard.h"
+#include "console/Version.h"
+#include "console/View.h"
+
+lineprobe::ConsoleDisplay* g_curDisplay = nullptr;
+lineprobe::View* g_CmdProcessorView = nullptr;
+
+namespace {
+
+constexpr const char* USAGE =
+    "for help on using lineprobe, look in /usr/orvane/bin/lineprobe_help.txt";
+
+const char* TerminationLine(int sig) {
+    switch (sig) {
+        case SIGINT:
+            return "terninating app due to SIGINT";
+        case SIGTERM:
+            return "terninating app due to SIGTERM";
+        case SIGUSR1:
+            return "terninating app due to SIGUSR1";
+        default:
+            return "terninating app due to an unexpected signal";
+    }
+}
+
+std::atomic<std::thread::id> g_terminatingThread{};
+
+}  // namespace
+
+int ProcessCmdLineArgs(int argc, char** argv) {
+    if (argc > 2) {
+        std::cout << "invalid argument count" << std::endl;
+        std::cout << "valid arguments are:" << std::endl;
+        std::cout << "-v\tshow version" << std::endl;
+        std::cout << "-h\thelp info " << std::endl;
+        return 0;
+    }
+    for (int i = 0; i < argc; ++i) {
+        const std::string arg = argv[i];
+        if (arg == "-v") {
+            std::cout << lineprobe::LINEPROBE_VERSION_STR << std::endl;
+        } else if (arg == "-h") {
+            std::cout << USAGE << std::endl;
+        } else {
+            std::cout << "invalid argument" << std::endl;
+            std::cout << USAGE << std::endl;
+            return i;
+        }
+    }
+    return argc;
+}
+
+void terminate_app(int sig) {
+    // A second signal while the shutdown runs: on the same thread (it interrupted the
+    // handler) the first shutdown must be let go on; on another thread, wait for the
+    // first one to end the process, so that no caller (quit among them) returns.
+    std::thread::id none{};
+    if (!g_terminatingThread.compare_exchange_strong(none, std::this_thread::get_id())) {
+        if (none == std::this_thread::get_id()) {
+            return;
+        }
+        for (;;) {
+            pause();
+        }
+    }
+
+    std::cout << TerminationLine(sig) << std::endl;
+
+    const std::chrono::milliseconds wait(SHUTDOWN_DISPLAY_WAIT_MS);
+    if (g_CmdProcessorView != nullptr) {
+        lineprobe::DisplayGuard guard(wait);
+        g_CmdProcessorView->PrintString("starting app shutdown", 2, 1);
+    }
+
+    // The phone and trunk view managers stop all their views here, once they exist
+    // (DestroyAllPhoneViews, then DestroyAllTrunkViews), without the display lock:
+    // stopping a view waits for the board, whose events need the screen.
+
+    if (g_curDisplay != nullptr) {
+        lineprobe::DisplayGuard guard(wait);
+        g_curDisplay->Stop();
+    }
+    std::exit(1);
+}
