@@ -11,7 +11,10 @@ class TKSAbstractMsgQueue {
     // 0: the block went to the transport. Any other status: it stays with the caller.
     virtual int msgWrite(TKMsg32Bit* msg) = 0;
     virtual ~TKSAbstractMsgQueue() = default;
-    // Makes a blocked msgRead return at shutdown.
+    // At shutdown, while the reader still reads: anything the transport must exchange before
+    // it goes (the relay's close handshake).
+    virtual void closeExchange() {}
+    // At shutdown, after the reader has been told to stop: makes a blocked msgRead return.
     virtual void sendLastMessage() {}
 
     TKCompDesc hostDesc{};

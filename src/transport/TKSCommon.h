@@ -135,6 +135,10 @@ void TKSAbandonedThread_create(TKSThread::PlainBody fn, void* arg, unsigned int 
 void TKSAbandonedThread_create(void* obj, TKSThread::MemberBody fn, void* arg,
                                unsigned int stackSize);
 
+// Programming errors stop the process in every build type, naming the expression and the file.
+[[noreturn]] void tksAssertFail(const char* expr, const char* file, int line);
+#define TKS_ASSERT(expr) ((expr) ? (void)0 : tksAssertFail(#expr, __FILE__, __LINE__))
+
 TKStatus TKSHostInit();
 void TKSHostCleanup();
 

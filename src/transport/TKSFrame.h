@@ -72,6 +72,9 @@ TKSReadResult tksReadFrame(TKSByteSource& src, msg_t& m);
 // Message frame (1001): the 56-byte header of 14 words and the body bytes as they stand.
 void tksPackMsgHeader(const TKMsg32Bit* block, unsigned char out[TKS_MSG_HEADER_BYTES]);
 msg_t tksMakeMessageFrame(const TKMsg32Bit* block);  // body and ex point into a fresh copy
+// The whole 1001 frame of a block into out (reusing its storage); false, and out empty, if the
+// body is over the limit.
+bool tksEncodeMessageFrame(const TKMsg32Bit* block, std::vector<unsigned char>& out);
 // A new block from a received message frame, or null if the frame isn't a well-formed message
 // (body not 56 bytes, word 13 not ex_size, or no memory).
 TKMsg32Bit* tksBlockFromFrame(const msg_t& m);

@@ -55,6 +55,7 @@ class TKSMsgQueue : public TKSRunnable {
     void route(TKMsg32Bit* block);
     void deliverAsync(TKMsg32Bit* block);
     void waitForStop();
+    bool stopping();
 
     TKSThread readerThread;
     TKSAbstractMsgQueue* transport = nullptr;

@@ -4,6 +4,7 @@
 
 #include <atomic>
 #include <mutex>
+#include <vector>
 
 #include "transport/TKSAbstractMsgQueue.h"
 #include "transport/TKSCommon.h"
@@ -30,8 +31,9 @@ class TKSRemoteMsgQueue : public TKSAbstractMsgQueue {
 
     int msgRead(TKMsg32Bit** out) override;
     int msgWrite(TKMsg32Bit* msg) override;
-    // Runs the close exchange while the reader still reads (it collects the acknowledgement),
-    // then wakes the reader for good.
+    // Sends the close and waits up to 5 s for its acknowledgement, which the reader collects.
+    void closeExchange() override;
+    // Makes every read fail from now on, so that a blocked reader returns.
     void sendLastMessage() override;
 
     const char* getHostName() const { return hostName; }
@@ -48,6 +50,8 @@ class TKSRemoteMsgQueue : public TKSAbstractMsgQueue {
     std::mutex writeLock;
     std::atomic<bool> closeSent{false};
     std::atomic<bool> closing{false};
+    std::atomic<bool> readerGone{false};
+    std::vector<unsigned char> outFrame;
 };
 
 #endif

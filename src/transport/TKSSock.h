@@ -47,13 +47,15 @@ class sock {
     int getFd() const { return fd; }
     bool isFailed() const { return failed.load() != 0; }
     int getPort() const { return ntohs(peer.sin_port); }
+    // The port this socket is bound to (a server bound to port 0 learns its port here).
+    int localPort() const;
 
   private:
     friend class SockByteSource;
 
     void makeSocket(unsigned long address, int port);
 
-    int fd = 0;
+    int fd = -1;
     std::atomic<int> failed{0};
     std::atomic<bool> interrupted{false};
     sockaddr_in peer{};
