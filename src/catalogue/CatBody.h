@@ -1,0 +1,225 @@
+#pragma once
+
+// Table-driven marshalling shared by every body of the catalogue. catgen.py writes one
+// BodyDesc per body; the walker below is the only code that turns a table into field calls.
+
+#include <cstdint>
+#include <ostream>
+
+#include "framework/CompAttr_t.h"
+#include "framework/CompDesc_t.h"
+#include "framework/Marshal.h"
+#include "framework/Msg.h"
+#include "framework/MsgBody.h"
+#include "framework/staticList.h"
+
+namespace tolk::cat {
+
+// Bumped whenever the meaning of the tables changes; generated files assert it.
+inline constexpr unsigned int kFormatVersion = 3;
+
+// A word that holds either a small value or the address of an object allocated by readMsg.
+// It is pointer-sized so that an address survives on 64-bit hosts.
+using ValueWord = std::uintptr_t;
+
+enum class Kind : std::uint8_t {
+    Scalar,        // one number, typeCode gives the width
+    Contained,     // a CompDesc_t
+    Fixed,         // char[n] / u8[n]
+    CountedList,   // list whose length stands in field `ref`
+    TrailingList,  // list that runs to the end of the message
+    DescValue,     // value shaped by the descriptor word in field `ref`
+    Custom,        // hand-written field, see FieldOps
+};
+
+// Operations on one staticList<T>, erased so that one walker serves every list type.
+struct ListOps {
+    unsigned int (*length)(const void* list);
+    void (*resize)(void* list, unsigned int n);
+    unsigned int (*write)(void* list, Msg* m, unsigned int off, bool first);
+    // Reads exactly the first n elements (the list already has at least n).
+    unsigned int (*read)(void* list, Msg* m, unsigned int off, unsigned int n, bool first);
+    // Reads elements until the end of the message; the list keeps its length.
+    unsigned int (*readToEnd)(void* list, Msg* m, unsigned int off, bool first);
+    unsigned int (*byteSize)(const void* list);
+    void (*assign)(void* dst, const void* src);
+    void (*print)(const void* list, std::ostream* os);
+    unsigned int minWire;  // smallest element on the wire, > 0; caps counts from the wire
+    bool scalars;          // elements are numbers (a trailing run is then size / minWire)
+};
+
+class Owned;
+struct BodyDesc;
+
+// A hand-written field. `refs` are the body's field pointers, `idx` the field's own index.
+struct FieldOps {
+    unsigned int (*write)(const BodyDesc& d, void* const* refs, unsigned int idx, Msg* m,
+                          unsigned int off, bool first);
+    unsigned int (*read)(const BodyDesc& d, void* const* refs, unsigned int idx, Owned& owned,
+                         Msg* m, unsigned int off, bool first);
+    unsigned int (*size)(const BodyDesc& d, void* const* refs, unsigned int idx);
+    void (*print)(const BodyDesc& d, void* const* refs, unsigned int idx, std::ostream* os);
+    // Deep copy of the field's value from src into dst (the other fields are already copied).
+    void (*copy)(const BodyDesc& d, void* const* dst, void* const* src, unsigned int idx,
+                 Owned& owned);
+};
+
+struct Field {
+    const char* label;
+    Kind kind;
+    std::uint8_t typeCode;  // element type code for numbers, fixed runs and scalar lists
+    std::uint16_t fixedLen;
+    std::int8_t ref;  // count field, descriptor field or the custom field's argument; -1 if none
+    const ListOps* list;
+    const FieldOps* custom;
+};
+
+struct BodyDesc {
+    const char* name;
+    unsigned int type;  // message type or event group; 0 for element bodies
+    const Field* fields;
+    unsigned int count;
+};
+
+// Objects that readMsg allocated for a body and that go with it. Each entry remembers the
+// word that received the address so that the word can be cleared when the object goes.
+class Owned {
+  public:
+    Owned() = default;
+    Owned(const Owned&) = delete;
+    Owned& operator=(const Owned&) = delete;
+    ~Owned() { clear(); }
+
+    void adopt(ValueWord* word, virtualObject* obj);
+    // Deletes what was adopted for this word, if anything, and clears the word.
+    void release(ValueWord* word);
+    void clear();
+
+  private:
+    static constexpr unsigned int kMax = 4;
+    struct Entry {
+        ValueWord* word;
+        virtualObject* obj;
+    };
+    Entry entries_[kMax]{};
+    unsigned int n_ = 0;
+};
+
+[[nodiscard]] unsigned int writeBody(const BodyDesc& d, void* const* refs, Msg* m,
+                                     unsigned int off);
+[[nodiscard]] unsigned int readBody(const BodyDesc& d, void* const* refs, Owned* owned, Msg* m,
+                                    unsigned int off);
+[[nodiscard]] unsigned int sizeBody(const BodyDesc& d, void* const* refs);
+void printBody(const BodyDesc& d, void* const* refs, std::ostream* os);
+void copyBody(const BodyDesc& d, void* const* dst, void* const* src, Owned* owned);
+
+// Width in bytes of an element of a type code, as bodies work it out.
+constexpr unsigned int codeWidth(unsigned int t) {
+    return (t == 0 || t == 4 || t == 10) ? 1 : (t == 1 || t == 5) ? 2 : 4;
+}
+
+// Bytes left in the message behind `off`; 0 when `off` is at or beyond the end.
+unsigned int bytesLeft(Msg* m, unsigned int off);
+
+// Elements of a count from the wire that can really follow: never more than the bytes left.
+inline unsigned int capCount(Msg* m, unsigned int off, unsigned int count, unsigned int minWire) {
+    unsigned int fit = bytesLeft(m, off) / (minWire == 0 ? 1 : minWire);
+    return count < fit ? count : fit;
+}
+
+// Reads a trailing run of contained bodies: sized to the bytes left as an upper bound, then
+// read until the end of the message. Stops if an element fails to advance.
+template <class T>
+unsigned int readBodiesToEnd(staticList<T>& l, Msg* m, unsigned int off);
+
+// ---- ListOps for the list types of the catalogue ----
+
+template <class T, unsigned int Code>
+struct ScalarList {
+    using L = staticList<T>;
+    static unsigned int length(const void* l) { return static_cast<const L*>(l)->length(); }
+    static void resize(void* l, unsigned int n) { static_cast<L*>(l)->realloc(n); }
+    static unsigned int write(void* l, Msg* m, unsigned int off, bool first) {
+        return putList<T>(m, off, Code, *static_cast<L*>(l), first);
+    }
+    static unsigned int read(void* l, Msg* m, unsigned int off, unsigned int n, bool first) {
+        return getList<T>(m, off, Code, *static_cast<L*>(l), n, first);
+    }
+    static unsigned int readToEnd(void* l, Msg* m, unsigned int off, bool first) {
+        unsigned int n = bytesLeft(m, off) / codeWidth(Code);
+        return getList<T>(m, off, Code, *static_cast<L*>(l), n, first);
+    }
+    static unsigned int byteSize(const void* l) {
+        return static_cast<const L*>(l)->length() * codeWidth(Code);
+    }
+    static void assign(void* d, const void* s) { *static_cast<L*>(d) = *static_cast<const L*>(s); }
+    static void print(const void* l, std::ostream* os) { static_cast<const L*>(l)->toStream(os); }
+    static constexpr ListOps ops{length, resize, write,           read, readToEnd, byteSize,
+                                 assign, print,  codeWidth(Code), true};
+};
+
+template <class T>
+struct minWireOf {
+    static constexpr unsigned int value = T::kMinWireSize;
+};
+
+template <>
+struct minWireOf<CompDesc_t> {
+    static constexpr unsigned int value = 6;
+};
+template <>
+struct minWireOf<CompAttr_t> {
+    static constexpr unsigned int value = 8;
+};
+
+template <class T>
+struct BodyList {
+    using L = staticList<T>;
+    static unsigned int length(const void* l) { return static_cast<const L*>(l)->length(); }
+    static void resize(void* l, unsigned int n) { static_cast<L*>(l)->realloc(n); }
+    static unsigned int write(void* l, Msg* m, unsigned int off, bool) {
+        L& list = *static_cast<L*>(l);
+        for (unsigned int i = 0; i < list.length(); ++i) {
+            off = list[i]->writeMsg(m, off);
+        }
+        return off;
+    }
+    static unsigned int read(void* l, Msg* m, unsigned int off, unsigned int n, bool) {
+        L& list = *static_cast<L*>(l);
+        for (unsigned int i = 0; i < n; ++i) {
+            off = list[i]->readMsg(m, off);
+        }
+        return off;
+    }
+    static unsigned int readToEnd(void* l, Msg* m, unsigned int off, bool) {
+        return readBodiesToEnd(*static_cast<L*>(l), m, off);
+    }
+    static unsigned int byteSize(const void* l) {
+        L& list = *const_cast<L*>(static_cast<const L*>(l));
+        unsigned int n = 0;
+        for (unsigned int i = 0; i < list.length(); ++i) {
+            n += list[i]->GetByteSize();
+        }
+        return n;
+    }
+    static void assign(void* d, const void* s) { *static_cast<L*>(d) = *static_cast<const L*>(s); }
+    static void print(const void* l, std::ostream* os) { static_cast<const L*>(l)->toStream(os); }
+    static constexpr ListOps ops{
+        length, resize, write, read, readToEnd, byteSize, assign, print, minWireOf<T>::value,
+        false};
+};
+
+template <class T>
+unsigned int readBodiesToEnd(staticList<T>& l, Msg* m, unsigned int off) {
+    l.realloc(bytesLeft(m, off));
+    for (unsigned int i = 0; i < l.length() && bytesLeft(m, off) > 0; ++i) {
+        unsigned int next = l[i]->readMsg(m, off);
+        if (next <= off) {
+            break;
+        }
+        off = next;
+    }
+    return off;
+}
+
+}  // namespace tolk::cat
