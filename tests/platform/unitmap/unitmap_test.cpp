@@ -1,0 +1,455 @@
+#include "platform/unitmap/unitmap.h"
+
+#include <gtest/gtest.h>
+
+#include <array>
+#include <bit>
+#include <cstdlib>
+#include <cstring>
+#include <fstream>
+#include <map>
+#include <string>
+#include <vector>
+
+#include "platform/farm/ActiveFarm.h"
+
+namespace {
+
+const std::string kFarms = LINEPROBE_FARMS_DIR;
+using Bytes = std::array<unsigned char, 8>;
+
+// Bytes of a TKCompDesc: instance in host order, board, 0, processor 1, component, node 0, 0.
+Bytes addr(unsigned instance, unsigned board, unsigned component) {
+    Bytes b = {0, 0, static_cast<unsigned char>(board), 0, 1, static_cast<unsigned char>(component),
+               0, 0};
+    const auto i = static_cast<uint16_t>(instance);
+    std::memcpy(b.data(), &i, sizeof i);
+    return b;
+}
+
+TEST(TKCompDescBytes, InstanceInHostOrder) {
+    const Bytes little = {0x34, 0x12, 5, 0, 1, 22, 0, 0};
+    const Bytes big = {0x12, 0x34, 5, 0, 1, 22, 0, 0};
+    EXPECT_EQ(addr(0x1234, 5, 22), std::endian::native == std::endian::little ? little : big);
+}
+
+class DeviceMap : public ::testing::Test {
+  protected:
+    void SetUp() override { use(""); }
+    void TearDown() override {
+        ::unsetenv(farm::kFarmEnvironment);
+        farm::resetActiveFarm();
+    }
+
+    static void use(const std::string& file) {
+        if (file.empty()) {
+            ::unsetenv(farm::kFarmEnvironment);
+        } else {
+            ::setenv(farm::kFarmEnvironment, file.c_str(), 1);
+        }
+        farm::resetActiveFarm();
+    }
+
+    static UM_AUID host() {
+        UM_AUID h = 0;
+        EXPECT_EQ(um_getHostAU(&h), UM_SUCCESS);
+        return h;
+    }
+
+    // The board search of the system view: CTPLATFORM "VX7" and LOGICAL ID, room for one.
+    static std::vector<UM_AUID> findBoard(unsigned id, int* status = nullptr) {
+        char platform[4] = "VX7";
+        unsigned logical = id;
+        um_attribute search[2];
+        um_initAttributeStruct(&search[0], "CTPLATFORM", platform, 4, 0, 0);
+        um_initAttributeStruct(&search[1], "LOGICAL ID", &logical, 4, 0, 0);
+        uint32_t count = 1;
+        UM_AUID found[1] = {0};
+        int s = um_findAUs(host(), 2, search, &count, found);
+        if (status) {
+            *status = s;
+        }
+        return std::vector<UM_AUID>(found, found + (s == UM_SUCCESS ? count : 0));
+    }
+
+    static std::vector<UM_AUID> findType(UM_AUID parent, unsigned type, uint32_t room,
+                                         uint32_t size = 4) {
+        // A size of 5 over a 4-byte number is how the voice walk asks; only 4 bytes are read.
+        unsigned value = type;
+        um_attribute search;
+        um_initAttributeStruct(&search, "TYPE", &value, size, 0, 0);
+        std::vector<UM_AUID> found(room);
+        uint32_t count = room;
+        EXPECT_EQ(um_findAUs(parent, 1, &search, &count, found.data()), UM_SUCCESS);
+        found.resize(count);
+        return found;
+    }
+
+    static std::string text(UM_AUID au, const char* name) {
+        char buf[256] = {};
+        um_attribute a;
+        um_initAttributeStruct(&a, name, buf, sizeof buf, 0, 0);
+        EXPECT_EQ(um_getAttributes(au, 1, &a), UM_SUCCESS) << name;
+        return buf;
+    }
+
+    static unsigned number(UM_AUID au, const char* name) {
+        unsigned v = 0xDEADBEEF;
+        um_attribute a;
+        um_initAttributeStruct(&a, name, &v, 4, 0, 0);
+        EXPECT_EQ(um_getAttributes(au, 1, &a), UM_SUCCESS) << name;
+        return v;
+    }
+};
+
+TEST_F(DeviceMap, HostIsNamedAfterTheFarm) {
+    EXPECT_EQ(text(host(), "NAME"), "vx7-demo");
+}
+
+TEST_F(DeviceMap, SystemViewFindsExactlyTheFarmsBoards) {
+    std::map<unsigned, UM_AUID> boards;
+    for (unsigned id = 0; id <= 32; ++id) {
+        int status = -1;
+        auto found = findBoard(id, &status);
+        EXPECT_EQ(status, UM_SUCCESS) << id;
+        ASSERT_LE(found.size(), 1u);
+        if (!found.empty()) {
+            boards[id] = found[0];
+        }
+    }
+    ASSERT_EQ(boards.size(), 3u);
+    struct Expected {
+        unsigned id;
+        const char* name;
+        const char* serial;
+        unsigned trunks;
+    };
+    for (auto e : {Expected{1, "VX7/T1-2", "VX7-0001", 2}, Expected{2, "VX7/PRI-1", "VX7-0002", 1},
+                   Expected{3, "VX7/AN-8", "VX7-0003", 2}}) {
+        ASSERT_TRUE(boards.count(e.id)) << e.id;
+        UM_AUID b = boards[e.id];
+        EXPECT_EQ(text(b, "NAME"), e.name);
+        EXPECT_EQ(text(b, "SERIAL_NUMBER"), e.serial);
+        EXPECT_EQ(number(b, "NUM_TRUNKS"), e.trunks);
+        EXPECT_EQ(number(b, "LOGICAL ID"), e.id);
+        EXPECT_EQ(text(b, "CTPLATFORM"), "VX7");
+    }
+}
+
+TEST_F(DeviceMap, PlatformMustMatchWholly) {
+    char platform[5] = "VX70";
+    unsigned logical = 1;
+    um_attribute search[2];
+    um_initAttributeStruct(&search[0], "CTPLATFORM", platform, 5, 0, 0);
+    um_initAttributeStruct(&search[1], "LOGICAL ID", &logical, 4, 0, 0);
+    uint32_t count = 1;
+    UM_AUID found = 0;
+    EXPECT_EQ(um_findAUs(host(), 2, search, &count, &found), UM_SUCCESS);
+    EXPECT_EQ(count, 0u);
+}
+
+TEST_F(DeviceMap, LineAUsCarryChannelCountAndTheirLconAddress) {
+    UM_AUID board = findBoard(1).at(0);
+    auto lines = findType(board, 503, 64);
+    ASSERT_EQ(lines.size(), 2u);
+    for (unsigned i = 0; i < lines.size(); ++i) {
+        unsigned channels = 0;
+        Bytes admin{};
+        um_attribute a[2];
+        um_initAttributeStruct(&a[0], "ChannelCount", &channels, 4, 0, 0);
+        um_initAttributeStruct(&a[1], "LINEADMINADDR", admin.data(), 8, 0, 0);
+        ASSERT_EQ(um_getAttributes(lines[i], 2, a), UM_SUCCESS);
+        EXPECT_EQ(channels, 24u);
+        EXPECT_EQ(admin, addr(i + 1, 1, 22));
+        EXPECT_EQ(a[0].status, 0u);
+        EXPECT_EQ(a[1].status, 0u);
+    }
+    EXPECT_TRUE(findType(board, 501, 256, 5).empty());  // fixed routing: no voice resources
+}
+
+TEST_F(DeviceMap, AnalogLinesHaveFourChannels) {
+    UM_AUID board = findBoard(3).at(0);
+    auto lines = findType(board, 503, 64);
+    ASSERT_EQ(lines.size(), 2u);
+    EXPECT_EQ(number(lines[0], "ChannelCount"), 4u);
+    EXPECT_EQ(number(lines[1], "ChannelCount"), 4u);
+}
+
+TEST_F(DeviceMap, SearchStopsAtTheRoomGiven) {
+    UM_AUID board = findBoard(1).at(0);
+    auto lines = findType(board, 503, 1);
+    ASSERT_EQ(lines.size(), 1u);
+    EXPECT_EQ(number(lines[0], "ChannelCount"), 24u);
+    Bytes admin{};
+    um_attribute a;
+    um_initAttributeStruct(&a, "LINEADMINADDR", admin.data(), 8, 0, 0);
+    EXPECT_EQ(um_getAttributes(lines[0], 1, &a), UM_SUCCESS);
+    EXPECT_EQ(admin, addr(1, 1, 22));  // the first line, in tree order
+}
+
+const char* const kVoiceAttributes[] = {"SIGDETADDR",    "CLUSTERADDR", "SIGBUFADDR_DTMF",
+                                        "SIGBUFADDR_MF", "TONEGENADDR", "CALLANALYSISADDR",
+                                        "R2MFPADDR",     "CALLERIDADDR"};
+
+struct VoiceAu {
+    int status = -1;
+    uint32_t statuses[8] = {};
+    Bytes values[8] = {};
+};
+
+// The board manager's voice walk: groups of TYPE 501, up to 4 voice AUs of TYPE 502 in each,
+// the eight address attributes of each voice AU.
+std::vector<VoiceAu> voiceWalk(UM_AUID board) {
+    std::vector<VoiceAu> out;
+    unsigned groupType = 501, voiceType = 502;
+    um_attribute search;
+    um_initAttributeStruct(&search, "TYPE", &groupType, 5, 0, 0);
+    UM_AUID groups[256];
+    uint32_t groupCount = 256;
+    EXPECT_EQ(um_findAUs(board, 1, &search, &groupCount, groups), UM_SUCCESS);
+    uint32_t room = 4;
+    for (uint32_t g = 0; g < groupCount; ++g) {
+        um_initAttributeStruct(&search, "TYPE", &voiceType, 5, 0, 0);
+        UM_AUID voices[4];
+        EXPECT_EQ(um_findAUs(groups[g], 1, &search, &room, voices), UM_SUCCESS);
+        for (uint32_t v = 0; v < room; ++v) {
+            VoiceAu au;
+            um_attribute attrs[8];
+            for (int i = 0; i < 8; ++i) {
+                au.values[i].fill(0xAA);
+                um_initAttributeStruct(&attrs[i], kVoiceAttributes[i], au.values[i].data(), 8, 0,
+                                       0);
+            }
+            au.status = um_getAttributes(voices[v], 8, attrs);
+            for (int i = 0; i < 8; ++i) {
+                au.statuses[i] = attrs[i].status;
+            }
+            out.push_back(au);
+        }
+    }
+    return out;
+}
+
+TEST_F(DeviceMap, DefaultFlexibleBoardHasOneVoiceAuPerChannelWithoutR2) {
+    auto voices = voiceWalk(findBoard(2).at(0));
+    ASSERT_EQ(voices.size(), 23u);  // groups of 4, 4, 4, 4, 4, 3
+    for (unsigned v = 0; v < voices.size(); ++v) {
+        SCOPED_TRACE(v + 1);
+        const VoiceAu& au = voices[v];
+        EXPECT_EQ(au.status, UM_PARTIAL);
+        const unsigned n = v + 1;
+        EXPECT_EQ(au.values[0], addr(n, 2, 7));               // SIGDETADDR
+        EXPECT_EQ(au.values[1], addr(0x2000 + n, 2, 2));      // CLUSTERADDR
+        EXPECT_EQ(au.values[2], addr(n, 2, 8));               // SIGBUFADDR_DTMF
+        EXPECT_EQ(au.values[3], addr(0x1000 + n, 2, 8));      // SIGBUFADDR_MF
+        EXPECT_EQ(au.values[4], addr(n, 2, 5));               // TONEGENADDR
+        EXPECT_EQ(au.values[5], addr(n, 2, 10));              // CALLANALYSISADDR
+        EXPECT_EQ(au.statuses[6], UM_ERR_NO_SUCH_ATTRIBUTE);  // R2MFPADDR
+        EXPECT_EQ(au.values[6], (Bytes{0xAA, 0xAA, 0xAA, 0xAA, 0xAA, 0xAA, 0xAA, 0xAA}));
+        EXPECT_EQ(au.values[7], addr(n, 2, 41));  // CALLERIDADDR
+        for (int i : {0, 1, 2, 3, 4, 5, 7}) {
+            EXPECT_EQ(au.statuses[i], 0u) << kVoiceAttributes[i];
+        }
+    }
+}
+
+// The media list the board manager makes from a voice AU: the component type of each attribute
+// that answered, but CLUSTERADDR, in the order asked.
+std::vector<int> mediaTypes(const VoiceAu& au) {
+    const int types[8] = {7, 0, 8, 8, 5, 10, 66, 41};
+    std::vector<int> out;
+    for (int i = 0; i < 8; ++i) {
+        if (au.statuses[i] == 0 && i != 1) {
+            out.push_back(types[i]);
+        }
+    }
+    return out;
+}
+
+TEST_F(DeviceMap, FlexibleFarmGivesTheMediaItHas) {
+    use(kFarms + "/flexible.toml");
+    auto voices = voiceWalk(findBoard(7).at(0));
+    ASSERT_EQ(voices.size(), 5u);  // groups of 4 and 1
+    for (unsigned v = 0; v < voices.size(); ++v) {
+        SCOPED_TRACE(v + 1);
+        EXPECT_EQ(voices[v].status, UM_PARTIAL);
+        EXPECT_EQ(mediaTypes(voices[v]), (std::vector<int>{7, 5, 41}));
+        EXPECT_EQ(voices[v].statuses[1], 0u);
+        EXPECT_EQ(voices[v].values[1], addr(0x2000 + v + 1, 7, 2));
+    }
+    EXPECT_TRUE(voiceWalk(findBoard(8).at(0)).empty());
+}
+
+TEST_F(DeviceMap, BoardWithAllMediaAnswersWhole) {
+    const std::string path = ::testing::TempDir() + "allmedia_farm.toml";
+    std::ofstream(path) << "system_name = \"m\"\n[[board]]\nlogical_id = 9\nname = \"n\"\n"
+                           "serial = \"s\"\nrouting = \"flexible\"\n[[board.trunk]]\n"
+                           "channels = 2\ntype = 1\nsignaling = \"CAS\"\n";
+    use(path);
+    auto voices = voiceWalk(findBoard(9).at(0));
+    ASSERT_EQ(voices.size(), 2u);
+    EXPECT_EQ(voices[1].status, UM_SUCCESS);
+    EXPECT_EQ(mediaTypes(voices[1]), (std::vector<int>{7, 8, 8, 5, 10, 66, 41}));
+    EXPECT_EQ(voices[1].values[6], addr(2, 9, 66));
+}
+
+TEST_F(DeviceMap, PartialAnswerMarksEachAttribute) {
+    UM_AUID board = findBoard(1).at(0);
+    char name[256];
+    unsigned bogus = 0x55555555;
+    unsigned trunks = 0;
+    um_attribute a[3];
+    um_initAttributeStruct(&a[0], "NAME", name, sizeof name, 0, 0);
+    um_initAttributeStruct(&a[1], "BOGUS", &bogus, 4, 0, 0);
+    um_initAttributeStruct(&a[2], "NUM_TRUNKS", &trunks, 4, 0, 0);
+    EXPECT_EQ(um_getAttributes(board, 3, a), UM_PARTIAL);
+    EXPECT_EQ(a[0].status, 0u);
+    EXPECT_EQ(a[1].status, static_cast<uint32_t>(UM_ERR_NO_SUCH_ATTRIBUTE));
+    EXPECT_EQ(a[2].status, 0u);
+    EXPECT_STREQ(name, "VX7/T1-2");
+    EXPECT_EQ(bogus, 0x55555555u);
+    EXPECT_EQ(trunks, 2u);
+}
+
+TEST_F(DeviceMap, AllFailingGivesTheFirstFailure) {
+    UM_AUID board = findBoard(1).at(0);
+    unsigned v = 0;
+    um_attribute a[2];
+    um_initAttributeStruct(&a[0], "TYPE", &v, 4, 0, 0);
+    um_initAttributeStruct(&a[1], "ChannelCount", &v, 4, 0, 0);
+    EXPECT_EQ(um_getAttributes(board, 2, a), UM_ERR_NO_SUCH_ATTRIBUTE);
+    EXPECT_EQ(um_getAttributes(board, 1, a), UM_ERR_NO_SUCH_ATTRIBUTE);
+}
+
+TEST_F(DeviceMap, ValuesNeedTheirRoom) {
+    UM_AUID board = findBoard(1).at(0);
+    // "VX7/T1-2" needs 9 bytes with its terminator; 8 are refused and left as they were.
+    char name[10];
+    std::memset(name, '#', sizeof name);
+    um_attribute a;
+    um_initAttributeStruct(&a, "NAME", name, 8, 0, 0);
+    EXPECT_EQ(um_getAttributes(board, 1, &a), UM_ERR_BUFFER_TOO_SMALL);
+    EXPECT_EQ(a.status, static_cast<uint32_t>(UM_ERR_BUFFER_TOO_SMALL));
+    EXPECT_EQ(std::string(name, 10), std::string(10, '#'));
+    um_initAttributeStruct(&a, "NAME", name, 9, 0, 0);
+    EXPECT_EQ(um_getAttributes(board, 1, &a), UM_SUCCESS);
+    EXPECT_EQ(std::string(name, 10), std::string("VX7/T1-2\0#", 10));
+
+    unsigned char three[4] = {1, 2, 3, 4};
+    um_initAttributeStruct(&a, "NUM_TRUNKS", three, 3, 0, 0);
+    EXPECT_EQ(um_getAttributes(board, 1, &a), UM_ERR_BUFFER_TOO_SMALL);
+    EXPECT_EQ(three[3], 4);
+
+    UM_AUID line = findType(board, 503, 1).at(0);
+    unsigned char seven[9];
+    std::memset(seven, 0x77, sizeof seven);
+    um_initAttributeStruct(&a, "LINEADMINADDR", seven, 7, 0, 0);
+    EXPECT_EQ(um_getAttributes(line, 1, &a), UM_ERR_BUFFER_TOO_SMALL);
+    EXPECT_EQ(seven[0], 0x77);
+}
+
+TEST_F(DeviceMap, UnknownHandlesAndBadArguments) {
+    char buf[16];
+    um_attribute a;
+    um_initAttributeStruct(&a, "NAME", buf, sizeof buf, 0, 0);
+    EXPECT_EQ(um_getAttributes(0, 1, &a), UM_ERR_INVALID_AU);
+    EXPECT_EQ(a.status, static_cast<uint32_t>(UM_ERR_INVALID_AU));
+    EXPECT_EQ(um_getAttributes(100000, 1, &a), UM_ERR_INVALID_AU);
+    EXPECT_EQ(um_getAttributes(host(), 0, &a), UM_ERR_INVALID_ARGUMENT);
+    EXPECT_EQ(um_getAttributes(host(), 1, nullptr), UM_ERR_INVALID_ARGUMENT);
+    um_initAttributeStruct(&a, nullptr, buf, sizeof buf, 0, 0);
+    EXPECT_EQ(um_getAttributes(host(), 1, &a), UM_ERR_INVALID_ARGUMENT);
+    EXPECT_EQ(um_getHostAU(nullptr), UM_ERR_INVALID_ARGUMENT);
+
+    uint32_t count = 4;
+    UM_AUID found[4];
+    EXPECT_EQ(um_findAUs(100000, 0, nullptr, &count, found), UM_ERR_INVALID_AU);
+    EXPECT_EQ(um_findAUs(host(), 0, nullptr, nullptr, found), UM_ERR_INVALID_ARGUMENT);
+    EXPECT_EQ(um_findAUs(host(), 0, nullptr, &count, nullptr), UM_ERR_INVALID_ARGUMENT);
+    um_initAttributeStruct(&a, "NAME", nullptr, 4, 0, 0);
+    EXPECT_EQ(um_findAUs(host(), 1, &a, &count, found), UM_ERR_INVALID_ARGUMENT);
+}
+
+TEST_F(DeviceMap, InitFillsTheFiveWords) {
+    um_attribute a;
+    std::memset(&a, 0xCC, sizeof a);
+    int value = 0;
+    EXPECT_EQ(um_initAttributeStruct(&a, "TYPE", &value, 5, 7, 9), UM_SUCCESS);
+    EXPECT_STREQ(a.name, "TYPE");
+    EXPECT_EQ(a.value, &value);
+    EXPECT_EQ(a.size, 5u);
+    EXPECT_EQ(a.status, 7u);
+    EXPECT_EQ(a.reserved, 9u);
+    EXPECT_EQ(um_initAttributeStruct(nullptr, "TYPE", &value, 4, 0, 0), UM_ERR_INVALID_ARGUMENT);
+}
+
+TEST_F(DeviceMap, GapsKeepTheirNumbers) {
+    use(kFarms + "/gaps.toml");
+    std::vector<unsigned> ids;
+    for (unsigned id = 0; id <= 33; ++id) {
+        if (findBoard(id).size() == 1) {
+            ids.push_back(id);
+        }
+    }
+    EXPECT_EQ(ids, (std::vector<unsigned>{0, 3, 32}));
+}
+
+TEST_F(DeviceMap, BoardWithoutTrunks) {
+    use(kFarms + "/no_trunks.toml");
+    UM_AUID board = findBoard(4).at(0);
+    EXPECT_EQ(number(board, "NUM_TRUNKS"), 0u);
+    EXPECT_TRUE(findType(board, 503, 64).empty());
+}
+
+TEST_F(DeviceMap, ThirtyThreeBoardsOfFourTrunks) {
+    use(kFarms + "/big33.toml");
+    for (unsigned id = 0; id <= 32; ++id) {
+        auto b = findBoard(id);
+        ASSERT_EQ(b.size(), 1u) << id;
+        EXPECT_EQ(number(b[0], "NUM_TRUNKS"), 4u);
+        auto lines = findType(b[0], 503, 64);
+        ASSERT_EQ(lines.size(), 4u);
+        EXPECT_EQ(number(lines[3], "ChannelCount"), 30u);
+    }
+}
+
+class BrokenFarm : public DeviceMap, public ::testing::WithParamInterface<const char*> {};
+
+TEST_P(BrokenFarm, MeansTheBoardServiceIsDown) {
+    const std::string path = ::testing::TempDir() + "broken_unitmap_farm.toml";
+    std::ofstream(path) << GetParam();
+    use(path);
+    ::testing::internal::CaptureStderr();
+    UM_AUID h = 77;
+    EXPECT_EQ(um_getHostAU(&h), UM_ERR_SERVICE_DOWN);
+    EXPECT_EQ(h, 77u);
+    uint32_t count = 1;
+    UM_AUID found;
+    EXPECT_EQ(um_findAUs(1, 0, nullptr, &count, &found), UM_ERR_SERVICE_DOWN);
+    char buf[16];
+    um_attribute a;
+    um_initAttributeStruct(&a, "NAME", buf, sizeof buf, 0, 0);
+    EXPECT_EQ(um_getAttributes(1, 1, &a), UM_ERR_SERVICE_DOWN);
+    EXPECT_EQ(a.status, static_cast<uint32_t>(UM_ERR_SERVICE_DOWN));
+    std::string printed = ::testing::internal::GetCapturedStderr();
+    EXPECT_EQ(printed.rfind(path + ":", 0), 0u) << printed;
+
+    use(kFarms + "/default.toml");  // repaired: the service is back
+    EXPECT_EQ(um_getHostAU(&h), UM_SUCCESS);
+    EXPECT_EQ(text(h, "NAME"), "vx7-demo");
+}
+
+INSTANTIATE_TEST_SUITE_P(Files, BrokenFarm,
+                         ::testing::Values("system_name = \n", "[[board]]\nlogical_id = 1\n",
+                                           "system_name = \"s\"\n[[board]]\nlogical_id = 99\n"));
+
+TEST_F(DeviceMap, MissingFarmMeansTheBoardServiceIsDown) {
+    use(kFarms + "/missing.toml");
+    ::testing::internal::CaptureStderr();
+    UM_AUID h = 0;
+    EXPECT_EQ(um_getHostAU(&h), UM_ERR_SERVICE_DOWN);
+    EXPECT_EQ(::testing::internal::GetCapturedStderr(),
+              kFarms + "/missing.toml: cannot read the farm file: No such file or directory\n");
+}
+
+}  // namespace

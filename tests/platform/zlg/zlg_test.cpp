@@ -1,0 +1,131 @@
+#include "platform/zlg/zlg.h"
+
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+
+#include <regex>
+#include <string>
+
+#include "TraceFile.h"
+
+namespace {
+
+const std::regex kStamp(R"(\d{4}-\d\d-\d\d \d\d:\d\d:\d\d\.\d{3} )");
+
+// The line without its time stamp, after checking that it starts with one.
+std::string body(const std::string& line) {
+    std::smatch m;
+    EXPECT_TRUE(std::regex_search(line, m, kStamp, std::regex_constants::match_continuous)) << line;
+    return m.empty() ? line : line.substr(static_cast<std::size_t>(m.length(0)));
+}
+
+TEST(ZlgHandles, SameNameSameHandleOtherNameAnother) {
+    ZLG_HANDLE a = 0, b = 0, c = 0;
+    EXPECT_EQ(ZlgGetModuleHandle("HandlesTestA", &a), ZLG_SUCCESS);
+    EXPECT_EQ(ZlgGetModuleHandle("HandlesTestB", &b), ZLG_SUCCESS);
+    EXPECT_EQ(ZlgGetModuleHandle("HandlesTestA", &c), ZLG_SUCCESS);
+    EXPECT_GE(a, 1u);
+    EXPECT_LE(a, static_cast<ZLG_HANDLE>(ZLG_MAX_NAMES));
+    EXPECT_NE(a, b);
+    EXPECT_EQ(a, c);
+}
+
+TEST(ZlgHandles, LabelsHaveTheirOwnNumbers) {
+    ZLG_HANDLE label = 0;
+    EXPECT_EQ(ZlgGetLabelHandle("HandlesTestLabel", &label), ZLG_SUCCESS);
+    EXPECT_GE(label, 1u);
+    ZLG_HANDLE again = 0;
+    EXPECT_EQ(ZlgGetLabelHandle("HandlesTestLabel", &again), ZLG_SUCCESS);
+    EXPECT_EQ(label, again);
+}
+
+TEST(ZlgHandles, RefusesBadArguments) {
+    ZLG_HANDLE h = 42;
+    EXPECT_EQ(ZlgGetModuleHandle(nullptr, &h), ZLG_ERR_INVALID_ARGUMENT);
+    EXPECT_EQ(ZlgGetModuleHandle("", &h), ZLG_ERR_INVALID_ARGUMENT);
+    EXPECT_EQ(ZlgGetModuleHandle("X", nullptr), ZLG_ERR_INVALID_ARGUMENT);
+    EXPECT_EQ(ZlgGetLabelHandle(nullptr, &h), ZLG_ERR_INVALID_ARGUMENT);
+    EXPECT_EQ(h, 42u);
+}
+
+TEST(ZlgTrace, LineUnderModuleAndLabel) {
+    TraceFile trace("zlg_module_label");
+    ZLG_HANDLE module = 0, label = 0;
+    ASSERT_EQ(ZlgGetModuleHandle("Ocelot", &module), ZLG_SUCCESS);
+    ASSERT_EQ(ZlgGetLabelHandle("Error", &label), ZLG_SUCCESS);
+    EXPECT_EQ(ZlgTraceNoClient(module, label, "brd 1 trunk 1 chan 3: Connected"), ZLG_SUCCESS);
+    EXPECT_EQ(ZlgTraceNoClient(module, label, "second"), ZLG_SUCCESS);
+    auto lines = trace.lines();
+    ASSERT_EQ(lines.size(), 2u);
+    EXPECT_EQ(body(lines[0]), "Ocelot/Error: brd 1 trunk 1 chan 3: Connected");
+    EXPECT_EQ(body(lines[1]), "Ocelot/Error: second");
+}
+
+TEST(ZlgTrace, MessageOfNoModuleIsFormatted) {
+    TraceFile trace("zlg_message");
+    EXPECT_EQ(ZlgTraceMessageVarg("Unable to retrieve module handle, ZlgRet = %d", 3), ZLG_SUCCESS);
+    auto lines = trace.lines();
+    ASSERT_EQ(lines.size(), 1u);
+    EXPECT_EQ(body(lines[0]), "-: Unable to retrieve module handle, ZlgRet = 3");
+}
+
+TEST(ZlgTrace, LongTextIsWrittenWhole) {
+    TraceFile trace("zlg_long");
+    std::string text(5000, 'x');
+    EXPECT_EQ(ZlgTraceMessageVarg("%s|", text.c_str()), ZLG_SUCCESS);
+    auto lines = trace.lines();
+    ASSERT_EQ(lines.size(), 1u);
+    EXPECT_EQ(body(lines[0]), "-: " + text + "|");
+}
+
+TEST(ZlgTrace, LineBreaksStayOnOneLine) {
+    TraceFile trace("zlg_breaks");
+    ZLG_HANDLE module = 0, label = 0;
+    ZlgGetModuleHandle("Ocelot", &module);
+    ZlgGetLabelHandle("Error", &label);
+    EXPECT_EQ(ZlgTraceNoClient(module, label, "one\ntwo\r\n"), ZLG_SUCCESS);
+    auto lines = trace.lines();
+    ASSERT_EQ(lines.size(), 1u);
+    EXPECT_EQ(body(lines[0]), "Ocelot/Error: one two  ");
+}
+
+TEST(ZlgTrace, UnknownHandlesWriteNothing) {
+    TraceFile trace("zlg_unknown");
+    ZLG_HANDLE module = 0, label = 0;
+    ZlgGetModuleHandle("Ocelot", &module);
+    ZlgGetLabelHandle("Error", &label);
+    EXPECT_EQ(ZlgTraceNoClient(0, label, "x"), ZLG_ERR_INVALID_HANDLE);
+    EXPECT_EQ(ZlgTraceNoClient(module, 0, "x"), ZLG_ERR_INVALID_HANDLE);
+    EXPECT_EQ(ZlgTraceNoClient(ZLG_MAX_NAMES + 1, label, "x"), ZLG_ERR_INVALID_HANDLE);
+    EXPECT_EQ(ZlgTraceNoClient(module, label, nullptr), ZLG_ERR_INVALID_ARGUMENT);
+    EXPECT_EQ(ZlgTraceMessageVarg(nullptr), ZLG_ERR_INVALID_ARGUMENT);
+    EXPECT_TRUE(trace.lines().empty());
+}
+
+TEST(ZlgTrace, UnwritableFileIsReported) {
+    TraceFile trace("zlg_unwritable");
+    const std::string dir = trace.path() + ".d";
+    ASSERT_EQ(::mkdir(dir.c_str(), 0755), 0);
+    ::setenv(ZLG_TRACE_FILE_ENV, dir.c_str(), 1);
+    EXPECT_EQ(ZlgTraceMessageVarg("lost"), ZLG_ERR_WRITE_FAILED);
+    ::rmdir(dir.c_str());
+}
+
+TEST(ZlgTrace, DefaultFileInTheWorkingDirectory) {
+    const std::string dir = ::testing::TempDir() + "zlg_cwd_" + std::to_string(::getpid());
+    ASSERT_EQ(::mkdir(dir.c_str(), 0755), 0);
+    char old[4096];
+    ASSERT_NE(::getcwd(old, sizeof old), nullptr);
+    ::unsetenv(ZLG_TRACE_FILE_ENV);
+    ASSERT_EQ(::chdir(dir.c_str()), 0);
+    EXPECT_EQ(ZlgTraceMessageVarg("here"), ZLG_SUCCESS);
+    ASSERT_EQ(::chdir(old), 0);
+    std::ifstream in(dir + "/lineprobe_trace.log");
+    std::string line;
+    ASSERT_TRUE(std::getline(in, line));
+    EXPECT_EQ(body(line), "-: here");
+    ::unlink((dir + "/lineprobe_trace.log").c_str());
+    ::rmdir(dir.c_str());
+}
+
+}  // namespace
