@@ -450,6 +450,7 @@ def index_files(classes, headers):
         f"// {g}",
         "#pragma once",
         "",
+        '#include "catalogue/CatBody.h"',
         '#include "framework/MsgBody.h"',
         "",
         "namespace tolk::cat {",
@@ -461,6 +462,7 @@ def index_files(classes, headers):
         "    char role;         // 'm' message, 'e' event, 'l' list element",
         "    unsigned int number;",
         "    MsgBody* (*make)();",
+        "    const BodyDesc* desc;  // the body's table; null for hand-written elements",
         "};",
         "",
         "extern const CatalogueEntry kCatalogue[];",
@@ -480,10 +482,10 @@ def index_files(classes, headers):
         q = f"{prefix}::{b.name}" if prefix else b.name
         full = f"{c.name}_Bodies::{q}"
         r = {"msg": "m", "evt": "e", "elem": "l"}[role]
-        s.append(f'    {{"{c.name}", "{q}", \'{r}\', 0x{b.number:X}, []() -> MsgBody* {{ return new {full}(); }}}},')
+        s.append(f'    {{"{c.name}", "{q}", \'{r}\', 0x{b.number:X}, []() -> MsgBody* {{ return new {full}(); }}, &{full}::Desc}},')
         count += 1
         for hn, _ in b.hands:
-            s.append(f'    {{"{c.name}", "{q}::{hn}", \'l\', 0x0, []() -> MsgBody* {{ return new {full}::{hn}(); }}}},')
+            s.append(f'    {{"{c.name}", "{q}::{hn}", \'l\', 0x0, []() -> MsgBody* {{ return new {full}::{hn}(); }}, nullptr}},')
             count += 1
         for e in b.elems:
             walk(c, e, q, "elem")
