@@ -1,0 +1,245 @@
+// The state of the emulated boards, over plain data: channels with their calls, lines with their
+// alarms, cluster ports, and who subscribed to which events. Operations change the state and
+// report what a board would report as abstract events; Emulation turns them into messages.
+#ifndef LINEPROBE_SIM_MODEL_H
+#define LINEPROBE_SIM_MODEL_H
+
+#include <cstdint>
+#include <map>
+#include <memory>
+#include <optional>
+#include <set>
+#include <string>
+#include <vector>
+
+#include "platform/farm/Addresses.h"
+#include "platform/farm/Farm.h"
+
+namespace sim {
+
+using Address = farm::Address;
+
+std::uint64_t addressKey(const Address& a);
+
+// Values the console and the trace show by name; a board sends nothing else.
+namespace call {
+enum : std::uint32_t {
+    Null = 0,
+    Accepted = 1,
+    Connected = 2,
+    Dialing = 5,
+    Disconnected = 6,
+    Idle = 9,
+    Offered = 11,
+    Hold = 12,
+    HoldPendXfer = 13,
+    Proceeding = 15,
+    Alerting = 17,
+};
+}
+namespace chan {
+enum : std::uint32_t { Active = 1, OutOfService = 4, MediaDetached = 13 };
+}
+namespace reason {
+enum : std::uint32_t {
+    None = 0,
+    DestBusy = 5,
+    DestOutOfOrder = 7,
+    IncomingCall = 11,
+    Normal = 14,
+    NetworkAlarm = 15,
+    Transfer = 25,
+    OutOfOrder = 31,
+};
+}
+
+// Line states and the line control's events.
+constexpr std::uint32_t kInService = 0x160F;
+constexpr std::uint32_t kOutOfService = 0x1610;
+constexpr std::uint32_t kLineReasonStartup = 2;
+constexpr std::uint32_t kAlarmLoopback = 0x1605;
+constexpr std::uint32_t kAlarmBpvSaturation = 0x1616;
+constexpr std::uint32_t kAlarmFerrSaturation = 0x1617;
+
+// Event types as subscriptions name them. A subscription to a group number takes every event of
+// the group; one to a single type takes that type.
+constexpr std::uint32_t kGroupCallInfo = 0x1200;
+constexpr std::uint32_t kEvtCallInfoCallerId = 0x1201;
+constexpr std::uint32_t kGroupCallState = 0x1230;  // type = 0x1230 + call state
+constexpr std::uint32_t kGroupChanState = 0x1260;  // type = 0x125F + channel state
+constexpr std::uint32_t kGroupAlarms = 0x1600;
+constexpr std::uint32_t kGroupLineState = 0x1611;
+constexpr std::uint32_t kInfoIdCallerId = 0x2000007;
+
+// Values of the channel state command and of GetParm.
+constexpr std::uint32_t kChanStateInService = 256;
+constexpr std::uint32_t kChanStateOutOfService = 257;
+constexpr std::uint32_t kParmTrunkType = 0x1601;
+constexpr std::uint32_t kParmSignaling = 0x1602;
+constexpr std::uint32_t kParmRouting = 0x1313;
+
+struct Event {
+    enum class Kind { CallState, ChanState, CallInfo, Alarm, LineState };
+    Kind kind = Kind::CallState;
+    Address source;           // the reporting component
+    std::uint32_t type = 0;   // event type
+    std::uint32_t group = 0;  // the group the type belongs to
+    std::uint32_t a =
+        0;  // CallState/CallInfo: call id; ChanState: state; Alarm: alarm; LineState: state
+    std::uint32_t b = 0;  // CallState: state; CallInfo: info id; Alarm: state; LineState: reason
+    std::uint32_t c = 0;  // CallState: reason
+    std::string text;     // CallInfo
+};
+
+struct Channel;
+
+struct Call {
+    std::uint32_t id = 0;
+    std::uint32_t state = call::Null;
+    std::uint32_t reason = reason::None;
+    Channel* peer = nullptr;  // the farm channel at the other end, if any
+    std::string remote;       // the other party's number
+};
+
+// Slots a cluster transmits on its talk port, and what it listens to on other ports.
+struct Ports {
+    std::uint16_t txSlot = 0;
+    struct Listen {
+        std::vector<std::uint16_t> slots;
+        std::uint8_t encoding = 0;
+        std::uint8_t idlePattern = 0;
+        bool active = false;
+    };
+    std::map<std::uint32_t, Listen> listen;
+};
+
+struct Line;
+
+struct Channel {
+    farm::ChannelRef ref;
+    Line* line = nullptr;
+    std::string number;
+    std::uint32_t chanState = chan::Active;
+    bool adminOut = false;
+    bool flexible = false;
+    bool mediaAttached = false;
+    std::vector<std::pair<std::uint32_t, Address>> media;
+    std::optional<Call> call;
+    Ports ports;
+    Address tsc;
+};
+
+struct Line {
+    unsigned board = 0;
+    int trunk = 0;
+    int type = 0;
+    int signaling = 0;
+    std::uint32_t state = kInService;
+    std::uint32_t reason = kLineReasonStartup;
+    std::uint8_t diagMode = 0;
+    std::map<std::uint32_t, std::uint8_t> alarms;  // received alarms, 0x1601..0x160A
+    std::set<std::uint32_t> transmitting;          // 0x160B..0x160E
+    std::uint32_t bpvCount = 0;
+    std::uint32_t ferrCount = 0;
+    std::vector<Channel*> channels;
+    Address lcon;
+};
+
+struct Subscription {
+    std::uint32_t evtType = 0;
+    std::uint32_t group = 0;
+    Address retAddr;
+    std::uint32_t trans = 0;
+    Address owner;  // who asked: cancellations must come from there
+};
+
+// Call and line control of every board of a farm. Every operation returns 0 or an ErrorCode and
+// appends the events it causes.
+class Model {
+  public:
+    explicit Model(std::shared_ptr<const farm::Farm> farm);
+
+    const farm::Farm& farm() const { return *farm_; }
+    Channel* channel(unsigned board, int trunk, int channel);
+    Line* line(unsigned board, int trunk);
+    // The ports of a channel or ROC cluster, by its address; null for any other address.
+    Ports* clusterPorts(const Address& cluster);
+
+    std::uint32_t makeCall(Channel& ch, const std::string& dest, const std::string& orig,
+                           std::uint32_t& callId, std::vector<Event>& ev);
+    std::uint32_t answerCall(Channel& ch, std::uint32_t callId, std::vector<Event>& ev);
+    std::uint32_t acceptCall(Channel& ch, std::uint32_t callId, std::vector<Event>& ev);
+    std::uint32_t dropCall(Channel& ch, std::uint32_t callId, std::uint32_t why,
+                           std::vector<Event>& ev);
+    std::uint32_t releaseCall(Channel& ch, std::uint32_t callId, std::uint32_t why,
+                              std::vector<Event>& ev);
+    std::uint32_t rejectCall(Channel& ch, std::uint32_t callId, std::uint32_t why,
+                             std::vector<Event>& ev);
+    std::uint32_t holdCall(Channel& ch, std::uint32_t callId, std::vector<Event>& ev);
+    std::uint32_t retrieveCall(Channel& ch, std::uint32_t callId, std::vector<Event>& ev);
+    std::uint32_t blindTransfer(Channel& ch, std::uint32_t callId, std::vector<Event>& ev);
+    std::uint32_t dial(Channel& ch, std::uint32_t callId);
+    // Call id 0 asks for the channel's present call; a channel without one answers Null.
+    std::uint32_t callState(Channel& ch, std::uint32_t callId, std::uint32_t& id,
+                            std::uint32_t& state, std::uint32_t& why);
+    std::uint32_t setChanState(Channel& ch, std::uint32_t state, std::vector<Event>& ev);
+    std::uint32_t reset(Channel& ch, std::vector<Event>& ev);
+    std::uint32_t attachMedia(Channel& ch, std::vector<std::pair<std::uint32_t, Address>> media,
+                              std::vector<Event>& ev);
+    std::uint32_t detachMedia(Channel& ch, std::vector<Event>& ev);
+
+    std::uint32_t setLineState(Line& line, std::uint32_t state, std::uint32_t why,
+                               std::vector<Event>& ev);
+    std::uint32_t setDiagMode(Line& line, std::uint32_t mode, std::vector<Event>& ev);
+    std::uint32_t sendAlarm(Line& line, std::uint32_t alarm, std::vector<Event>& ev);
+    std::uint32_t stopAlarm(Line& line, std::uint32_t alarm, std::vector<Event>& ev);
+    std::uint8_t alarmState(const Line& line, std::uint32_t alarm) const;
+    // Every alarm a line reports when asked for all of them, in number order.
+    static const std::vector<std::uint32_t>& reportedAlarms();
+
+    // What the network does, for the control channel.
+    std::uint32_t incomingCall(Channel& ch, const std::string& from, std::uint32_t& callId,
+                               std::vector<Event>& ev);
+    std::uint32_t farEndHangup(Channel& ch, std::vector<Event>& ev);
+    std::uint32_t setAlarm(Line& line, std::uint32_t alarm, bool on, std::vector<Event>& ev);
+    // One saturation event; the count it adds to is the line's.
+    void saturation(Line& line, std::uint32_t alarm, std::vector<Event>& ev);
+
+    // Subscriptions by the address of the component that reports.
+    void subscribe(const Address& component, Subscription s);
+    // Removes what `owner` subscribed with `trans` for `evtType` (every type if evtType is null).
+    void cancel(const Address& component, const Address& owner, std::uint32_t trans,
+                const std::optional<std::uint32_t>& evtType);
+    // Removes every subscription that names this address as owner or return address.
+    void forget(const Address& host);
+    // The deliveries one event makes: one per subscriber and group.
+    void subscribersOf(const Event& e, std::vector<const Subscription*>& out) const;
+    std::size_t subscriptionCount() const;
+
+    std::uint32_t nextTimestamp() { return ++clock_; }
+
+  private:
+    Call* findCall(Channel& ch, std::uint32_t callId);
+    void callEvent(Channel& ch, std::vector<Event>& ev);
+    void chanEvent(Channel& ch, std::vector<Event>& ev);
+    void setCall(Channel& ch, std::uint32_t state, std::uint32_t why, std::vector<Event>& ev);
+    // Ends the call on `ch` (to `localState`) and tells a farm peer that the far end has gone.
+    void endCall(Channel& ch, std::uint32_t localState, std::uint32_t why, std::uint32_t peerWhy,
+                 std::vector<Event>& ev);
+    std::uint32_t serviceState(const Channel& ch) const;
+    void refreshChanState(Channel& ch, std::vector<Event>& ev);
+    Event lineEvent(const Line& line, Event::Kind kind, std::uint32_t type, std::uint32_t a,
+                    std::uint32_t b);
+
+    std::shared_ptr<const farm::Farm> farm_;
+    std::map<std::uint64_t, std::unique_ptr<Channel>> channels_;  // by TSC address
+    std::map<std::uint64_t, std::unique_ptr<Line>> lines_;        // by LCON address
+    std::map<std::uint64_t, Ports> rocPorts_;                     // by ROC cluster address
+    std::map<std::uint64_t, std::vector<Subscription>> subs_;     // by reporting component
+    std::uint32_t nextCallId_ = 0x100;
+    std::uint32_t clock_ = 0;
+};
+
+}  // namespace sim
+
+#endif

@@ -1,0 +1,624 @@
+#include "sim/RelayServer.h"
+
+#include <arpa/inet.h>
+#include <errno.h>
+#include <fcntl.h>
+#include <netinet/in.h>
+#include <netinet/tcp.h>
+#include <sys/epoll.h>
+#include <sys/eventfd.h>
+#include <sys/socket.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cstring>
+#include <ostream>
+
+#include "platform/tkhost/tkhost_switch.h"
+#include "transport/TKSFrame.h"
+
+namespace sim {
+
+struct RelayServer::Conn {
+    int fd = -1;
+    std::uint64_t serial = 0;
+    bool opened = false;
+    bool closing = false;  // flush what is queued, then close
+    bool dead = false;
+    bool wantWrite = false;
+    TKCompDesc addr{};
+    std::vector<unsigned char> in;
+    std::size_t inPos = 0;
+    std::vector<unsigned char> out;
+    std::size_t outPos = 0;
+
+    std::size_t pending() const { return out.size() - outPos; }
+};
+
+namespace {
+
+constexpr std::size_t kReadChunk = 256 * 1024;
+constexpr std::size_t kBurstSlice = 512;
+// Bursts wait while any client has this much unsent.
+constexpr std::size_t kBurstWatermark = 1u << 20;
+
+bool setNonBlocking(int fd) {
+    int flags = fcntl(fd, F_GETFL, 0);
+    return flags >= 0 && fcntl(fd, F_SETFL, flags | O_NONBLOCK) == 0;
+}
+
+bool isHostAddress(const TKCompDesc& a) {
+    return a.board == TK_HOST_BOARD;
+}
+
+}  // namespace
+
+RelayServer::RelayServer(std::shared_ptr<const farm::Farm> farm, RelayOptions options,
+                         std::ostream& log)
+    : options_(std::move(options)), log_(log), emu_(std::move(farm), log) {}
+
+RelayServer::~RelayServer() {
+    for (auto& [fd, c] : conns_) {
+        ::close(fd);
+    }
+    if (listenFd_ >= 0) {
+        ::close(listenFd_);
+    }
+    if (epollFd_ >= 0) {
+        ::close(epollFd_);
+    }
+    if (wakeFd_ >= 0) {
+        ::close(wakeFd_);
+    }
+}
+
+bool RelayServer::listen(std::string& error) {
+    listenFd_ = ::socket(AF_INET, SOCK_STREAM | SOCK_NONBLOCK | SOCK_CLOEXEC, 0);
+    if (listenFd_ < 0) {
+        error = std::string("socket: ") + std::strerror(errno);
+        return false;
+    }
+    int one = 1;
+    setsockopt(listenFd_, SOL_SOCKET, SO_REUSEADDR, &one, sizeof one);
+    sockaddr_in sa{};
+    sa.sin_family = AF_INET;
+    sa.sin_port = htons(static_cast<std::uint16_t>(options_.port));
+    if (inet_pton(AF_INET, options_.bindAddress.c_str(), &sa.sin_addr) != 1) {
+        error = "not an IPv4 address: " + options_.bindAddress;
+        return false;
+    }
+    if (::bind(listenFd_, reinterpret_cast<sockaddr*>(&sa), sizeof sa) != 0) {
+        error = "bind to port " + std::to_string(options_.port) + ": " + std::strerror(errno);
+        return false;
+    }
+    if (::listen(listenFd_, 512) != 0) {
+        error = std::string("listen: ") + std::strerror(errno);
+        return false;
+    }
+    socklen_t len = sizeof sa;
+    getsockname(listenFd_, reinterpret_cast<sockaddr*>(&sa), &len);
+    port_ = ntohs(sa.sin_port);
+
+    epollFd_ = epoll_create1(EPOLL_CLOEXEC);
+    wakeFd_ = eventfd(0, EFD_NONBLOCK | EFD_CLOEXEC);
+    if (epollFd_ < 0 || wakeFd_ < 0) {
+        error = std::string("epoll/eventfd: ") + std::strerror(errno);
+        return false;
+    }
+    epoll_event ev{};
+    ev.events = EPOLLIN;
+    ev.data.fd = listenFd_;
+    epoll_ctl(epollFd_, EPOLL_CTL_ADD, listenFd_, &ev);
+    ev.data.fd = wakeFd_;
+    epoll_ctl(epollFd_, EPOLL_CTL_ADD, wakeFd_, &ev);
+    return true;
+}
+
+void RelayServer::run(int controlFd, std::ostream* controlOut) {
+    if (controlFd >= 0) {
+        setNonBlocking(controlFd);
+        epoll_event ev{};
+        ev.events = EPOLLIN;
+        ev.data.fd = controlFd;
+        if (epoll_ctl(epollFd_, EPOLL_CTL_ADD, controlFd, &ev) != 0) {
+            // A regular file or /dev/null cannot be polled: read it all now.
+            readControl(controlFd, controlOut);
+            controlFd = -1;
+        }
+    }
+    running_ = !stopRequested_.load();
+    epoll_event events[256];
+    while (running_) {
+        int n = epoll_wait(epollFd_, events, 256, timeoutMs());
+        if (n < 0 && errno != EINTR) {
+            log_ << "vx7sim: epoll_wait: " << std::strerror(errno) << std::endl;
+            break;
+        }
+        for (int i = 0; i < n; ++i) {
+            int fd = events[i].data.fd;
+            if (fd == listenFd_) {
+                acceptAll();
+            } else if (fd == wakeFd_) {
+                std::uint64_t v;
+                while (::read(wakeFd_, &v, sizeof v) > 0) {
+                }
+                runCrossThread();
+            } else if (fd == controlFd) {
+                readControl(controlFd, controlOut);
+                if (events[i].events & (EPOLLHUP | EPOLLERR)) {
+                    // End of the control input; the relay goes on serving.
+                    epoll_ctl(epollFd_, EPOLL_CTL_DEL, controlFd, nullptr);
+                    controlFd = -1;
+                }
+            } else {
+                auto it = conns_.find(fd);
+                if (it == conns_.end() || it->second->dead) {
+                    continue;
+                }
+                Conn& c = *it->second;
+                if (events[i].events & (EPOLLIN | EPOLLHUP | EPOLLERR)) {
+                    readFrom(c);
+                }
+                if (!c.dead && (events[i].events & EPOLLOUT)) {
+                    flush(c);
+                }
+            }
+        }
+        if (stopRequested_.load()) {
+            running_ = false;
+        }
+        drainEmulation();
+        pumpBursts();
+        flushAll();
+        reap();
+    }
+    dropAll();
+    reap();
+    runCrossThread();
+}
+
+int RelayServer::timeoutMs() const {
+    if (emu_.burstsPending() && outputRoom()) {
+        return 0;
+    }
+    auto due = emu_.nextDue();
+    if (!due) {
+        return emu_.burstsPending() ? 10 : -1;
+    }
+    auto wait = std::chrono::duration_cast<std::chrono::milliseconds>(*due - Clock::now()).count();
+    return wait <= 0 ? 0 : static_cast<int>(std::min<long long>(wait + 1, 60'000));
+}
+
+std::uint16_t RelayServer::nextInstance() {
+    for (int tries = 0; tries < 65535; ++tries) {
+        lastInstance_ = static_cast<std::uint16_t>(lastInstance_ == 65535 ? 1 : lastInstance_ + 1);
+        if (!byInstance_.count(lastInstance_)) {
+            return lastInstance_;
+        }
+    }
+    return 0;
+}
+
+void RelayServer::acceptAll() {
+    for (;;) {
+        int fd = ::accept4(listenFd_, nullptr, nullptr, SOCK_NONBLOCK | SOCK_CLOEXEC);
+        if (fd < 0) {
+            if (errno == EINTR || errno == ECONNABORTED) {
+                continue;
+            }
+            if (errno == EMFILE || errno == ENFILE) {
+                log_ << "vx7sim: out of descriptors, a connection waits" << std::endl;
+            }
+            return;
+        }
+        if (conns_.size() >= options_.maxConnections) {
+            log_ << "vx7sim: refusing a connection: " << conns_.size() << " already open"
+                 << std::endl;
+            ::close(fd);
+            continue;
+        }
+        int one = 1;
+        setsockopt(fd, IPPROTO_TCP, TCP_NODELAY, &one, sizeof one);
+        auto c = std::make_unique<Conn>();
+        c->fd = fd;
+        c->serial = ++serial_;
+        epoll_event ev{};
+        ev.events = EPOLLIN;
+        ev.data.fd = fd;
+        if (epoll_ctl(epollFd_, EPOLL_CTL_ADD, fd, &ev) != 0) {
+            ::close(fd);
+            continue;
+        }
+        conns_[fd] = std::move(c);
+        connectionCount_.store(conns_.size());
+    }
+}
+
+void RelayServer::readFrom(Conn& c) {
+    for (int round = 0; round < 4; ++round) {
+        std::size_t old = c.in.size();
+        c.in.resize(old + kReadChunk);
+        ssize_t n = ::recv(c.fd, c.in.data() + old, kReadChunk, 0);
+        if (n <= 0) {
+            c.in.resize(old);
+            if (n == 0) {
+                close(c, c.inPos < c.in.size() ? "closed in the middle of a frame" : nullptr);
+                return;
+            }
+            if (errno == EAGAIN || errno == EWOULDBLOCK || errno == EINTR) {
+                break;
+            }
+            close(c, std::strerror(errno));
+            return;
+        }
+        c.in.resize(old + static_cast<std::size_t>(n));
+        if (!processFrames(c)) {
+            return;
+        }
+        if (static_cast<std::size_t>(n) < kReadChunk) {
+            break;
+        }
+    }
+}
+
+bool RelayServer::processFrames(Conn& c) {
+    for (;;) {
+        std::size_t avail = c.in.size() - c.inPos;
+        if (avail < TKS_FRAME_HEADER_SIZE) {
+            break;
+        }
+        const unsigned char* p = c.in.data() + c.inPos;
+        msg_t h;
+        tksDecodeFrameHeader(p, h);
+        if (!tksFrameSizesValid(h.size, h.ex_size)) {
+            log_ << "vx7sim: connection " << c.serial << ": frame of type " << h.type
+                 << " with parts of " << h.size << " and " << h.ex_size
+                 << " bytes, over the limit; closing it" << std::endl;
+            close(c, nullptr);
+            return false;
+        }
+        std::size_t whole = TKS_FRAME_HEADER_SIZE + h.size + h.ex_size;
+        if (avail < whole) {
+            break;
+        }
+        c.inPos += whole;
+        const unsigned char* body = p + TKS_FRAME_HEADER_SIZE;
+        if (!handleFrame(c, h.type, body, h.size, body + h.size, h.ex_size)) {
+            return false;
+        }
+        if (c.dead || c.closing) {
+            return false;
+        }
+    }
+    // Keep the buffer small: move what is left of a partial frame to the front.
+    if (c.inPos > 0) {
+        c.in.erase(c.in.begin(), c.in.begin() + static_cast<std::ptrdiff_t>(c.inPos));
+        c.inPos = 0;
+    }
+    return true;
+}
+
+bool RelayServer::handleFrame(Conn& c, std::uint32_t type, const unsigned char* body,
+                              std::uint32_t size, const unsigned char* ex, std::uint32_t exSize) {
+    msg_t m;
+    m.type = type;
+    m.size = size;
+    m.ex_size = exSize;
+    m.body = const_cast<unsigned char*>(body);
+    m.ex = const_cast<unsigned char*>(ex);
+    switch (type) {
+        case TKS_FRAME_OPEN: {
+            TKSOpenRequest req;
+            if (c.opened || !tksDecodeOpen(m, req)) {
+                log_ << "vx7sim: connection " << c.serial
+                     << (c.opened ? ": second open" : ": malformed open") << "; closing it"
+                     << std::endl;
+                close(c, nullptr);
+                return false;
+            }
+            std::uint16_t inst = nextInstance();
+            if (inst == 0) {
+                log_ << "vx7sim: no address left for connection " << c.serial << std::endl;
+                close(c, nullptr);
+                return false;
+            }
+            c.addr = TKCompDesc{};
+            c.addr.board = TK_HOST_BOARD;
+            c.addr.instance = inst;
+            c.opened = true;
+            byInstance_[inst] = &c;
+            unsigned char assigned[TKS_ASSIGNED_BODY_BYTES];
+            tksEncodeAssigned(c.addr, assigned);
+            sendFrame(c, TKS_FRAME_ASSIGNED, assigned, sizeof assigned, nullptr, 0);
+            return true;
+        }
+        case TKS_FRAME_MESSAGE: {
+            if (!c.opened) {
+                log_ << "vx7sim: connection " << c.serial << ": message before open; closing it"
+                     << std::endl;
+                close(c, nullptr);
+                return false;
+            }
+            TKMsg32Bit* block = tksBlockFromFrame(m);
+            if (!block) {
+                log_ << "vx7sim: connection " << c.serial << ": malformed message frame (header of "
+                     << size << " bytes, body of " << exSize << "); closing it" << std::endl;
+                close(c, nullptr);
+                return false;
+            }
+            // The relay knows who sent it; a client cannot speak for another address.
+            block->srcBoard = c.addr.board;
+            block->srcProcessor = c.addr.processor;
+            block->srcComponent = c.addr.component;
+            block->srcNode = c.addr.node;
+            block->srcInstance = c.addr.instance;
+            route(block);
+            return true;
+        }
+        case TKS_FRAME_CLOSE:
+            sendFrame(c, TKS_FRAME_CLOSE_ACK, nullptr, 0, nullptr, 0);
+            c.closing = true;
+            return true;
+        default:
+            log_ << "vx7sim: connection " << c.serial << ": unknown frame type " << type
+                 << "; closing it" << std::endl;
+            close(c, nullptr);
+            return false;
+    }
+}
+
+void RelayServer::route(TKMsg32Bit* block) {
+    TKCompDesc tgt{};
+    tgt.board = block->tgtBoard;
+    tgt.instance = block->tgtInstance;
+    tgt.processor = block->tgtProcessor;
+    tgt.component = block->tgtComponent;
+    tgt.node = block->tgtNode;
+    if (isHostAddress(tgt)) {
+        auto it = byInstance_.find(tgt.instance);
+        if (it != byInstance_.end() && !it->second->dead && tgt.processor == 0 &&
+            tgt.component == 0 && tgt.node == 0) {
+            sendBlock(*it->second, block);
+        } else {
+            emu_.stats().undeliverable++;
+        }
+        tkMsgFree(block);
+        return;
+    }
+    emu_.receive(block);
+    drainEmulation();
+}
+
+void RelayServer::drainEmulation() {
+    auto now = Clock::now();
+    while (TKMsg32Bit* out = emu_.popDue(now)) {
+        TKCompDesc tgt{};
+        tgt.board = out->tgtBoard;
+        tgt.instance = out->tgtInstance;
+        auto it = byInstance_.find(tgt.instance);
+        if (isHostAddress(tgt) && it != byInstance_.end() && !it->second->dead &&
+            out->tgtProcessor == 0 && out->tgtComponent == 0 && out->tgtNode == 0) {
+            sendBlock(*it->second, out);
+        } else {
+            emu_.stats().undeliverable++;
+        }
+        tkMsgFree(out);
+    }
+}
+
+bool RelayServer::outputRoom() const {
+    for (const auto& [fd, c] : conns_) {
+        if (c->pending() >= kBurstWatermark) {
+            return false;
+        }
+    }
+    return true;
+}
+
+void RelayServer::pumpBursts() {
+    while (emu_.burstsPending() && outputRoom()) {
+        emu_.pumpBursts(kBurstSlice);
+        drainEmulation();
+        flushAll();
+        if (emu_.nextDue()) {
+            break;  // delayed: they leave when their time comes
+        }
+    }
+}
+
+void RelayServer::sendFrame(Conn& c, std::uint32_t type, const unsigned char* body,
+                            std::uint32_t size, const unsigned char* ex, std::uint32_t exSize) {
+    if (c.dead) {
+        return;
+    }
+    msg_t m;
+    m.type = type;
+    m.size = size;
+    m.ex_size = exSize;
+    unsigned char header[TKS_FRAME_HEADER_SIZE];
+    tksEncodeFrameHeader(m, header);
+    c.out.insert(c.out.end(), header, header + sizeof header);
+    if (size) {
+        c.out.insert(c.out.end(), body, body + size);
+    }
+    if (exSize) {
+        c.out.insert(c.out.end(), ex, ex + exSize);
+    }
+    if (c.pending() > options_.maxPendingOutput) {
+        log_ << "vx7sim: connection " << c.serial << " reads too slowly (" << c.pending()
+             << " bytes waiting); closing it" << std::endl;
+        close(c, nullptr);
+    }
+}
+
+void RelayServer::sendBlock(Conn& c, const TKMsg32Bit* block) {
+    if (!tksFrameSizesValid(TKS_MSG_HEADER_BYTES, block->size)) {
+        emu_.stats().undeliverable++;
+        return;
+    }
+    unsigned char header[TKS_MSG_HEADER_BYTES];
+    tksPackMsgHeader(block, header);
+    sendFrame(c, TKS_FRAME_MESSAGE, header, sizeof header,
+              reinterpret_cast<const unsigned char*>(block) + TK_MSG_HEADER_SIZE, block->size);
+}
+
+void RelayServer::flush(Conn& c) {
+    while (!c.dead && c.pending() > 0) {
+        ssize_t n = ::send(c.fd, c.out.data() + c.outPos, c.pending(), MSG_NOSIGNAL);
+        if (n < 0) {
+            if (errno == EINTR) {
+                continue;
+            }
+            if (errno == EAGAIN || errno == EWOULDBLOCK) {
+                break;
+            }
+            close(c, std::strerror(errno));
+            return;
+        }
+        c.outPos += static_cast<std::size_t>(n);
+    }
+    if (c.dead) {
+        return;
+    }
+    if (c.pending() == 0) {
+        c.out.clear();
+        c.outPos = 0;
+        if (c.closing) {
+            close(c, nullptr);
+            return;
+        }
+    } else if (c.outPos > (1u << 20)) {
+        c.out.erase(c.out.begin(), c.out.begin() + static_cast<std::ptrdiff_t>(c.outPos));
+        c.outPos = 0;
+    }
+    if (c.pending() > options_.maxPendingOutput) {
+        log_ << "vx7sim: connection " << c.serial << " reads too slowly (" << c.pending()
+             << " bytes waiting); closing it" << std::endl;
+        close(c, nullptr);
+        return;
+    }
+    bool want = c.pending() > 0;
+    if (want != c.wantWrite) {
+        c.wantWrite = want;
+        epoll_event ev{};
+        ev.events = EPOLLIN | (want ? EPOLLOUT : 0u);
+        ev.data.fd = c.fd;
+        epoll_ctl(epollFd_, EPOLL_CTL_MOD, c.fd, &ev);
+    }
+}
+
+void RelayServer::flushAll() {
+    for (auto& [fd, c] : conns_) {
+        if (!c->dead && (c->pending() > 0 || c->closing)) {
+            flush(*c);
+        }
+    }
+}
+
+void RelayServer::close(Conn& c, const char* why) {
+    if (c.dead) {
+        return;
+    }
+    if (why) {
+        log_ << "vx7sim: connection " << c.serial << ": " << why << std::endl;
+    }
+    c.dead = true;
+    epoll_ctl(epollFd_, EPOLL_CTL_DEL, c.fd, nullptr);
+    if (c.opened) {
+        byInstance_.erase(c.addr.instance);
+        emu_.forget(c.addr);
+    }
+    doomed_.push_back(c.fd);
+}
+
+void RelayServer::reap() {
+    for (int fd : doomed_) {
+        ::close(fd);
+        conns_.erase(fd);
+    }
+    doomed_.clear();
+    connectionCount_.store(conns_.size());
+}
+
+void RelayServer::dropAll() {
+    for (auto& [fd, c] : conns_) {
+        close(*c, nullptr);
+    }
+}
+
+void RelayServer::readControl(int fd, std::ostream* out) {
+    char buf[4096];
+    for (;;) {
+        ssize_t n = ::read(fd, buf, sizeof buf);
+        if (n <= 0) {
+            break;
+        }
+        controlPending_.append(buf, static_cast<std::size_t>(n));
+        std::size_t nl;
+        while ((nl = controlPending_.find('\n')) != std::string::npos) {
+            std::string line = controlPending_.substr(0, nl);
+            controlPending_.erase(0, nl + 1);
+            std::string reply = runControl(line);
+            if (!reply.empty() && out) {
+                *out << reply << std::endl;
+            }
+        }
+        if (controlPending_.size() > 64 * 1024) {
+            controlPending_.clear();
+            if (out) {
+                *out << "error: control line too long" << std::endl;
+            }
+        }
+    }
+}
+
+std::string RelayServer::runControl(const std::string& line) {
+    ControlOutcome o = emu_.control(line);
+    if (o.drop) {
+        std::size_t n = conns_.size();
+        dropAll();
+        reap();
+        o.reply = "ok dropped " + std::to_string(n);
+    }
+    if (o.quit) {
+        running_ = false;
+    }
+    if (o.reply.rfind("ok stats", 0) == 0) {
+        o.reply += " connections=" + std::to_string(conns_.size());
+    }
+    drainEmulation();
+    return o.reply;
+}
+
+std::string RelayServer::control(const std::string& line) {
+    std::future<std::string> f;
+    {
+        std::lock_guard<std::mutex> g(crossLock_);
+        cross_.push_back(CrossCall{line, {}});
+        f = cross_.back().result.get_future();
+    }
+    std::uint64_t one = 1;
+    [[maybe_unused]] ssize_t w = ::write(wakeFd_, &one, sizeof one);
+    return f.get();
+}
+
+void RelayServer::runCrossThread() {
+    std::deque<CrossCall> calls;
+    {
+        std::lock_guard<std::mutex> g(crossLock_);
+        calls.swap(cross_);
+    }
+    for (CrossCall& call : calls) {
+        call.result.set_value(runControl(call.line));
+    }
+}
+
+void RelayServer::stop() {
+    stopRequested_.store(true);
+    std::uint64_t one = 1;
+    if (wakeFd_ >= 0) {
+        [[maybe_unused]] ssize_t w = ::write(wakeFd_, &one, sizeof one);
+    }
+}
+
+}  // namespace sim
