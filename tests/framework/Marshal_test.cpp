@@ -1,0 +1,333 @@
+#include "framework/Marshal.h"
+
+#include <gtest/gtest.h>
+
+#include <cstring>
+#include <iomanip>
+#include <sstream>
+
+#include "FieldCallLog.h"
+#include "framework/CompAttr_t.h"
+#include "framework/CompDesc_t.h"
+#include "framework/Msg.h"
+#include "framework/MsgDefault_t.h"
+
+namespace {
+
+using tolk::Msg;
+using tolk::staticList;
+using Bytes = std::vector<unsigned char>;
+
+Bytes body(Msg& m) {
+    const unsigned char* b = tkMsgBody(m.getMsgRef());
+    return Bytes(b, b + m.getSize());
+}
+
+std::string hex(const Bytes& b) {
+    std::ostringstream os;
+    for (unsigned char c : b) {
+        os << std::hex << std::setw(2) << std::setfill('0') << static_cast<int>(c) << ' ';
+    }
+    return os.str();
+}
+
+void fillBody(Msg& m, const Bytes& bytes) {
+    ASSERT_EQ(m.getSize(), bytes.size());
+    std::memcpy(tkMsgBody(m.getMsgRef()), bytes.data(), bytes.size());
+}
+
+#define EXPECT_BYTES(msg, ...)                   \
+    do {                                         \
+        Bytes golden_ = __VA_ARGS__;             \
+        EXPECT_EQ(hex(body(msg)), hex(golden_)); \
+    } while (0)
+
+class MarshalTest : public ::testing::Test {
+  protected:
+    void SetUp() override { fieldCalls().clear(); }
+};
+
+// A body of one unsigned int: the library leaves an offset of 0 unadvanced.
+class OneUInt : public tolk::MsgBody {
+  public:
+    unsigned int writeMsg(Msg* m, unsigned int off) override {
+        return tolk::putFirst(m, off, 0x380000, &v);
+    }
+    unsigned int readMsg(Msg* m, unsigned int off) override {
+        return tolk::getFirst(m, off, 0x380000, &v);
+    }
+    unsigned int GetByteSize() override { return 4; }
+    unsigned int v = 0;
+};
+
+TEST_F(MarshalTest, FirstFieldAtOffsetZeroReturnsItsWidth) {
+    Msg m(4);
+    OneUInt b;
+    b.v = 0xA1B2C3D4;
+    EXPECT_EQ(m.write(&b, 0), 4u);
+    EXPECT_BYTES(m, {0xA1, 0xB2, 0xC3, 0xD4});
+    OneUInt r;
+    EXPECT_EQ(m.read(&r, 0), 4u);
+    EXPECT_EQ(r.v, 0xA1B2C3D4u);
+}
+
+TEST_F(MarshalTest, FirstFieldFixedArrayAddsElementWidthTimesCount) {
+    Msg m(128);
+    staticList<char> addr;
+    addr.realloc(3);
+    std::memcpy(addr.data(), "555", 3);
+    EXPECT_EQ(tolk::putFixed(&m, 0, 10, 128, addr, true), 128u);
+    EXPECT_EQ(addr.length(), 128u);
+    ASSERT_EQ(fieldCalls().size(), 1u);
+    EXPECT_EQ(fieldCalls()[0].descs, std::vector<unsigned int>{0x53F800});
+}
+
+TEST_F(MarshalTest, LaterFieldAtNonZeroOffsetIsNotAdjusted) {
+    Msg m(6);
+    unsigned short s = 0x0102;
+    EXPECT_EQ(tolk::putField(&m, 4, 0x280000, &s), 6u);
+    EXPECT_BYTES(m, {0, 0, 0, 0, 0x01, 0x02});
+}
+
+TEST(MarshalWidth, TypeCodes) {
+    const std::pair<unsigned int, unsigned int> cases[] = {
+        {0x000000, 1}, {0x080000, 2}, {0x100000, 4}, {0x180000, 4}, {0x200000, 1}, {0x280000, 2},
+        {0x300000, 4}, {0x380000, 4}, {0x500000, 1}, {0x880000, 4}, {0x400000, 4}, {0xF80000, 4}};
+    for (auto [desc, width] : cases) {
+        EXPECT_EQ(tolk::descWidth(desc), width) << std::hex << desc;
+    }
+    EXPECT_EQ(tolk::descWidth(0x27F000), 1u);
+}
+
+struct ChunkCase {
+    unsigned int n;
+    std::vector<unsigned int> descs;
+    std::vector<unsigned int> offsets;
+};
+
+class ListChunks : public MarshalTest, public ::testing::WithParamInterface<ChunkCase> {};
+
+TEST_P(ListChunks, BytesMoveInChunksOfAtMost255) {
+    const ChunkCase& c = GetParam();
+    staticList<unsigned char> l;
+    l.realloc(c.n);
+    for (unsigned int i = 0; i < c.n; ++i) {
+        *l[i] = static_cast<unsigned char>(i * 7);
+    }
+    Msg m(4 + c.n);
+    EXPECT_EQ(tolk::putList(&m, 4, 4, l, false), 4 + c.n);
+    ASSERT_EQ(fieldCalls().size(), c.descs.size());
+    for (std::size_t i = 0; i < c.descs.size(); ++i) {
+        EXPECT_TRUE(fieldCalls()[i].put);
+        EXPECT_EQ(fieldCalls()[i].descs, std::vector<unsigned int>{c.descs[i]}) << i;
+        EXPECT_EQ(fieldCalls()[i].offsetIn, c.offsets[i]) << i;
+    }
+    Bytes b = body(m);
+    for (unsigned int i = 0; i < c.n; ++i) {
+        ASSERT_EQ(b[4 + i], static_cast<unsigned char>(i * 7)) << i;
+    }
+    fieldCalls().clear();
+    staticList<unsigned char> r;
+    EXPECT_EQ(tolk::getList(&m, 4, 4, r, c.n, false), 4 + c.n);
+    ASSERT_EQ(r.length(), c.n);
+    EXPECT_EQ(fieldCalls().size(), c.descs.size());
+    for (unsigned int i = 0; i < c.n; ++i) {
+        ASSERT_EQ(*r[i], static_cast<unsigned char>(i * 7)) << i;
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Sizes, ListChunks,
+    ::testing::Values(ChunkCase{1, {0x200000}, {4}}, ChunkCase{255, {0x27F000}, {4}},
+                      ChunkCase{256, {0x200000, 0x27F000}, {4, 5}},
+                      ChunkCase{510, {0x27F000, 0x27F000}, {4, 259}},
+                      ChunkCase{511, {0x200000, 0x27F000, 0x27F000}, {4, 5, 260}},
+                      ChunkCase{300, {0x216000, 0x27F000}, {4, 49}}));
+
+TEST_F(MarshalTest, EmptyListMakesNoCallAtAll) {
+    Msg m(0u);
+    staticList<unsigned int> l;
+    EXPECT_EQ(tolk::putList(&m, 8, 7, l, false), 8u);
+    EXPECT_EQ(tolk::getList(&m, 8, 7, l, 0, true), 8u);
+    EXPECT_TRUE(fieldCalls().empty());
+}
+
+TEST_F(MarshalTest, WordListsUseTheirFullChunkDescriptors) {
+    staticList<unsigned int> w;
+    w.realloc(256);
+    staticList<unsigned short> h;
+    h.realloc(256);
+    staticList<char> c;
+    c.realloc(256);
+    staticList<signed char> s;
+    s.realloc(256);
+    Msg m(256 * 4 + 256 * 2 + 256 + 256);
+    unsigned int off = tolk::putList(&m, 0, 7, w, true);
+    off = tolk::putList(&m, off, 5, h, false);
+    off = tolk::putList(&m, off, 10, c, false);
+    off = tolk::putList(&m, off, 0, s, false);
+    EXPECT_EQ(off, m.getSize());
+    std::vector<unsigned int> descs;
+    for (auto& call : fieldCalls()) {
+        descs.push_back(call.descs[0]);
+    }
+    EXPECT_EQ(descs, (std::vector<unsigned int>{0x380000, 0x3FF000, 0x280000, 0x2FF000, 0x500000,
+                                                0x57F000, 0x000000, 0x07F000}));
+}
+
+TEST_F(MarshalTest, FirstChunkOfALeadingListGetsTheFirstFieldRule) {
+    staticList<unsigned char> l;
+    l.realloc(300);
+    Msg m(300);
+    EXPECT_EQ(tolk::putList(&m, 0, 4, l, true), 300u);
+    ASSERT_EQ(fieldCalls().size(), 2u);
+    EXPECT_EQ(fieldCalls()[1].offsetIn, 45u);
+}
+
+TEST_F(MarshalTest, ElementTypeNarrowerThanTheCodeIsRefused) {
+    staticList<unsigned char> l;
+    l.realloc(4);
+    Msg m(16);
+    EXPECT_THROW(tolk::putList(&m, 0, 7, l, true), tolk::Exception);
+    EXPECT_TRUE(fieldCalls().empty());
+}
+
+TEST_F(MarshalTest, ImpossibleCountRaisesAllocationError) {
+    Msg m(8);
+    staticList<unsigned int> l;
+    EXPECT_THROW(tolk::getList(&m, 4, 7, l, 0xFFFFFFFFu, false),
+                 staticList<unsigned int>::AllocationError);
+    EXPECT_TRUE(fieldCalls().empty());
+}
+
+TEST_F(MarshalTest, RemainingIsSizeMinusOffsetAndZeroBeyond) {
+    Msg m(10);
+    EXPECT_EQ(tolk::remaining(&m, 0), 10u);
+    EXPECT_EQ(tolk::remaining(&m, 4), 6u);
+    EXPECT_EQ(tolk::remaining(&m, 10), 0u);
+    EXPECT_EQ(tolk::remaining(&m, 11), 0u);
+}
+
+TEST_F(MarshalTest, CompDescIsSixBytesWithFourByteFieldsInOneCall) {
+    tolk::CompDesc_t d(0x1234, 2, 3, 18, 5);
+    Msg m(6);
+    EXPECT_EQ(d.GetByteSize(), 6u);
+    EXPECT_EQ(m.write(&d, 0), 6u);
+    EXPECT_BYTES(m, {0x12, 0x34, 0x02, 0x03, 0x12, 0x05});
+    ASSERT_EQ(fieldCalls().size(), 2u);
+    EXPECT_EQ(fieldCalls()[0].descs, std::vector<unsigned int>{0x280000});
+    EXPECT_EQ(fieldCalls()[1].descs,
+              (std::vector<unsigned int>{0x200000, 0x200000, 0x200000, 0x200000}));
+    tolk::CompDesc_t r;
+    EXPECT_EQ(m.read(&r, 0), 6u);
+    EXPECT_TRUE(r == d);
+}
+
+TEST_F(MarshalTest, CompAttrIsKeyThenSignedValue) {
+    tolk::CompAttr_t a(0x01020304, -2);
+    Msg m(8);
+    EXPECT_EQ(m.write(&a, 0), 8u);
+    EXPECT_BYTES(m, {0x01, 0x02, 0x03, 0x04, 0xFF, 0xFF, 0xFF, 0xFE});
+    EXPECT_EQ(fieldCalls()[1].descs, std::vector<unsigned int>{0x180000});
+    tolk::CompAttr_t r;
+    EXPECT_EQ(m.read(&r, 0), 8u);
+    EXPECT_EQ(r.key, 0x01020304u);
+    EXPECT_EQ(r.value, -2);
+}
+
+TEST_F(MarshalTest, MsgDefaultReadsAllThatIsLeft) {
+    Msg m(5);
+    fillBody(m, {9, 8, 7, 6, 5});
+    tolk::MsgDefault_t d;
+    EXPECT_EQ(m.read(&d, 2), 5u);
+    ASSERT_EQ(d.GetByteSize(), 3u);
+    EXPECT_EQ(*d.bytes()[0], 7);
+    tolk::MsgDefault_t all;
+    EXPECT_EQ(m.read(&all, 0), 5u);
+    EXPECT_EQ(all.GetByteSize(), 5u);
+    tolk::MsgDefault_t none;
+    EXPECT_EQ(m.read(&none, 9), 9u);
+    EXPECT_EQ(none.GetByteSize(), 0u);
+}
+
+TEST_F(MarshalTest, MsgDefaultOnCallersListWritesIt) {
+    staticList<unsigned char> bytes;
+    bytes.realloc(3);
+    *bytes[0] = 1;
+    *bytes[1] = 2;
+    *bytes[2] = 3;
+    tolk::MsgDefault_t d(bytes);
+    Msg m(d.GetByteSize());
+    EXPECT_EQ(m.write(&d, 0), 3u);
+    EXPECT_BYTES(m, {1, 2, 3});
+    tolk::MsgDefault_t copy(d);
+    *bytes[0] = 99;
+    EXPECT_EQ(*copy.bytes()[0], 1);
+}
+
+// A body with a count, a counted list of u16 and a trailing list of contained attributes.
+class Shaped : public tolk::MsgBody {
+  public:
+    unsigned int writeMsg(Msg* m, unsigned int off) override {
+        count = static_cast<unsigned char>(items.length());
+        off = tolk::putFirst(m, off, 0x200000, &count);
+        off = tolk::putList(m, off, 5, items, false);
+        return tolk::putBodies(m, off, attrs);
+    }
+    unsigned int readMsg(Msg* m, unsigned int off) override {
+        off = tolk::getFirst(m, off, 0x200000, &count);
+        off = tolk::getList(m, off, 5, items, count, false);
+        return tolk::getTrailingBodies(m, off, attrs);
+    }
+    unsigned int GetByteSize() override { return 1 + 2 * items.length() + 8 * attrs.length(); }
+    unsigned char count = 0;
+    staticList<unsigned short> items;
+    staticList<tolk::CompAttr_t> attrs;
+};
+
+TEST_F(MarshalTest, CountedAndTrailingBodyListsRoundTrip) {
+    Shaped s;
+    s.items.realloc(2);
+    *s.items[0] = 0xBEEF;
+    *s.items[1] = 0x0001;
+    s.attrs.realloc(2);
+    *s.attrs[0] = tolk::CompAttr_t(1, 2);
+    *s.attrs[1] = tolk::CompAttr_t(3, -1);
+    Msg m(s.GetByteSize());
+    EXPECT_EQ(m.write(&s, 0), 21u);
+    EXPECT_BYTES(m, {0x02, 0xBE, 0xEF, 0x00, 0x01, 0, 0,    0,    1,    0,   0,
+                     0,    2,    0,    0,    0,    3, 0xFF, 0xFF, 0xFF, 0xFF});
+    Shaped r;
+    EXPECT_EQ(m.read(&r, 0), 21u);
+    EXPECT_EQ(r.count, 2);
+    ASSERT_EQ(r.items.length(), 2u);
+    EXPECT_EQ(*r.items[0], 0xBEEF);
+    // Sized by the bytes left (16) as an upper bound; two elements read, the rest default.
+    ASSERT_EQ(r.attrs.length(), 16u);
+    EXPECT_EQ(r.attrs[1]->value, -1);
+    EXPECT_EQ(r.attrs[2]->key, 0u);
+}
+
+TEST_F(MarshalTest, CountBeyondTheMessageReadsZerosNotPastTheBlock) {
+    Msg m(3);
+    fillBody(m, {200, 0x12, 0x34});
+    Shaped r;
+    EXPECT_EQ(m.read(&r, 0), 401u);
+    ASSERT_EQ(r.items.length(), 200u);
+    EXPECT_EQ(*r.items[0], 0x1234);
+    EXPECT_EQ(*r.items[199], 0);
+    EXPECT_EQ(r.attrs.length(), 0u);
+}
+
+TEST_F(MarshalTest, TrailingBodyListWithShortTailStopsAtTheEnd) {
+    Msg m(1 + 8 + 3);
+    fillBody(m, {0, 0, 0, 0, 7, 0, 0, 0, 9, 1, 1, 1});
+    Shaped r;
+    EXPECT_EQ(m.read(&r, 0), 17u);
+    ASSERT_EQ(r.attrs.length(), 11u);
+    EXPECT_EQ(r.attrs[0]->key, 7u);
+    EXPECT_EQ(r.attrs[0]->value, 9);
+    EXPECT_EQ(r.attrs[1]->key, 0x01010100u);
+}
+
+}  // namespace
