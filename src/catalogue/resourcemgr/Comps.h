@@ -36,7 +36,7 @@ class CompsRecord : public MsgBody {
         off = compDesc.readMsg(m, off);
         attrs.realloc(bytesLeft(m, off) / 8);
         unsigned int n = 0;
-        while (n < attrs.length()) {
+        while (n < attrs.length() && bytesLeft(m, off) > 0) {
             unsigned int next = attrs[n]->readMsg(m, off);
             if (next <= off) {
                 break;

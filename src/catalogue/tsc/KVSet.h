@@ -118,7 +118,7 @@ class KVSetRecord : public MsgBody {
             // Sized to what the bytes left could hold, then cut behind the terminator.
             l->realloc(bytesLeft(m, off) / Value_Key_0x1203_t::kMinWireSize);
             unsigned int n = 0;
-            while (n < l->length()) {
+            while (n < l->length() && bytesLeft(m, off) > 0) {
                 unsigned int next = (*l)[n]->readMsg(m, off);
                 if (next <= off) {
                     break;
