@@ -47,6 +47,7 @@ class sock {
     int getFd() const { return fd; }
     bool isFailed() const { return failed.load() != 0; }
     int getPort() const { return ntohs(peer.sin_port); }
+    const sockaddr_in& getPeer() const { return peer; }
     // The port this socket is bound to (a server bound to port 0 learns its port here).
     int localPort() const;
 

@@ -1,0 +1,215 @@
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <chrono>
+#include <thread>
+#include <vector>
+
+#include "transport/IsaSync.h"
+#include "transport/TKSCommon.h"
+
+namespace {
+
+using namespace std::chrono_literals;
+using Clock = std::chrono::steady_clock;
+
+TEST(TKSMutexSignal, AnotherThreadReleasesAWaiterAtOnce) {
+    TKSMutex gate;
+    gate.lock();
+    std::thread opener([&] {
+        std::this_thread::sleep_for(30ms);
+        gate.unlock();
+    });
+    auto t0 = Clock::now();
+    EXPECT_TRUE(gate.tryLock(5000, 10));
+    // The signal ends the wait, not the 5 s bound.
+    EXPECT_LT(Clock::now() - t0, 3000ms);
+    opener.join();
+}
+
+TEST(TKSMutexSignal, TimeOutKeepsItsLength) {
+    TKSMutex gate;
+    gate.lock();
+    auto t0 = Clock::now();
+    EXPECT_FALSE(gate.tryLock(100, 10));
+    EXPECT_GE(Clock::now() - t0, 100ms);
+    EXPECT_FALSE(gate.tryLock(0, 10));
+}
+
+struct Body : TKSRunnable {
+    std::atomic<int> runs{0};
+    std::atomic<bool> release{false};
+    void* run(void*, void* arg) {
+        ++runs;
+        while (!release.load()) {
+            std::this_thread::sleep_for(1ms);
+        }
+        return arg;
+    }
+};
+
+TEST(TKSThread, StartRunsTheMemberBodyAndJoinWaitsForIt) {
+    Body body;
+    TKSThread t(static_cast<TKSRunnable*>(&body), static_cast<TKSThread::MemberBody>(&Body::run),
+                0);
+    int token = 0;
+    t.start(&token);
+    EXPECT_EQ(TKSThread::RUNNING, t.getStatus());
+    EXPECT_THROW(t.start(nullptr), TKSThread::AlreadyActive);
+    body.release = true;
+    t.join();
+    EXPECT_EQ(TKSThread::NOT_RUNNING, t.getStatus());
+    EXPECT_EQ(&token, t.getResult());
+    EXPECT_EQ(1, body.runs.load());
+    // A thread that ended can be started again.
+    t.start(nullptr);
+    t.join();
+    EXPECT_EQ(2, body.runs.load());
+}
+
+TEST(TKSThread, SmallStackIsRaisedNotRefused) {
+    std::atomic<bool> ran{false};
+    static std::atomic<bool>* flag;
+    flag = &ran;
+    TKSThread t(
+        [](void*, void*) -> void* {
+            *flag = true;
+            return nullptr;
+        },
+        1);
+    EXPECT_NO_THROW(t.start(nullptr));
+    t.join();
+    EXPECT_TRUE(ran.load());
+}
+
+std::atomic<int> g_cleanups{0};
+void* countCleanup(void*) {
+    ++g_cleanups;
+    return nullptr;
+}
+
+TEST(TKSThread, CancelIsNoticedByTestCancelWhichRunsTheCleanups) {
+    g_cleanups = 0;
+    static std::atomic<bool> started;
+    started = false;
+    TKSThread t(
+        [](void* control, void*) -> void* {
+            auto* c = static_cast<TKSThread::control*>(control);
+            c->pushCleanup(countCleanup, nullptr);
+            c->pushCleanup(countCleanup, nullptr);
+            started = true;
+            for (;;) {
+                c->testCancel();
+                std::this_thread::sleep_for(1ms);
+            }
+        },
+        0);
+    t.start(nullptr);
+    while (!started.load()) {
+        std::this_thread::sleep_for(1ms);
+    }
+    t.cancel();
+    t.join();
+    EXPECT_EQ(2, g_cleanups.load());
+    EXPECT_EQ(TKSThread::NOT_RUNNING, t.getStatus());
+}
+
+TEST(TKSThread, ExceptionFromABodyEndsOnlyThatThread) {
+    TKSThread t([](void*, void*) -> void* { throw 42; }, 0);
+    testing::internal::CaptureStderr();
+    t.start(nullptr);
+    t.join();
+    std::string err = testing::internal::GetCapturedStderr();
+    EXPECT_NE(std::string::npos, err.find("exception left a thread body"));
+    EXPECT_EQ(TKSThread::NOT_RUNNING, t.getStatus());
+}
+
+TEST(TKSThread, DestructorStopsARunningThread) {
+    static std::atomic<bool> ended;
+    ended = false;
+    {
+        TKSThread t(
+            [](void* control, void*) -> void* {
+                auto* c = static_cast<TKSThread::control*>(control);
+                while (!c->cancelled()) {
+                    std::this_thread::sleep_for(1ms);
+                }
+                ended = true;
+                return nullptr;
+            },
+            0);
+        t.start(nullptr);
+    }
+    EXPECT_TRUE(ended.load());
+}
+
+TEST(TKSThread, AbandonedThreadRunsWithoutControl) {
+    static std::atomic<void*> seenControl;
+    static std::atomic<bool> done;
+    seenControl = reinterpret_cast<void*>(1);
+    done = false;
+    TKSAbandonedThread_create(
+        [](void* control, void*) -> void* {
+            seenControl = control;
+            done = true;
+            return nullptr;
+        },
+        nullptr, 0);
+    while (!done.load()) {
+        std::this_thread::sleep_for(1ms);
+    }
+    EXPECT_EQ(nullptr, seenControl.load());
+}
+
+struct Tracked {
+    static std::atomic<int> deletes;
+    virtual ~Tracked() { ++deletes; }
+};
+std::atomic<int> Tracked::deletes{0};
+
+TEST(RefPtrConcurrency, CountSurvivesConcurrentCopyAndRelease) {
+    Tracked::deletes = 0;
+    for (int round = 0; round < 20; ++round) {
+        auto* shared = new isa::RefPtr<Tracked>(new Tracked);
+        std::atomic<bool> go{false};
+        std::vector<std::thread> threads;
+        for (int t = 0; t < 4; ++t) {
+            threads.emplace_back([&, copy = *shared]() mutable {
+                while (!go.load()) {
+                }
+                for (int i = 0; i < 2000; ++i) {
+                    isa::RefPtr<Tracked> a(copy);
+                    isa::RefPtr<Tracked> b;
+                    b = a;
+                    a.Detach();
+                }
+            });
+        }
+        delete shared;
+        go = true;
+        for (auto& t : threads) {
+            t.join();
+        }
+        EXPECT_EQ(round + 1, Tracked::deletes.load());
+    }
+}
+
+TEST(RefPtrConcurrency, OneRefPtrReadWhileAnotherThreadAssignsIt) {
+    Tracked::deletes = 0;
+    isa::RefPtr<Tracked> slot(new Tracked);
+    std::atomic<bool> stop{false};
+    std::thread reader([&] {
+        while (!stop.load()) {
+            isa::RefPtr<Tracked> copy(slot);
+            EXPECT_NE(nullptr, copy.Get());
+        }
+    });
+    for (int i = 0; i < 2000; ++i) {
+        slot = isa::RefPtr<Tracked>(new Tracked);
+    }
+    stop = true;
+    reader.join();
+    EXPECT_EQ(2000, Tracked::deletes.load());
+}
+
+}  // namespace

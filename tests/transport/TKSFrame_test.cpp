@@ -1,0 +1,260 @@
+#include "transport/TKSFrame.h"
+
+#include <gtest/gtest.h>
+
+#include <cstring>
+
+#include "Golden.h"
+
+namespace {
+
+class MemorySource : public TKSByteSource {
+  public:
+    explicit MemorySource(Bytes b) : bytes(std::move(b)) {}
+    int readExact(void* dst, std::size_t n) override {
+        if (bytes.size() - pos < n) {
+            pos = bytes.size();
+            return -1;
+        }
+        std::memcpy(dst, bytes.data() + pos, n);
+        pos += n;
+        return 0;
+    }
+    std::size_t left() const { return bytes.size() - pos; }
+
+  private:
+    Bytes bytes;
+    std::size_t pos = 0;
+};
+
+TKMsg32Bit* sampleBlock(unsigned int bodySize) {
+    TKMsg32Bit* b = nullptr;
+    tkMsgAllocate(bodySize, &b);
+    b->transTag = (0x123456u << 8) | 0x5Au;
+    b->type = 0x1214;
+    b->srcInstance = 0x0102;
+    b->srcBoard = 3;
+    b->srcProcessor = 4;
+    b->srcComponent = 5;
+    b->srcNode = 6;
+    b->tgtInstance = 0x0708;
+    b->tgtBoard = 9;
+    b->tgtProcessor = 10;
+    b->tgtComponent = 11;
+    b->tgtNode = 12;
+    for (unsigned int i = 0; i < bodySize; ++i) {
+        tkMsgBody(b)[i] = static_cast<unsigned char>(0xAB + i);
+    }
+    return b;
+}
+
+const Bytes kSampleHeaderWords = {
+    0x00, 0x00, 0x00, 0x5A,  // tag
+    0x00, 0x12, 0x34, 0x56,  // transaction id
+    0x00, 0x00, 0x12, 0x14,  // type
+    0x00, 0x00, 0x00, 0x06,  // source node
+    0x00, 0x00, 0x00, 0x03,  // source board
+    0x00, 0x00, 0x00, 0x04,  // source processor
+    0x00, 0x00, 0x00, 0x0C,  // target node
+    0x00, 0x00, 0x00, 0x09,  // target board
+    0x00, 0x00, 0x00, 0x0A,  // target processor
+    0x00, 0x00, 0x01, 0x02,  // source instance
+    0x00, 0x00, 0x00, 0x05,  // source component
+    0x00, 0x00, 0x07, 0x08,  // target instance
+    0x00, 0x00, 0x00, 0x0B,  // target component
+};
+
+TEST(TKSFrame, MessageFrameIsGolden) {
+    TKMsg32Bit* b = sampleBlock(2);
+    Bytes out;
+    ASSERT_TRUE(tksEncodeMessageFrame(b, out));
+    Bytes golden = {0x00, 0x00, 0x03, 0xE9, 0x00, 0x00, 0x00, 0x00, 0x00, 0x00,
+                    0x00, 0x38, 0x00, 0x00, 0x00, 0x02, 0x00, 0x00, 0x00, 0x00};
+    golden.insert(golden.end(), kSampleHeaderWords.begin(), kSampleHeaderWords.end());
+    golden.insert(golden.end(), {0x00, 0x00, 0x00, 0x02, 0xAB, 0xAC});
+    ExpectBytes(out, golden);
+    EXPECT_EQ(78u, out.size());
+
+    msg_t m = tksMakeMessageFrame(b);
+    ExpectBytes(tksEncodeFrame(m), golden);
+    free_msg(m);
+    tkMsgFree(b);
+}
+
+TEST(TKSFrame, EmptyBodyMakesA76ByteFrame) {
+    TKMsg32Bit* b = sampleBlock(0);
+    Bytes out;
+    ASSERT_TRUE(tksEncodeMessageFrame(b, out));
+    EXPECT_EQ(76u, out.size());
+    ExpectBytes(Bytes(out.begin() + 12, out.begin() + 16), {0, 0, 0, 0});
+    tkMsgFree(b);
+}
+
+TEST(TKSFrame, MessageRoundTripKeepsTheFirstWord) {
+    TKMsg32Bit* b = sampleBlock(3);
+    Bytes out;
+    ASSERT_TRUE(tksEncodeMessageFrame(b, out));
+    MemorySource src(out);
+    msg_t m;
+    ASSERT_EQ(TKS_READ_OK, tksReadFrame(src, m));
+    TKMsg32Bit* back = tksBlockFromFrame(m);
+    free_msg(m);
+    ASSERT_NE(nullptr, back);
+    EXPECT_EQ(0x1234565Au, back->transTag);
+    EXPECT_EQ(0, std::memcmp(b, back, TK_MSG_HEADER_SIZE + 3));
+    tkMsgFree(back);
+    tkMsgFree(b);
+}
+
+TEST(TKSFrame, OpenAndAssignedBodiesAreGolden) {
+    TKSOpenRequest req;
+    req.addr.node = 1;
+    req.addr.board = 2;
+    req.addr.processor = 3;
+    req.addr.component = 4;
+    req.addr.instance = 0x0506;
+    req.maxRetMsgSize = 512;
+    req.depth = 5;
+    Bytes open(TKS_OPEN_BODY_BYTES);
+    tksEncodeOpen(req, open.data());
+    ExpectBytes(
+        open, {0, 0, 0, 1, 0, 0, 0, 2, 0, 0, 0, 3, 0, 0, 0, 4, 0, 0, 5, 6, 0, 0, 2, 0, 0, 0, 0, 5});
+
+    Bytes assigned(TKS_ASSIGNED_BODY_BYTES);
+    tksEncodeAssigned(req.addr, assigned.data());
+    ExpectBytes(assigned, {0, 0, 0, 1, 0, 0, 0, 2, 0, 0, 0, 3, 0, 0, 0, 4, 0, 0, 5, 6});
+    msg_t m;
+    m.type = TKS_FRAME_ASSIGNED;
+    m.size = TKS_ASSIGNED_BODY_BYTES;
+    m.body = assigned.data();
+    TKCompDesc back{};
+    ASSERT_TRUE(tksDecodeAssigned(m, back));
+    EXPECT_EQ(0x0506, back.instance);
+    EXPECT_EQ(1, back.node);
+    m.size = 16;
+    EXPECT_FALSE(tksDecodeAssigned(m, back));
+}
+
+TEST(TKSFrame, CloseFramesAreHeadersOnly) {
+    msg_t m;
+    m.type = TKS_FRAME_CLOSE;
+    ExpectBytes(tksEncodeFrame(m),
+                {0, 0, 0x07, 0xD0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0});
+    m.type = TKS_FRAME_CLOSE_ACK;
+    ExpectBytes(tksEncodeFrame(m),
+                {0, 0, 0x07, 0xD1, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0});
+}
+
+TEST(TKSFrame, WordSwapIsBigEndian) {
+    unsigned int words[2] = {0x01020304, 0xA0B0C0D0};
+    unsigned char wire[8];
+    TKS_htonU32(wire, words, 8);
+    ExpectBytes(Bytes(wire, wire + 8), {1, 2, 3, 4, 0xA0, 0xB0, 0xC0, 0xD0});
+    unsigned int back[2] = {0, 0};
+    TKS_ntohU32(back, wire, 8);
+    EXPECT_EQ(words[0], back[0]);
+    EXPECT_EQ(words[1], back[1]);
+}
+
+struct SizeCase {
+    std::uint32_t size;
+    std::uint32_t exSize;
+    bool valid;
+};
+
+class TKSFrameLimit : public ::testing::TestWithParam<SizeCase> {};
+
+TEST_P(TKSFrameLimit, PartsOver102400AreRefusedOnSending) {
+    const SizeCase& c = GetParam();
+    Bytes body(c.size), ex(c.exSize);
+    msg_t m;
+    m.type = TKS_FRAME_MESSAGE;
+    m.size = c.size;
+    m.ex_size = c.exSize;
+    m.body = body.data();
+    m.ex = ex.data();
+    EXPECT_EQ(c.valid, !tksEncodeFrame(m).empty());
+}
+
+INSTANTIATE_TEST_SUITE_P(Boundaries, TKSFrameLimit,
+                         ::testing::Values(SizeCase{102400, 0, true}, SizeCase{0, 102400, true},
+                                           SizeCase{102401, 0, false}, SizeCase{0, 102401, false}));
+
+TEST(TKSFrameRead, OversizeFrameIsConsumedThenRefused) {
+    Bytes wire;
+    PutU32(wire, TKS_FRAME_MESSAGE);
+    PutU32(wire, 0);
+    PutU32(wire, 102401);
+    PutU32(wire, 3);
+    PutU32(wire, 0);
+    wire.insert(wire.end(), 102401 + 3, 0x11);
+    TKMsg32Bit* b = sampleBlock(1);
+    Bytes good;
+    tksEncodeMessageFrame(b, good);
+    tkMsgFree(b);
+    wire.insert(wire.end(), good.begin(), good.end());
+
+    MemorySource src(wire);
+    msg_t m;
+    EXPECT_EQ(TKS_READ_OVERSIZE, tksReadFrame(src, m));
+    EXPECT_EQ(nullptr, m.body);
+    EXPECT_EQ(good.size(), src.left());
+    msg_t next;
+    ASSERT_EQ(TKS_READ_OK, tksReadFrame(src, next));
+    EXPECT_EQ(TKS_FRAME_MESSAGE, next.type);
+    free_msg(next);
+}
+
+TEST(TKSFrameRead, EveryTruncationFailsWithoutAPartialFrame) {
+    TKMsg32Bit* b = sampleBlock(5);
+    Bytes good;
+    tksEncodeMessageFrame(b, good);
+    tkMsgFree(b);
+    for (std::size_t cut = 0; cut < good.size(); ++cut) {
+        MemorySource src(Bytes(good.begin(), good.begin() + cut));
+        msg_t m;
+        EXPECT_EQ(TKS_READ_FAILED, tksReadFrame(src, m)) << "cut at " << cut;
+        EXPECT_EQ(nullptr, m.body);
+        EXPECT_EQ(nullptr, m.ex);
+    }
+}
+
+struct Malformed {
+    const char* name;
+    std::uint32_t size;
+    std::uint32_t exSize;
+    std::uint32_t word13;
+};
+
+class TKSFrameMalformed : public ::testing::TestWithParam<Malformed> {};
+
+TEST_P(TKSFrameMalformed, IsNotTurnedIntoABlock) {
+    const Malformed& c = GetParam();
+    Bytes body(c.size, 0);
+    for (std::size_t i = 52; i + 4 <= body.size() && i == 52; i += 4) {
+        body[i] = static_cast<unsigned char>(c.word13 >> 24);
+        body[i + 1] = static_cast<unsigned char>(c.word13 >> 16);
+        body[i + 2] = static_cast<unsigned char>(c.word13 >> 8);
+        body[i + 3] = static_cast<unsigned char>(c.word13);
+    }
+    Bytes ex(c.exSize + 1, 0x33);
+    msg_t m;
+    m.type = TKS_FRAME_MESSAGE;
+    m.size = c.size;
+    m.ex_size = c.exSize;
+    m.body = body.data();
+    m.ex = ex.data();
+    EXPECT_EQ(nullptr, tksBlockFromFrame(m));
+}
+
+INSTANTIATE_TEST_SUITE_P(Bodies, TKSFrameMalformed,
+                         ::testing::Values(Malformed{"EmptyHeader", 0, 0, 0},
+                                           Malformed{"ShortHeader", 10, 0, 0},
+                                           Malformed{"LongHeader", 60, 4, 4},
+                                           Malformed{"CountLargerThanBody", 56, 4, 1000},
+                                           Malformed{"CountSmallerThanBody", 56, 100, 4}),
+                         [](const ::testing::TestParamInfo<Malformed>& i) {
+                             return std::string(i.param.name);
+                         });
+
+}  // namespace

@@ -1,0 +1,120 @@
+#include "transport/TKSMsgRef.h"
+
+#include <gtest/gtest.h>
+
+#include <cstring>
+
+namespace {
+
+TKCompDesc addr(std::uint16_t instance, std::uint8_t board, std::uint8_t processor,
+                std::uint8_t component, std::uint8_t node) {
+    TKCompDesc d{};
+    d.instance = instance;
+    d.board = board;
+    d.processor = processor;
+    d.component = component;
+    d.node = node;
+    return d;
+}
+
+TEST(TKSMsgRef, HeaderAccessorsReachTheBlock) {
+    TKSMsgRef r(6u);
+    r.setMsgType(0x1214);
+    r.setTrans(0x123456);
+    r.setSrcAddr(addr(1, 2, 3, 4, 5));
+    r.setTgtAddr(addr(6, 7, 8, 9, 10));
+    TKMsg32Bit* b = r.getMsgRef();
+    EXPECT_EQ(6u, r.getSize());
+    EXPECT_EQ(0x1214u, b->type);
+    EXPECT_EQ(0x12345600u, b->transTag);
+    EXPECT_EQ(0x123456u, r.getTrans());
+    EXPECT_EQ(addr(1, 2, 3, 4, 5), r.getSrcAddr());
+    EXPECT_EQ(addr(6, 7, 8, 9, 10), r.getTgtAddr());
+    EXPECT_EQ(4, b->srcComponent);
+    EXPECT_EQ(10, b->tgtNode);
+    r.free();
+    EXPECT_EQ(nullptr, r.getMsgRef());
+}
+
+TEST(TKSMsgRef, TransactionIdKeepsTheTagByte) {
+    TKSMsgRef r(0u);
+    r.getMsgRef()->transTag = 0x5A;
+    r.setTrans(0x1000000);
+    EXPECT_EQ(0u, r.getTrans());
+    EXPECT_EQ(0x5Au, r.getMsgRef()->transTag);
+    r.setTrans(0x123456);
+    EXPECT_EQ(0x1234565Au, r.getMsgRef()->transTag);
+    r.free();
+}
+
+TEST(TKSMsgRef, CopiesShareTheBlock) {
+    TKSMsgRef a(4u);
+    TKSMsgRef b = a;
+    TKSMsgRef c;
+    c = a;
+    EXPECT_EQ(a.getMsgRef(), b.getMsgRef());
+    EXPECT_EQ(a.getMsgRef(), c.getMsgRef());
+    a.free();
+}
+
+TEST(TKSMsgRef, CloneCopiesSizePlus48Bytes) {
+    TKSMsgRef a(5u);
+    a.setMsgType(9);
+    std::memcpy(tkMsgBody(a.getMsgRef()), "\x01\x02\x03\x04\x05", 5);
+    // The room behind the body travels with a whole copy too.
+    reinterpret_cast<unsigned char*>(a.getMsgRef())[5 + 47] = 0xEE;
+    TKSMsgRef b = a.clone();
+    ASSERT_NE(a.getMsgRef(), b.getMsgRef());
+    EXPECT_EQ(0, std::memcmp(a.getMsgRef(), b.getMsgRef(), 5 + 48));
+    a.free();
+    b.free();
+}
+
+TEST(TKSMsgRef, ReallocOnEmptyAllocatesAndOtherwiseResizes) {
+    TKSMsgRef r;
+    r.realloc(3);
+    ASSERT_NE(nullptr, r.getMsgRef());
+    EXPECT_EQ(3u, r.getSize());
+    r.realloc(300);
+    EXPECT_EQ(300u, r.getSize());
+    r.free();
+}
+
+TEST(TKSMsgRef, AllocationFailureCarriesTheSize) {
+    try {
+        TKSMsgRef r(0xFFFFFFF0u);
+        FAIL() << "no AllocationError";
+    } catch (const TKSMsgRef::AllocationError& e) {
+        EXPECT_EQ(0xFFFFFFF0u, e.getSize());
+    }
+    TKSMsgRef r(1u);
+    try {
+        r.realloc(0xFFFFFFF0u);
+        FAIL() << "no AllocationError";
+    } catch (const TKSMsgRef::AllocationError& e) {
+        EXPECT_EQ(0xFFFFFFF0u, e.getSize());
+    }
+    EXPECT_EQ(1u, r.getSize());
+    r.free();
+}
+
+TEST(TKSMsgRefDeathTest, HeaderAccessOnAnEmptyHandleStops) {
+    TKSMsgRef r;
+    EXPECT_DEATH(r.getMsgType(), "msgref");
+    EXPECT_DEATH(r.setTrans(1), "TKSMsgRef");
+}
+
+TEST(TKCompDescEquality, DiffersOnEachOfTheFiveFields) {
+    TKCompDesc base = addr(1, 2, 3, 4, 5);
+    EXPECT_EQ(base, addr(1, 2, 3, 4, 5));
+    EXPECT_NE(base, addr(9, 2, 3, 4, 5));
+    EXPECT_NE(base, addr(1, 9, 3, 4, 5));
+    EXPECT_NE(base, addr(1, 2, 9, 4, 5));
+    EXPECT_NE(base, addr(1, 2, 3, 9, 5));
+    EXPECT_NE(base, addr(1, 2, 3, 4, 9));
+    TKCompDesc padded = base;
+    padded.reserved0 = 0x77;
+    EXPECT_EQ(base, padded);
+}
+
+}  // namespace

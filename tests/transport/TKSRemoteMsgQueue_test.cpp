@@ -1,0 +1,317 @@
+#include "transport/TKSRemoteMsgQueue.h"
+
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <chrono>
+#include <condition_variable>
+#include <cstring>
+#include <mutex>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "ScriptedRelay.h"
+#include "transport/TKSMsgQueue.h"
+
+namespace {
+
+using namespace std::chrono_literals;
+using Clock = std::chrono::steady_clock;
+
+class Inbox : public TKSAsyncMsgReceiver {
+  public:
+    int receive(TKSMsgRef& ref) {
+        std::lock_guard<std::mutex> lk(m);
+        types.push_back(ref.getMsgType());
+        ref.free();
+        cv.notify_all();
+        return 1;
+    }
+    bool waitFor(std::size_t n) {
+        std::unique_lock<std::mutex> lk(m);
+        return cv.wait_for(lk, 5s, [&] { return types.size() >= n; });
+    }
+    std::vector<unsigned int> got() {
+        std::lock_guard<std::mutex> lk(m);
+        return types;
+    }
+
+  private:
+    std::mutex m;
+    std::condition_variable cv;
+    std::vector<unsigned int> types;
+};
+
+TKMsg32Bit* blockFor(TKCompDesc to, unsigned int type, unsigned int trans, unsigned int size) {
+    TKMsg32Bit* b = nullptr;
+    tkMsgAllocate(size, &b);
+    tkMsgFieldPut(b, TK_FIELD_TGT, &to);
+    b->type = type;
+    b->transTag = trans << 8;
+    for (unsigned int i = 0; i < size; ++i) {
+        tkMsgBody(b)[i] = static_cast<unsigned char>(i + 1);
+    }
+    return b;
+}
+
+Bytes frameHeader(std::uint32_t type, std::uint32_t size, std::uint32_t exSize) {
+    Bytes b;
+    PutU32(b, type);
+    PutU32(b, 0);
+    PutU32(b, size);
+    PutU32(b, exSize);
+    PutU32(b, 0xDEADBEEF);  // the sender's own pointer: ignored
+    return b;
+}
+
+TKSMsgQueue* openQueue(const ScriptedRelay& relay) {
+    TKCompDesc want{};
+    want.node = 1;
+    want.board = 2;
+    want.processor = 3;
+    want.component = 4;
+    want.instance = 0x0506;
+    return new TKSMsgQueue(want, 512, 5, relay.address().c_str());
+}
+
+TEST(RemoteQueue, OpenSendsTheRequestedAddressAndTakesTheAssignedOne) {
+    Bytes openBody;
+    std::atomic<bool> closed{false};
+    ScriptedRelay relay([&](sock& conn) {
+        ASSERT_TRUE(ScriptedRelay::acceptOpen(conn, &openBody));
+        ScriptedRelay::serve(conn, [](sock&, TKMsg32Bit* b) { tkMsgFree(b); });
+        closed = true;
+    });
+    std::unique_ptr<TKSMsgQueue> q(openQueue(relay));
+    EXPECT_TRUE(q->getHostDesc() == ScriptedRelay::assignedAddress());
+    auto t0 = Clock::now();
+    q.reset();
+    // The close was acknowledged: no 5 s wait.
+    EXPECT_LT(Clock::now() - t0, 4s);
+    relay.join();
+    EXPECT_TRUE(closed.load());
+    ExpectBytes(openBody, {0, 0, 0, 1, 0, 0, 0, 2, 0, 0, 0, 3, 0, 0,
+                           0, 4, 0, 0, 5, 6, 0, 0, 2, 0, 0, 0, 0, 5});
+}
+
+TEST(RemoteQueue, RequestTravelsAsAFrameAndTheReplyComesBack) {
+    Bytes seen;
+    ScriptedRelay relay([&](sock& conn) {
+        ASSERT_TRUE(ScriptedRelay::acceptOpen(conn));
+        Bytes header(20);
+        ASSERT_EQ(0, conn.readblock(header.data(), 20));
+        Bytes rest(56 + 3);
+        ASSERT_EQ(0, conn.readblock(rest.data(), static_cast<long>(rest.size())));
+        seen = header;
+        seen.insert(seen.end(), rest.begin(), rest.end());
+        // Reply: same transaction id, completion type, from the target, 2 body bytes.
+        TKCompDesc from{};
+        from.board = 1;
+        from.processor = 1;
+        from.instance = 5;
+        TKMsg32Bit* reply = blockFor(ScriptedRelay::assignedAddress(), 0x1215, 0x2345, 2);
+        tkMsgFieldPut(reply, TK_FIELD_SRC, &from);
+        ScriptedRelay::sendBlock(conn, reply);
+        ScriptedRelay::serve(conn, [](sock&, TKMsg32Bit* b) { tkMsgFree(b); });
+    });
+    std::unique_ptr<TKSMsgQueue> q(openQueue(relay));
+    TKCompDesc target{};
+    target.board = 1;
+    target.processor = 1;
+    target.instance = 5;
+    TKSMsgRef req(blockFor(target, 0x1214, 0x2345, 3));
+    req.getMsgRef()->transTag |= 0x5A;
+    TKSMsgRef reply = q->request(req, 5000, 0x1215, 0);
+    ASSERT_NE(nullptr, reply.getMsgRef());
+    EXPECT_EQ(0x1215u, reply.getMsgType());
+    EXPECT_EQ(2u, reply.getSize());
+    EXPECT_EQ(1, tkMsgBody(reply.getMsgRef())[0]);
+    EXPECT_EQ(2, tkMsgBody(reply.getMsgRef())[1]);
+    reply.free();
+    q.reset();
+    relay.join();
+
+    Bytes golden = {0x00, 0x00, 0x03, 0xE9, 0x00, 0x00, 0x00, 0x00, 0x00, 0x00, 0x00, 0x38, 0x00,
+                    0x00, 0x00, 0x03, 0x00, 0x00, 0x00, 0x00,
+                    // tag, trans, type
+                    0x00, 0x00, 0x00, 0x5A, 0x00, 0x00, 0x23, 0x45, 0x00, 0x00, 0x12, 0x14,
+                    // source node, board, processor: the assigned address
+                    0x00, 0x00, 0x00, 0x02, 0x00, 0x00, 0x00, 0xFE, 0x00, 0x00, 0x00, 0x00,
+                    // target node, board, processor
+                    0x00, 0x00, 0x00, 0x00, 0x00, 0x00, 0x00, 0x01, 0x00, 0x00, 0x00, 0x01,
+                    // source instance, source component, target instance, target component
+                    0x00, 0x00, 0x43, 0x21, 0x00, 0x00, 0x00, 0x00, 0x00, 0x00, 0x00, 0x05, 0x00,
+                    0x00, 0x00, 0x00,
+                    // body size and body
+                    0x00, 0x00, 0x00, 0x03, 0x01, 0x02, 0x03};
+    ExpectBytes(seen, golden);
+}
+
+// What the relay sends after the open, then a good event: the good one must arrive.
+struct HostileCase {
+    const char* name;
+    Bytes junk;
+    bool errorLine;
+};
+
+Bytes oversize() {
+    Bytes b = frameHeader(TKS_FRAME_MESSAGE, 102401, 0);
+    b.insert(b.end(), 102401, 0x42);
+    return b;
+}
+
+Bytes unknownType() {
+    Bytes b = frameHeader(4242, 4, 0);
+    b.insert(b.end(), {1, 2, 3, 4});
+    return b;
+}
+
+Bytes shortHeader() {
+    Bytes b = frameHeader(TKS_FRAME_MESSAGE, 8, 0);
+    b.insert(b.end(), 8, 0);
+    return b;
+}
+
+Bytes countTooLarge() {
+    Bytes b = frameHeader(TKS_FRAME_MESSAGE, 56, 2);
+    Bytes words(52, 0);
+    b.insert(b.end(), words.begin(), words.end());
+    PutU32(b, 100000);  // body size word far above the bytes that follow
+    b.insert(b.end(), {9, 9});
+    return b;
+}
+
+class RemoteHostile : public ::testing::TestWithParam<HostileCase> {};
+
+TEST_P(RemoteHostile, BadFrameIsDroppedAndTheNextOneArrives) {
+    const HostileCase& c = GetParam();
+    ScriptedRelay relay([&](sock& conn) {
+        ASSERT_TRUE(ScriptedRelay::acceptOpen(conn));
+        ScriptedRelay::sendRaw(conn, c.junk);
+        ScriptedRelay::sendBlock(conn, blockFor(ScriptedRelay::assignedAddress(), 0x20, 1, 4));
+        ScriptedRelay::serve(conn, [](sock&, TKMsg32Bit* b) { tkMsgFree(b); });
+    });
+    testing::internal::CaptureStderr();
+    Inbox inbox;
+    {
+        std::unique_ptr<TKSMsgQueue> q(openQueue(relay));
+        q->registerAsyncCallback(&inbox, static_cast<TKSAsyncMethod>(&Inbox::receive));
+        ASSERT_TRUE(inbox.waitFor(1));
+        EXPECT_EQ(std::vector<unsigned int>({0x20}), inbox.got());
+        EXPECT_FALSE(q->transportFailed());
+    }
+    relay.join();
+    std::string err = testing::internal::GetCapturedStderr();
+    if (c.errorLine) {
+        EXPECT_NE(std::string::npos, err.find("Error communicating with remote message queue on "))
+            << err;
+    } else {
+        EXPECT_NE(std::string::npos, err.find("Discarding")) << err;
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Frames, RemoteHostile,
+    ::testing::Values(HostileCase{"Oversize", oversize(), true},
+                      HostileCase{"UnknownType", unknownType(), false},
+                      HostileCase{"ShortMessageHeader", shortHeader(), false},
+                      HostileCase{"CountLargerThanMessage", countTooLarge(), false}),
+    [](const ::testing::TestParamInfo<HostileCase>& i) { return std::string(i.param.name); });
+
+TEST(RemoteQueue, BrokenConnectionMidFrameIsReportedOnceAndRequestsTimeOut) {
+    ScriptedRelay relay([](sock& conn) {
+        ASSERT_TRUE(ScriptedRelay::acceptOpen(conn));
+        Bytes part = frameHeader(TKS_FRAME_MESSAGE, 56, 10);
+        part.insert(part.end(), 30, 0);
+        ScriptedRelay::sendRaw(conn, part);
+        // The connection ends here, between header and body.
+    });
+    testing::internal::CaptureStderr();
+    std::unique_ptr<TKSMsgQueue> q(openQueue(relay));
+    relay.join();
+    auto deadline = Clock::now() + 5s;
+    while (!q->transportFailed() && Clock::now() < deadline) {
+        std::this_thread::sleep_for(5ms);
+    }
+    EXPECT_TRUE(q->transportFailed());
+    TKCompDesc target{};
+    target.board = 1;
+    TKSMsgRef req(blockFor(target, 0x1214, 77, 0));
+    TKSMsgRef reply = q->request(req, 50, 0x1215, 0);
+    EXPECT_EQ(nullptr, reply.getMsgRef());
+    auto t0 = Clock::now();
+    q.reset();
+    EXPECT_LT(Clock::now() - t0, 4s);
+    std::string err = testing::internal::GetCapturedStderr();
+
+    std::size_t lines = 0;
+    for (std::size_t at = err.find("Error communicating with remote message queue on 127.0.0.1");
+         at != std::string::npos;
+         at = err.find("Error communicating with remote message queue on", at + 1)) {
+        ++lines;
+    }
+    EXPECT_EQ(10u, lines) << err;
+    std::size_t first = err.find("lost the relay connection");
+    ASSERT_NE(std::string::npos, first) << err;
+    EXPECT_EQ(std::string::npos, err.find("lost the relay connection", first + 1));
+}
+
+TEST(RemoteQueue, RefusedOpenIsACreationError) {
+    ScriptedRelay relay([](sock& conn) {
+        msg_t m;
+        conn.get_msg(m);
+        free_msg(m);
+        ScriptedRelay::sendEmpty(conn, TKS_FRAME_CLOSE_ACK);
+    });
+    EXPECT_THROW(delete openQueue(relay), TKSMsgQueue::CreationError);
+    relay.join();
+}
+
+TEST(RemoteQueue, RelayThatClosesBeforeAnsweringTheOpenIsACreationError) {
+    ScriptedRelay relay([](sock& conn) {
+        msg_t m;
+        conn.get_msg(m);
+        free_msg(m);
+    });
+    EXPECT_THROW(delete openQueue(relay), TKSMsgQueue::CreationError);
+    relay.join();
+}
+
+TEST(RemoteQueue, DestructionWithAPeerThatVanishedDoesNotWait) {
+    ScriptedRelay relay([](sock& conn) { ASSERT_TRUE(ScriptedRelay::acceptOpen(conn)); });
+    testing::internal::CaptureStderr();
+    std::unique_ptr<TKSMsgQueue> q(openQueue(relay));
+    relay.join();
+    auto t0 = Clock::now();
+    q.reset();
+    EXPECT_LT(Clock::now() - t0, 4s);
+    testing::internal::GetCapturedStderr();
+}
+
+TEST(RemoteTransport, OversizeBlockIsNotSentAndStaysWithTheCaller) {
+    ScriptedRelay relay([](sock& conn) {
+        ASSERT_TRUE(ScriptedRelay::acceptOpen(conn));
+        ScriptedRelay::serve(conn, [](sock&, TKMsg32Bit* b) {
+            ADD_FAILURE() << "an oversize block reached the relay";
+            tkMsgFree(b);
+        });
+    });
+    {
+        TKSRemoteMsgQueue t(TKCompDesc{}, 512, 5, relay.address().c_str());
+        TKMsg32Bit* big = blockFor(TKCompDesc{}, 1, 1, 102401);
+        EXPECT_EQ(2, t.msgWrite(big));
+        EXPECT_EQ(1u, big->type);  // still the caller's
+        tkMsgFree(big);
+        // Used on its own, the transport runs the close exchange itself.
+    }
+    relay.join();
+}
+
+TEST(RemoteTransport, ComFailureCarriesHostAndPort) {
+    TKSRemoteService_ComFailure f(std::string(120, 'r').c_str(), 6554);
+    EXPECT_EQ(std::string(99, 'r'), f.getHostName());
+    EXPECT_EQ(6554, f.getPort());
+}
+
+}  // namespace

@@ -1,0 +1,72 @@
+#include "transport/TKSSock.h"
+
+#include <arpa/inet.h>
+#include <gtest/gtest.h>
+
+#include <string>
+
+namespace {
+
+TEST(TKSSockText, StnReadsDecimalAndHex) {
+    EXPECT_EQ(7000, stn("7000"));
+    EXPECT_EQ(6912, stn("0x1b00"));
+    EXPECT_EQ(6912, stn("0X1B00"));
+    EXPECT_EQ(-16, stn("-0x10"));
+    EXPECT_EQ(0, stn("zx"));
+}
+
+TEST(TKSSockText, IsDnTellsNamesFromDottedAddresses) {
+    EXPECT_FALSE(is_dn("10.0.0.1"));
+    EXPECT_TRUE(is_dn("relay"));
+    EXPECT_TRUE(is_dn("10.0.0.1a"));
+    EXPECT_FALSE(is_dn(""));
+}
+
+TEST(TKSSockText, DntoipResolvesOrLeavesEmpty) {
+    char dst[16] = "x";
+    dntoip(dst, "localhost");
+    EXPECT_EQ(std::string("127.0.0.1"), dst);
+    dntoip(dst, "no-such-host.invalid");
+    EXPECT_EQ(std::string(""), dst);
+}
+
+struct HostCase {
+    const char* text;
+    const char* address;
+    int port;
+};
+
+class TKSSockHost : public ::testing::TestWithParam<HostCase> {};
+
+TEST_P(TKSSockHost, ParsesHostAndPort) {
+    const HostCase& c = GetParam();
+    sock s(c.text, 6554);
+    ASSERT_FALSE(s.isFailed());
+    EXPECT_EQ(c.port, s.getPort());
+    EXPECT_EQ(std::string(c.address), inet_ntoa(s.getPeer().sin_addr));
+}
+
+INSTANTIATE_TEST_SUITE_P(Texts, TKSSockHost,
+                         ::testing::Values(HostCase{"10.0.0.1:7000", "10.0.0.1", 7000},
+                                           HostCase{"localhost:0x1b00", "127.0.0.1", 6912},
+                                           HostCase{"localhost", "127.0.0.1", 6554},
+                                           HostCase{"127.0.0.1:1:2", "127.0.0.1", 2}));
+
+TEST(TKSSockHost, UnknownNameFailsWithoutASocket) {
+    sock s("no-such-host.invalid:7000", 6554);
+    EXPECT_TRUE(s.isFailed());
+    EXPECT_EQ(-1, s.getFd());
+    EXPECT_NE(0, s.connect());
+}
+
+TEST(TKSSockHost, RefusedConnectionFails) {
+    sock server(inet_addr("127.0.0.1"), 0);
+    ASSERT_EQ(0, server.bind());
+    int port = server.localPort();
+    server.close();  // nobody listens there now
+    sock s(("127.0.0.1:" + std::to_string(port)).c_str(), 6554);
+    EXPECT_NE(0, s.connect());
+    EXPECT_TRUE(s.isFailed());
+}
+
+}  // namespace
