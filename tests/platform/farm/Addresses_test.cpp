@@ -3,10 +3,12 @@
 #include <gtest/gtest.h>
 
 #include <bit>
+#include <cstring>
 #include <set>
 #include <tuple>
 
 #include "platform/farm/FarmParser.h"
+#include "platform/tkhost/tkhost.h"
 
 namespace farm {
 namespace {
@@ -52,6 +54,19 @@ TEST(Addresses, TKCompDescBytes) {
     bytes[3] = 0xEE;
     bytes[7] = 0xEE;
     EXPECT_EQ(decodeTKCompDesc(bytes.data()), a);
+}
+
+TEST(Addresses, SameBytesAsTheHostLibrarysRecord) {
+    TKCompDesc tk{};
+    tk.instance = 0x2017;
+    tk.board = 2;
+    tk.processor = 1;
+    tk.component = 2;
+    tk.node = 0;
+    std::array<unsigned char, 8> raw{};
+    static_assert(sizeof tk == raw.size());
+    std::memcpy(raw.data(), &tk, sizeof tk);
+    EXPECT_EQ(encodeTKCompDesc(rocClusterAddress(2, 23)), raw);
 }
 
 // Every resource of a farm, by the addresses the plan gives it.
