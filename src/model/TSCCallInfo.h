@@ -12,6 +12,7 @@ class TSCCallInfo : public EventPublication<TSCCallInfo, tolk::TSC::EvtCallInfo_
 
     ~TSCCallInfo() override;
     tolk::staticList<unsigned int> EventTypeList() const override;
+    char* ToZLG() override;
     void Format(char* text);
 };
 

@@ -1,0 +1,106 @@
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <memory>
+#include <thread>
+
+#include "RecordingObserver.h"
+#include "SimFixture.h"
+#include "model/AllAlarms.h"
+#include "model/TSCCallState.h"
+#include "model/TrunkState.h"
+#include "model/VX7EventPublisher.h"
+#include "model/VX7EventZLGLogger.h"
+
+namespace {
+
+using namespace vx7diag;
+
+class PublisherConcurrency : public SimFixture {
+  protected:
+    static void SetUpTestSuite() { UseFarm(""); }
+    static AllAlarms allAlarms;
+    static TrunkState trunkState;
+    static TSCCallState callState;
+};
+
+AllAlarms PublisherConcurrency::allAlarms;
+TrunkState PublisherConcurrency::trunkState;
+TSCCallState PublisherConcurrency::callState;
+
+// Observers come and go on the console thread while a burst of events is being delivered on the
+// publisher's reader thread: every event that reaches an observer is whole and of its trunk.
+TEST_F(PublisherConcurrency, AttachAndDetachWhileEventsFlow) {
+    auto publisher = std::make_unique<VX7EventPublisher>(1, 1, 1);
+    isa::RefPtr<Observer> steady(new RecordingObserver);
+    auto& recorder = *static_cast<RecordingObserver*>(steady.Get());
+    ASSERT_TRUE(publisher->Attach(steady, &allAlarms));
+    Control("bpv 1 1 300");
+    for (int i = 0; i < 20; ++i) {
+        isa::RefPtr<Observer> passing(new RecordingObserver);
+        ASSERT_TRUE(publisher->Attach(passing, &allAlarms));
+        ASSERT_TRUE(publisher->Attach(passing, &trunkState));
+        EXPECT_EQ(publisher->Detach(passing, trunkState), 0);
+        EXPECT_EQ(publisher->Detach(passing, allAlarms), 1);
+    }
+    EXPECT_NE(recorder.WaitFor("Alarm Event:  board=1 trunk=1 type=Bipolar Violation Saturation"),
+              "");
+    for (const std::string& text : recorder.Texts()) {
+        EXPECT_EQ(text.rfind("Alarm Event:  board=1 trunk=1 type=", 0), 0u) << text;
+    }
+    EXPECT_EQ(publisher->Detach(steady, allAlarms), 0);
+}
+
+// Two publishers share the process-wide aspect: an event in delivery for one never shows the
+// board, trunk or channel of the other, and a logger attached to both serialises its writes.
+TEST_F(PublisherConcurrency, TwoTrunksOneAspect) {
+    VX7EventPublisher first(1, 1, 1);
+    VX7EventPublisher second(1, 2, 1);
+    isa::RefPtr<Observer> one(new RecordingObserver);
+    isa::RefPtr<Observer> two(new RecordingObserver);
+    isa::RefPtr<Observer> logger(new VX7EventZLGLogger);
+    ASSERT_TRUE(first.Attach(one, &allAlarms));
+    ASSERT_TRUE(second.Attach(two, &allAlarms));
+    ASSERT_TRUE(first.Attach(logger, &allAlarms));
+    ASSERT_TRUE(second.Attach(logger, &allAlarms));
+    testing::internal::CaptureStdout();
+    Control("ferr 1 1 200");
+    Control("ferr 1 2 200");
+    auto& r1 = *static_cast<RecordingObserver*>(one.Get());
+    auto& r2 = *static_cast<RecordingObserver*>(two.Get());
+    for (int i = 0; i < 300 && (r1.Count() < 200 || r2.Count() < 200); ++i) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(10));
+    }
+    testing::internal::GetCapturedStdout();
+    EXPECT_EQ(r1.Count(), 200u);
+    EXPECT_EQ(r2.Count(), 200u);
+    for (const std::string& text : r1.Texts()) {
+        EXPECT_EQ(text, "Alarm Event:  board=1 trunk=1 type=Frame Error Saturation state=Active");
+    }
+    for (const std::string& text : r2.Texts()) {
+        EXPECT_EQ(text, "Alarm Event:  board=1 trunk=2 type=Frame Error Saturation state=Active");
+    }
+}
+
+// A view that goes while its line is busy: the publisher is destroyed with events in flight,
+// and nothing on the reader thread reaches it afterwards.
+TEST_F(PublisherConcurrency, PublisherDestroyedWhileEventsFlow) {
+    for (int round = 0; round < 5; ++round) {
+        auto publisher = std::make_unique<VX7EventPublisher>(1, 2, 1);
+        isa::RefPtr<Observer> watcher(new RecordingObserver);
+        ASSERT_TRUE(publisher->Attach(watcher, &allAlarms));
+        Control("bpv 1 2 200");
+        std::this_thread::sleep_for(std::chrono::milliseconds(2 * round));
+        publisher.reset();
+    }
+    // The line keeps working for a new publisher.
+    VX7EventPublisher fresh(1, 2, 1);
+    isa::RefPtr<Observer> watcher(new RecordingObserver);
+    ASSERT_TRUE(fresh.Attach(watcher, &trunkState));
+    Control("line 1 2 out 1");
+    EXPECT_EQ(static_cast<RecordingObserver*>(watcher.Get())->WaitFor("Trunk State"),
+              "Trunk State board=1 trunk=2 state=Out Of Service reason=Diagnostic");
+    Control("line 1 2 in 0");
+}
+
+}  // namespace
