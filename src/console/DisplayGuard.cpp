@@ -6,9 +6,10 @@ namespace lineprobe {
 
 namespace {
 
+// Never destroyed: the process may exit while an event thread still holds it.
 std::recursive_timed_mutex& DisplayMutex() {
-    static std::recursive_timed_mutex mutex;
-    return mutex;
+    static auto* mutex = new std::recursive_timed_mutex;
+    return *mutex;
 }
 
 // Set on a thread whose bounded wait failed; see the bounded constructor.

@@ -1,0 +1,89 @@
+// `help` hands the terminal to the pager and gets the screen back whole.
+#include <gtest/gtest.h>
+
+#include <string>
+
+#include "ConsoleScreen.h"
+#include "TerminalSession.h"
+
+namespace lineprobe::testing {
+namespace {
+
+const std::string HELP_TITLE = "LINEPROBE - console diagnostics for VX7 telephony boards";
+
+TerminalOptions WithOrvaneDir(const std::string& dir) {
+    TerminalOptions options;
+    // The pager's own settings of whoever runs the tests must not change what it shows.
+    options.unsetEnv = {"LESS", "LESSOPEN", "LESSCLOSE"};
+    options.env = {{"CORVO_ORVANE_DIR", dir}, {"LESSHISTFILE", "-"}};
+    return options;
+}
+
+void ExpectScreenIntact(TerminalSession& session) {
+    ASSERT_TRUE(session.WaitForRow(PROMPT_ROW, EMPTY_PROMPT_ROW)) << session.Dump();
+    const std::vector<std::string> screen = session.Screen();
+    for (int row : SEPARATOR_ROWS) {
+        EXPECT_TRUE(IsSeparatorRow(screen[static_cast<std::size_t>(row)])) << "row " << row << "\n"
+                                                                           << session.Dump();
+    }
+    EXPECT_EQ(screen[RESULT_ROW].find_first_not_of(' '), std::string::npos) << session.Dump();
+}
+
+TEST(HelpTerminal, PagerShowsTheHelpFileAndQuitReturnsToAnIntactScreen) {
+    TerminalOptions options = WithOrvaneDir("inst/");
+    options.files = {{"inst/bin/lineprobe_help.txt", *ReadWholeFile(LINEPROBE_HELP_FILE)}};
+    TerminalSession session(options);
+    ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
+
+    session.TypeLine("help");
+    ASSERT_TRUE(session.WaitForText(HELP_TITLE)) << session.Dump();
+    EXPECT_TRUE(session.WaitForLogLine("lineprobe.log", "less inst/bin/lineprobe_help.txt"));
+    EXPECT_FALSE(session.WaitForText(PROMPT, std::chrono::milliseconds(0)) &&
+                 session.TextAt(PROMPT_ROW, PROMPT_COL, 3) == PROMPT)
+        << "the prompt must not be drawn over the pager\n"
+        << session.Dump();
+
+    session.SendKeys({"q"});
+    ExpectScreenIntact(session);
+    EXPECT_FALSE(session.WaitForText(HELP_TITLE, std::chrono::milliseconds(0)));
+    EXPECT_TRUE(session.StillRunning());
+
+    session.TypeLine("bogus");
+    EXPECT_TRUE(session.WaitForRow(RESULT_ROW, "  Unrecgnized Command")) << session.Dump();
+    EXPECT_EQ(session.ReadErrLog(), std::optional<std::string>(""));
+    EXPECT_TRUE(session.StillRunning());
+}
+
+TEST(HelpTerminal, WithoutTheVariableComesStraightBackSilently) {
+    TerminalOptions options = WithOrvaneDir("unused/");
+    options.env.clear();
+    options.unsetEnv.push_back("CORVO_ORVANE_DIR");
+    TerminalSession session(options);
+    ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
+
+    session.TypeLine("help");
+    ASSERT_TRUE(
+        session.WaitForLogLine("lineprobe.log", "Calling CmdProcessor::FindCommand: cmdStr= help"));
+    ExpectScreenIntact(session);
+    EXPECT_EQ(session.ReadLog()->find("less "), std::string::npos);
+    EXPECT_EQ(session.ReadErrLog(), std::optional<std::string>(""));
+    EXPECT_TRUE(session.StillRunning());
+}
+
+TEST(HelpTerminal, TooLongCommandLineIsNotBuiltAndSaysSoInTheErrorLog) {
+    const std::string dir = "/" + std::string(300, 'd') + "/";
+    TerminalSession session(WithOrvaneDir(dir));
+    ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
+
+    session.TypeLine("help");
+    ASSERT_TRUE(session.WaitForLogLine(
+        "lineprobe_err.log", "help not shown: the pager command line for CORVO_ORVANE_DIR=" + dir +
+                                 " would be longer than 255 characters"))
+        << session.ReadErrLog().value_or("(no error log)");
+    ExpectScreenIntact(session);
+    EXPECT_EQ(session.ReadLog()->find("less "), std::string::npos);
+    EXPECT_TRUE(session.StillRunning());
+}
+
+}  // namespace
+}  // namespace lineprobe::testing

@@ -1,0 +1,64 @@
+// Every end of a running lineprobe passes through the shutdown: status 1 and its line in
+// the trace log.
+#include <gtest/gtest.h>
+
+#include <csignal>
+#include <string>
+
+#include "ConsoleScreen.h"
+#include "TerminalSession.h"
+
+namespace lineprobe::testing {
+namespace {
+
+struct EndCase {
+    const char* name;
+    const char* line;  // typed; empty for a signal
+    int sig;
+    const char* trace;
+};
+
+void PrintTo(const EndCase& c, std::ostream* os) {
+    *os << c.name;
+}
+
+class ShutdownTerminalTest : public ::testing::TestWithParam<EndCase> {};
+
+TEST_P(ShutdownTerminalTest, EndsWithStatusOneAndLogsWhy) {
+    const EndCase& c = GetParam();
+    TerminalSession session;
+    ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
+
+    if (c.sig != 0) {
+        session.Type("half a li");
+        ASSERT_TRUE(session.WaitForRow(PROMPT_ROW, "  -> half a li")) << session.Dump();
+        session.Signal(c.sig);
+    } else {
+        session.TypeLine(c.line);
+    }
+
+    ASSERT_EQ(session.WaitForExit(), std::optional<int>(1)) << session.Dump();
+    const std::optional<std::string> log = session.ReadLog();
+    ASSERT_TRUE(log.has_value());
+    EXPECT_TRUE(log->size() > std::string(c.trace).size() &&
+                log->substr(log->size() - std::string(c.trace).size() - 1) ==
+                    std::string(c.trace) + "\n")
+        << "the log should end with '" << c.trace << "':\n"
+        << *log;
+    EXPECT_EQ(session.ReadErrLog(), std::optional<std::string>(""));
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Ends, ShutdownTerminalTest,
+    ::testing::Values(
+        EndCase{"Quit", "quit", 0, "terninating app due to SIGUSR1"},
+        EndCase{"QuitWithThreeNumbers", "quit 1 2 3", 0, "terninating app due to SIGUSR1"},
+        // A word ends the scan: one field, so quit runs.
+        EndCase{"QuitFollowedByAWord", "quit now 1 2", 0, "terninating app due to SIGUSR1"},
+        EndCase{"Sigint", "", SIGINT, "terninating app due to SIGINT"},
+        EndCase{"Sigterm", "", SIGTERM, "terninating app due to SIGTERM"},
+        EndCase{"Sigusr1", "", SIGUSR1, "terninating app due to SIGUSR1"}),
+    [](const ::testing::TestParamInfo<EndCase>& info) { return std::string(info.param.name); });
+
+}  // namespace
+}  // namespace lineprobe::testing

@@ -1,0 +1,354 @@
+#include "TerminalSession.h"
+
+#include <fcntl.h>
+#include <spawn.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <atomic>
+#include <csignal>
+#include <cstdlib>
+#include <fstream>
+#include <sstream>
+#include <stdexcept>
+#include <thread>
+
+extern char** environ;
+
+namespace lineprobe::testing {
+
+namespace {
+
+constexpr std::chrono::milliseconds POLL_STEP{20};
+constexpr const char* SESSION = "lp";
+
+std::string ShellQuote(const std::string& text) {
+    std::string quoted = "'";
+    for (char c : text) {
+        if (c == '\'') {
+            quoted += "'\\''";
+        } else {
+            quoted += c;
+        }
+    }
+    return quoted + "'";
+}
+
+// The environment of the tmux client and so of its server and panes: a plain C locale,
+// so that line-drawing characters are read back one byte per column, and no trace of a
+// tmux the tests themselves may run in.
+std::vector<std::string> ClientEnvironment() {
+    std::vector<std::string> env;
+    for (char** entry = environ; *entry != nullptr; ++entry) {
+        const std::string text = *entry;
+        const std::string name = text.substr(0, text.find('='));
+        if (name == "TMUX" || name == "TMUX_PANE" || name == "LANG" || name.rfind("LC_", 0) == 0) {
+            continue;
+        }
+        env.push_back(text);
+    }
+    env.push_back("LC_ALL=C");
+    return env;
+}
+
+std::string RunCapture(const std::vector<std::string>& argv, int* status) {
+    int pipeFds[2];
+    if (pipe2(pipeFds, O_CLOEXEC) != 0) {
+        throw std::runtime_error("pipe failed");
+    }
+    posix_spawn_file_actions_t actions;
+    posix_spawn_file_actions_init(&actions);
+    posix_spawn_file_actions_adddup2(&actions, pipeFds[1], STDOUT_FILENO);
+    posix_spawn_file_actions_addopen(&actions, STDERR_FILENO, "/dev/null", O_WRONLY, 0);
+    posix_spawn_file_actions_addopen(&actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
+
+    std::vector<char*> args;
+    for (const std::string& arg : argv) {
+        args.push_back(const_cast<char*>(arg.c_str()));
+    }
+    args.push_back(nullptr);
+    std::vector<std::string> envText = ClientEnvironment();
+    std::vector<char*> env;
+    for (std::string& entry : envText) {
+        env.push_back(entry.data());
+    }
+    env.push_back(nullptr);
+
+    pid_t child = -1;
+    const int spawned = posix_spawnp(&child, args[0], &actions, nullptr, args.data(), env.data());
+    posix_spawn_file_actions_destroy(&actions);
+    close(pipeFds[1]);
+    if (spawned != 0) {
+        close(pipeFds[0]);
+        throw std::runtime_error("cannot run " + argv[0]);
+    }
+    std::string output;
+    char buffer[4096];
+    for (;;) {
+        const ssize_t got = read(pipeFds[0], buffer, sizeof buffer);
+        if (got > 0) {
+            output.append(buffer, static_cast<std::size_t>(got));
+        } else if (got == 0 || errno != EINTR) {
+            break;
+        }
+    }
+    close(pipeFds[0]);
+    int waitStatus = 0;
+    while (waitpid(child, &waitStatus, 0) < 0 && errno == EINTR) {
+    }
+    if (status != nullptr) {
+        *status = WIFEXITED(waitStatus) ? WEXITSTATUS(waitStatus) : -1;
+    }
+    return output;
+}
+
+template <typename Predicate>
+bool PollUntil(std::chrono::milliseconds timeout, Predicate done) {
+    const auto deadline = std::chrono::steady_clock::now() + timeout;
+    for (;;) {
+        if (done()) {
+            return true;
+        }
+        if (std::chrono::steady_clock::now() >= deadline) {
+            return false;
+        }
+        std::this_thread::sleep_for(POLL_STEP);
+    }
+}
+
+std::string Trimmed(std::string text) {
+    while (!text.empty() && (text.back() == '\n' || text.back() == ' ')) {
+        text.pop_back();
+    }
+    return text;
+}
+
+}  // namespace
+
+std::optional<std::string> ReadWholeFile(const std::filesystem::path& path) {
+    std::ifstream file(path, std::ios::binary);
+    if (!file) {
+        return std::nullopt;
+    }
+    std::ostringstream content;
+    content << file.rdbuf();
+    return content.str();
+}
+
+bool HasLine(const std::string& text, const std::string& line) {
+    std::istringstream lines(text);
+    for (std::string each; std::getline(lines, each);) {
+        if (each == line) {
+            return true;
+        }
+    }
+    return false;
+}
+
+TerminalSession::TerminalSession(TerminalOptions options)
+    : rows_(options.rows), cols_(options.cols) {
+    static std::atomic<int> counter{0};
+    std::string pattern = (std::filesystem::temp_directory_path() / "lp-term-XXXXXX").string();
+    if (mkdtemp(pattern.data()) == nullptr) {
+        throw std::runtime_error("cannot make a temporary directory");
+    }
+    root_ = pattern;
+    workDir_ = root_ / "work";
+    std::filesystem::create_directory(workDir_);
+    for (const auto& [name, content] : options.files) {
+        std::filesystem::create_directories((workDir_ / name).parent_path());
+        std::ofstream(workDir_ / name, std::ios::binary) << content;
+    }
+    {
+        std::ofstream conf(root_ / "tmux.conf");
+        conf << "set -g status off\n"
+                "set -g remain-on-exit on\n"
+                "set -g default-terminal screen\n"
+                "set -g escape-time 0\n";
+    }
+    socket_ = "lp-test-" + std::to_string(getpid()) + "-" + std::to_string(counter++) + "-" +
+              root_.filename().string();
+
+    std::string command = "exec env";
+    for (const std::string& name : options.unsetEnv) {
+        command += " -u " + ShellQuote(name);
+    }
+    for (const auto& [name, value] : options.env) {
+        command += " " + ShellQuote(name + "=" + value);
+    }
+#ifdef LINEPROBE_BINARY
+    if (options.binary.empty()) {
+        options.binary = LINEPROBE_BINARY;
+    }
+#endif
+    command += " " + ShellQuote(options.binary);
+    for (const std::string& arg : options.args) {
+        command += " " + ShellQuote(arg);
+    }
+
+    int status = 0;
+    RunCapture({"tmux", "-L", socket_, "-f", (root_ / "tmux.conf").string(), "new-session", "-d",
+                "-s", SESSION, "-x", std::to_string(cols_), "-y", std::to_string(rows_), "-c",
+                workDir_.string(), command},
+               &status);
+    if (status != 0) {
+        throw std::runtime_error("tmux could not start the session");
+    }
+    pid_ = static_cast<pid_t>(std::stol(PaneFormat("#{pane_pid}")));
+}
+
+TerminalSession::~TerminalSession() {
+    try {
+        Tmux({"kill-server"});
+    } catch (...) {
+    }
+    std::error_code ignored;
+    std::filesystem::remove_all(root_, ignored);
+}
+
+std::string TerminalSession::Tmux(const std::vector<std::string>& args, int* status) {
+    std::vector<std::string> argv = {"tmux", "-L", socket_};
+    argv.insert(argv.end(), args.begin(), args.end());
+    return RunCapture(argv, status);
+}
+
+std::string TerminalSession::PaneFormat(const std::string& format) {
+    return Trimmed(Tmux({"display-message", "-p", "-t", SESSION, format}));
+}
+
+void TerminalSession::Type(const std::string& text) {
+    if (!text.empty()) {
+        Tmux({"send-keys", "-t", SESSION, "-l", text});
+    }
+}
+
+void TerminalSession::TypeLine(const std::string& text) {
+    Type(text);
+    SendKeys({"Enter"});
+}
+
+void TerminalSession::SendKeys(const std::vector<std::string>& keys) {
+    std::vector<std::string> args = {"send-keys", "-t", SESSION};
+    args.insert(args.end(), keys.begin(), keys.end());
+    Tmux(args);
+}
+
+std::vector<std::string> TerminalSession::Screen() {
+    // When the program has ended, tmux scrolls the pane up one row to write its "Pane is
+    // dead" line at the bottom: read the screen as it was before that.
+    std::vector<std::string> capture = {"capture-pane", "-p", "-t", SESSION};
+    if (PaneFormat("#{pane_dead}") == "1") {
+        capture.insert(capture.end(), {"-S", "-1", "-E", std::to_string(rows_ - 2)});
+    }
+    std::istringstream lines(Tmux(capture));
+    std::vector<std::string> screen;
+    for (std::string line; std::getline(lines, line) && static_cast<int>(screen.size()) < rows_;) {
+        line.resize(static_cast<std::size_t>(cols_), ' ');
+        screen.push_back(line);
+    }
+    while (static_cast<int>(screen.size()) < rows_) {
+        screen.emplace_back(static_cast<std::size_t>(cols_), ' ');
+    }
+    return screen;
+}
+
+std::string TerminalSession::Row(int row) {
+    const std::vector<std::string> screen = Screen();
+    return row >= 0 && row < rows_ ? screen[static_cast<std::size_t>(row)] : std::string();
+}
+
+std::string TerminalSession::TextAt(int row, int col, std::size_t length) {
+    const std::string line = Row(row);
+    if (col < 0 || static_cast<std::size_t>(col) >= line.size()) {
+        return {};
+    }
+    return line.substr(static_cast<std::size_t>(col), length);
+}
+
+std::string TerminalSession::Dump() {
+    std::ostringstream out;
+    const std::vector<std::string> screen = Screen();
+    for (std::size_t row = 0; row < screen.size(); ++row) {
+        out << (row < 10 ? " " : "") << row << "|" << Trimmed(screen[row]) << "\n";
+    }
+    return out.str();
+}
+
+bool TerminalSession::WaitForTextAt(int row, int col, const std::string& text,
+                                    std::chrono::milliseconds timeout) {
+    return PollUntil(timeout, [&] { return TextAt(row, col, text.size()) == text; });
+}
+
+bool TerminalSession::WaitForText(const std::string& text, std::chrono::milliseconds timeout) {
+    return PollUntil(timeout, [&] {
+        for (const std::string& line : Screen()) {
+            if (line.find(text) != std::string::npos) {
+                return true;
+            }
+        }
+        return false;
+    });
+}
+
+bool TerminalSession::WaitForRow(int row, const std::string& text,
+                                 std::chrono::milliseconds timeout) {
+    return PollUntil(timeout, [&] { return Trimmed(Row(row)) == text; });
+}
+
+std::optional<std::string> TerminalSession::ReadFile(const std::string& name) const {
+    return ReadWholeFile(workDir_ / name);
+}
+
+bool TerminalSession::WaitForLogLine(const std::string& file, const std::string& text,
+                                     std::chrono::milliseconds timeout) {
+    return PollUntil(timeout, [&] {
+        const std::optional<std::string> content = ReadFile(file);
+        return content && HasLine(*content, text);
+    });
+}
+
+pid_t TerminalSession::Pid() {
+    return pid_;
+}
+
+bool TerminalSession::IsAlive() {
+    return PaneFormat("#{pane_dead}") == "0" && kill(pid_, 0) == 0;
+}
+
+::testing::AssertionResult TerminalSession::StillRunning() {
+    if (IsAlive()) {
+        return ::testing::AssertionSuccess();
+    }
+    return ::testing::AssertionFailure() << "lineprobe is no longer running ("
+                                         << PaneFormat("#{pane_dead_status}") << "); screen:\n"
+                                         << Dump();
+}
+
+std::optional<int> TerminalSession::WaitForExit(std::chrono::milliseconds timeout) {
+    std::optional<int> status;
+    PollUntil(timeout, [&] {
+        const std::string state =
+            PaneFormat("#{pane_dead}|#{pane_dead_status}|#{pane_dead_signal}");
+        if (state.rfind("1|", 0) != 0) {
+            return false;
+        }
+        const std::string rest = state.substr(2);
+        const std::string code = rest.substr(0, rest.find('|'));
+        const std::string signal = rest.substr(rest.find('|') + 1);
+        if (!code.empty()) {
+            status = std::stoi(code);
+        } else if (!signal.empty()) {
+            status = 128 + std::stoi(signal);
+        } else {
+            status = -1;
+        }
+        return true;
+    });
+    return status;
+}
+
+void TerminalSession::Signal(int sig) {
+    kill(pid_, sig);
+}
+
+}  // namespace lineprobe::testing
