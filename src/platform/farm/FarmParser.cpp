@@ -87,11 +87,11 @@ const std::string& text(const toml::node& n, std::string_view key) {
     return s;
 }
 
-const toml::array& tableArray(const toml::node& n, std::string_view key) {
+const toml::array& tableArray(const toml::node& n, std::string_view key, std::string_view header) {
     const auto* a = n.as_array();
     if (!a || !a->is_array_of_tables()) {
         fail(n.source(),
-             std::string(key) + " must be an array of tables ([[" + std::string(key) + "]])");
+             std::string(key) + " must be an array of tables ([[" + std::string(header) + "]])");
     }
     return *a;
 }
@@ -102,7 +102,7 @@ class Reader {
         onlyKeys(root, {"system_name", "board"});
         farm_.systemName = text(required(root, "system_name"), "system_name");
         if (const toml::node* boards = root.get("board")) {
-            const auto& list = tableArray(*boards, "board");
+            const auto& list = tableArray(*boards, "board", "board");
             for (const auto& b : list) {
                 readBoard(*b.as_table());
             }
@@ -139,7 +139,7 @@ class Reader {
         readMedia(t, b);
 
         if (const toml::node* trunks = t.get("trunk")) {
-            const auto& list = tableArray(*trunks, "trunk");
+            const auto& list = tableArray(*trunks, "trunk", "board.trunk");
             if (list.size() > static_cast<std::size_t>(kMaxTrunks)) {
                 fail(list[kMaxTrunks].source(),
                      "a board has at most " + std::to_string(kMaxTrunks) + " trunks");

@@ -88,7 +88,7 @@ INSTANTIATE_TEST_SUITE_P(
         BadFarm{"TooManyTrunks", kHead + trunks(65, kCasTrunk),
                 "262:1: a board has at most 64 trunks"},
         BadFarm{"TrunkNotTables", kHead + "trunk = 1\n",
-                "6:9: trunk must be an array of tables ([[trunk]])"},
+                "6:9: trunk must be an array of tables ([[board.trunk]])"},
         BadFarm{"ChannelsTooMany",
                 kHead + "[[board.trunk]]\nchannels = 32\ntype = 1\n"
                         "signaling = \"CAS\"\n",
