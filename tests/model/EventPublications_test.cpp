@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "SimFixture.h"
+#include "framework/Addressable.h"
 #include "model/AllAlarms.h"
 #include "model/TSCCallInfo.h"
 #include "model/TSCCallState.h"
