@@ -71,7 +71,7 @@ class EveryBody : public ::testing::TestWithParam<unsigned int> {
   protected:
     const CatalogueEntry& entry() const { return kCatalogue[GetParam()]; }
     std::unique_ptr<MsgBody> make() const { return std::unique_ptr<MsgBody>(entry().make()); }
-    std::unique_ptr<MsgBody> filled(std::size_t n = 320) const {
+    std::unique_ptr<MsgBody> filled(std::size_t n = 200) const {
         auto b = make();
         auto m = msgOf(pattern(n));
         (void)b->readMsg(m.get(), 0);
