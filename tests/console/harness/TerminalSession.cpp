@@ -162,14 +162,16 @@ TerminalSession::TerminalSession(TerminalOptions options)
     {
         std::ofstream conf(root_ / "tmux.conf");
         conf << "set -g status off\n"
-                "set -g remain-on-exit on\n"
                 "set -g default-terminal screen\n"
                 "set -g escape-time 0\n";
     }
     socket_ = "lp-test-" + std::to_string(getpid()) + "-" + std::to_string(counter++) + "-" +
               root_.filename().string();
 
-    std::string command = "exec env";
+    // The program runs in the foreground of the pane's shell, which records its exit
+    // status and then keeps the pane open, so the last screen stays readable. The inner
+    // shell writes its pid and becomes the program, so that signals reach the program.
+    std::string command = "env";
     for (const std::string& name : options.unsetEnv) {
         command += " -u " + ShellQuote(name);
     }
@@ -181,10 +183,15 @@ TerminalSession::TerminalSession(TerminalOptions options)
         options.binary = LINEPROBE_BINARY;
     }
 #endif
+    command += " sh -c 'echo $$ > \"$0\"; exec \"$@\"' " + ShellQuote((root_ / "pid").string());
     command += " " + ShellQuote(options.binary);
     for (const std::string& arg : options.args) {
         command += " " + ShellQuote(arg);
     }
+    const std::string statusFile = (root_ / "status").string();
+    command += "; echo $? > " + ShellQuote(statusFile + ".new") + " && mv " +
+               ShellQuote(statusFile + ".new") + " " + ShellQuote(statusFile) +
+               "; exec sleep infinity";
 
     int status = 0;
     RunCapture({"tmux", "-L", socket_, "-f", (root_ / "tmux.conf").string(), "new-session", "-d",
@@ -194,7 +201,15 @@ TerminalSession::TerminalSession(TerminalOptions options)
     if (status != 0) {
         throw std::runtime_error("tmux could not start the session");
     }
-    pid_ = static_cast<pid_t>(std::stol(PaneFormat("#{pane_pid}")));
+    std::optional<std::string> pid;
+    PollUntil(DEFAULT_WAIT, [&] {
+        pid = ReadWholeFile(root_ / "pid");
+        return pid && !pid->empty() && pid->back() == '\n';
+    });
+    if (!pid || pid->empty()) {
+        throw std::runtime_error("the program did not start in the terminal");
+    }
+    pid_ = static_cast<pid_t>(std::stol(*pid));
 }
 
 TerminalSession::~TerminalSession() {
@@ -234,12 +249,7 @@ void TerminalSession::SendKeys(const std::vector<std::string>& keys) {
 }
 
 std::vector<std::string> TerminalSession::Screen() {
-    // When the program has ended, tmux scrolls the pane up one row to write its "Pane is
-    // dead" line at the bottom: read the screen as it was before that.
-    std::vector<std::string> capture = {"capture-pane", "-p", "-t", SESSION};
-    if (PaneFormat("#{pane_dead}") == "1") {
-        capture.insert(capture.end(), {"-S", "-1", "-E", std::to_string(rows_ - 2)});
-    }
+    const std::vector<std::string> capture = {"capture-pane", "-p", "-t", SESSION};
     std::istringstream lines(Tmux(capture));
     std::vector<std::string> screen;
     for (std::string line; std::getline(lines, line) && static_cast<int>(screen.size()) < rows_;) {
@@ -311,39 +321,30 @@ pid_t TerminalSession::Pid() {
     return pid_;
 }
 
+std::optional<int> TerminalSession::ExitStatus() const {
+    const std::optional<std::string> status = ReadWholeFile(root_ / "status");
+    if (!status || status->empty() || status->back() != '\n') {
+        return std::nullopt;
+    }
+    return std::stoi(*status);
+}
+
 bool TerminalSession::IsAlive() {
-    return PaneFormat("#{pane_dead}") == "0" && kill(pid_, 0) == 0;
+    return !ExitStatus() && kill(pid_, 0) == 0;
 }
 
 ::testing::AssertionResult TerminalSession::StillRunning() {
     if (IsAlive()) {
         return ::testing::AssertionSuccess();
     }
-    return ::testing::AssertionFailure() << "lineprobe is no longer running ("
-                                         << PaneFormat("#{pane_dead_status}") << "); screen:\n"
+    return ::testing::AssertionFailure() << "lineprobe is no longer running (status "
+                                         << ExitStatus().value_or(-1) << "); screen:\n"
                                          << Dump();
 }
 
 std::optional<int> TerminalSession::WaitForExit(std::chrono::milliseconds timeout) {
     std::optional<int> status;
-    PollUntil(timeout, [&] {
-        const std::string state =
-            PaneFormat("#{pane_dead}|#{pane_dead_status}|#{pane_dead_signal}");
-        if (state.rfind("1|", 0) != 0) {
-            return false;
-        }
-        const std::string rest = state.substr(2);
-        const std::string code = rest.substr(0, rest.find('|'));
-        const std::string signal = rest.substr(rest.find('|') + 1);
-        if (!code.empty()) {
-            status = std::stoi(code);
-        } else if (!signal.empty()) {
-            status = 128 + std::stoi(signal);
-        } else {
-            status = -1;
-        }
-        return true;
-    });
+    PollUntil(timeout, [&] { return (status = ExitStatus()).has_value(); });
     return status;
 }
 

@@ -45,9 +45,9 @@ struct TerminalOptions {
 };
 
 // Runs the real lineprobe in a pseudo-terminal of a private tmux server, in a fresh
-// temporary working directory, and reads its screen and logs. The pane stays after the
-// program ends, so its last screen and its exit status can still be read. The server and
-// the directory go with the session.
+// temporary working directory, and reads its screen and logs. The pane stays open after
+// the program ends, so its last screen can still be read, and its shell records the exit
+// status. The server and the directory go with the session.
 class TerminalSession {
   public:
     explicit TerminalSession(TerminalOptions options = {});
@@ -92,6 +92,8 @@ class TerminalSession {
     // The exit status once the program has ended on its own, or nothing at the time-out.
     // A death by signal gives 128 + the signal number.
     std::optional<int> WaitForExit(std::chrono::milliseconds timeout = DEFAULT_WAIT);
+    // The exit status if the program has ended, without waiting.
+    std::optional<int> ExitStatus() const;
     void Signal(int sig);
 
   private:
