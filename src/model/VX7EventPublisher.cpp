@@ -384,8 +384,16 @@ void Release(VX7EventPublisher* publisher, Component*& object, unsigned int& cou
         return;
     }
     (publisher->*forget)(object);
-    // Deleting the object removes its dispatcher, and with it every callback that still points
-    // at the publications on our behalf.
+    // The board never confirmed the cancellation, so events may still come. Without their
+    // registrations they go to the unregistered handler; cancelling also waits for a delivery
+    // that is under way on the reader thread, which may be inside our Notify.
+    for (unsigned int group : {0x1200u, 0x1230u, 0x1260u, 0x1600u, 0x1611u}) {
+        try {
+            object->asyncCancelEvtGroup(group);
+        } catch (const tolk::Exception&) {
+            // Not registered on this component.
+        }
+    }
     delete object;
     object = nullptr;
     count = 0;

@@ -147,3 +147,43 @@ TEST_F(GapsFarm, BoardsKeepTheirLogicalNumbers) {
 }
 
 }  // namespace
+
+namespace {
+
+class FlexibleFarm : public SimFixture {
+  protected:
+    static void SetUpTestSuite() { UseFarm("flexible.toml"); }
+    static void TearDownTestSuite() { UseFarm(""); }
+};
+
+TEST_F(FlexibleFarm, SecondTrunkContinuesTheVoiceChannels) {
+    BoardManager manager(7);
+    ASSERT_TRUE(manager.IsFlexibleRoutingEnabled());
+    EXPECT_EQ(manager.GetVoiceChannelCount(), 5);
+    EXPECT_EQ(manager.GetVoiceChannelNumber(1, 3), 3u);
+    EXPECT_EQ(manager.GetVoiceChannelNumber(2, 1), 4u);
+    EXPECT_EQ(manager.GetVoiceChannelNumber(2, 2), 5u);
+    EXPECT_EQ(manager.GetVoiceChannelNumber(2, 3), 0u);
+    EXPECT_NE(manager.GetTelephonyVoiceChannel(2, 2), nullptr);
+    EXPECT_NE(manager.GetTelephonyVoiceChannel(2, 1), manager.GetTelephonyVoiceChannel(1, 1));
+}
+
+TEST_F(FlexibleFarm, MediaListFollowsTheAttributeOrderNotTheFarms) {
+    BoardManager manager(7);
+    vx7diag::MediaList media = manager.GetMediaResources(2, 2);
+    std::vector<unsigned int> types;
+    for (unsigned int i = 0; i < media.length(); ++i) {
+        types.push_back(media.element(i)->ComponentType);
+    }
+    // SIGDETADDR, TONEGENADDR, CALLERIDADDR.
+    EXPECT_EQ(types, (std::vector<unsigned int>{7, 5, 41}));
+}
+
+TEST_F(FlexibleFarm, FixedBoardBesideItHasNoVoiceResources) {
+    BoardManager manager(8);
+    EXPECT_FALSE(manager.IsFlexibleRoutingEnabled());
+    EXPECT_EQ(manager.GetVoiceChannelCount(), 0);
+    EXPECT_EQ(manager.GetTelephonyVoiceChannel(1, 1), nullptr);
+}
+
+}  // namespace
