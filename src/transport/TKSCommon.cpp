@@ -1,6 +1,5 @@
 #include "transport/TKSCommon.h"
 
-#include <cxxabi.h>
 #include <unistd.h>
 
 #include <cassert>
@@ -99,11 +98,17 @@ void TKSThread::control::runAll() {
     }
 }
 
+namespace {
+
+// Unwinds a cancelled body to its thread frame, which ends the thread.
+struct CancelUnwind {};
+
+}  // namespace
+
 void TKSThread::control::testCancel() {
     if (status.load() == NOT_RUNNING) {
         runAll();
-        runLock.unlock();
-        pthread_exit(nullptr);
+        throw CancelUnwind{};
     }
 }
 
@@ -122,6 +127,11 @@ TKSThread::~TKSThread() {
 }
 
 namespace {
+
+// Out of line: some compilers see an uninitialised member pointer where the call is inlined.
+[[gnu::noinline]] void* callMember(void* obj, TKSThread::MemberBody fn, void* control, void* arg) {
+    return (static_cast<TKSRunnable*>(obj)->*fn)(control, arg);
+}
 
 void applyStackSize(pthread_attr_t& attr, unsigned int stackSize, bool& ok) {
     if (stackSize == 0) {
@@ -183,11 +193,9 @@ void* TKSThread::frame(void* self) {
         if (t->plain != nullptr) {
             r = t->plain(&t->ctl, t->startArg);
         } else {
-            r = (static_cast<TKSRunnable*>(t->obj)->*(t->member))(&t->ctl, t->startArg);
+            r = callMember(t->obj, t->member, &t->ctl, t->startArg);
         }
-    } catch (abi::__forced_unwind&) {
-        // pthread_exit from testCancel: it has already opened runLock.
-        throw;
+    } catch (const CancelUnwind&) {
     } catch (...) {
         // Nothing stands above a thread body; ending the process for it would take every other
         // thread down too. The thread ends, and the failure is on record.
@@ -220,10 +228,8 @@ void* abandonedFrame(void* p) {
         if (a.plain != nullptr) {
             a.plain(nullptr, a.arg);
         } else {
-            (static_cast<TKSRunnable*>(a.obj)->*(a.member))(nullptr, a.arg);
+            callMember(a.obj, a.member, nullptr, a.arg);
         }
-    } catch (abi::__forced_unwind&) {
-        throw;
     } catch (...) {
         std::cerr << "ERROR: exception left a thread body; the thread has ended" << std::endl;
     }

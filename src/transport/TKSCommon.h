@@ -79,7 +79,8 @@ class TKSThread {
         void pushCleanup(void* obj, MemberCleanup fn, void* arg);
         // Returns 0 when the stack was empty, otherwise whether entries remain.
         int popCleanup(int execute);
-        // Ends the calling thread (pthread_exit) after running the cleanups if cancelled.
+        // If cancelled: runs the cleanups and ends the calling thread (by unwinding to its frame,
+        // so a body must not swallow exceptions it doesn't know around this call).
         void testCancel();
         bool cancelled() const { return status.load() == NOT_RUNNING; }
 

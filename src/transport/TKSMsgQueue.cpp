@@ -1,7 +1,5 @@
 #include "transport/TKSMsgQueue.h"
 
-#include <cxxabi.h>
-
 #include <cstdlib>
 #include <cstring>
 #include <exception>
@@ -198,8 +196,6 @@ void TKSMsgQueue::deliverAsync(TKMsg32Bit* block) {
             (obj->*method)(ref);
         }
         return;
-    } catch (abi::__forced_unwind&) {
-        throw;
     } catch (const std::exception& e) {
         std::cerr << "ERROR: TKSMsgQueue: message callback failed on message type 0x" << std::hex
                   << type << std::dec << ": " << e.what() << "; the queue goes on" << std::endl;

@@ -186,8 +186,13 @@ class RemoteHostile : public ::testing::TestWithParam<HostileCase> {};
 
 TEST_P(RemoteHostile, BadFrameIsDroppedAndTheNextOneArrives) {
     const HostileCase& c = GetParam();
+    std::atomic<bool> registered{false};
     ScriptedRelay relay([&](sock& conn) {
         ASSERT_TRUE(ScriptedRelay::acceptOpen(conn));
+        // Until the callback is registered, blocks would wait in the pickup slot instead.
+        while (!registered.load()) {
+            std::this_thread::sleep_for(1ms);
+        }
         ScriptedRelay::sendRaw(conn, c.junk);
         ScriptedRelay::sendBlock(conn, blockFor(ScriptedRelay::assignedAddress(), 0x20, 1, 4));
         ScriptedRelay::serve(conn, [](sock&, TKMsg32Bit* b) { tkMsgFree(b); });
@@ -197,6 +202,7 @@ TEST_P(RemoteHostile, BadFrameIsDroppedAndTheNextOneArrives) {
     {
         std::unique_ptr<TKSMsgQueue> q(openQueue(relay));
         q->registerAsyncCallback(&inbox, static_cast<TKSAsyncMethod>(&Inbox::receive));
+        registered = true;
         ASSERT_TRUE(inbox.waitFor(1));
         EXPECT_EQ(std::vector<unsigned int>({0x20}), inbox.got());
         EXPECT_FALSE(q->transportFailed());
