@@ -153,15 +153,18 @@ void EvtCallback::start(void*, callbackInfo* info) {
         if (info->wantsMsg != 0) {
             Msg* m = static_cast<Msg*>(info->argument);
             if (info->method != nullptr) {
-                (static_cast<Callback*>(info->target)->*(info->method))(addressable, m);
+                Callback* obj = static_cast<Callback*>(info->target);
+                MsgMethod fn = info->method;
+                (obj->*fn)(addressable, m);
             } else {
                 reinterpret_cast<MsgFn>(info->target)(addressable, m);
             }
         } else {
             MsgBody* b = static_cast<MsgBody*>(info->argument);
             if (info->bodyMethod != nullptr) {
-                (static_cast<Callback*>(info->target)->*(info->bodyMethod))(addressable,
-                                                                            info->number, b);
+                Callback* obj = static_cast<Callback*>(info->target);
+                BodyMethod fn = info->bodyMethod;
+                (obj->*fn)(addressable, info->number, b);
             } else {
                 reinterpret_cast<BodyFn>(info->target)(addressable, info->number, b);
             }

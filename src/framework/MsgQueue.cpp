@@ -33,7 +33,7 @@ void MsgQueue::Timeout::toStream(std::ostream* os) const {
 MsgQueue::MsgQueue(CompDesc_t addr, unsigned int maxRetMsgSize, unsigned int depth)
     : queue(new TKSMsgQueue(addr.getTKCompDesc(), maxRetMsgSize, depth, nullptr)),
       unregisteredHandler(MsgQueue_unregisteredSourceHandler) {
-    queue->registerAsyncCallback(this, static_cast<TKSAsyncMethod>(&MsgQueue::MsgRouter));
+    queue->registerAsyncCallback(&router, static_cast<TKSAsyncMethod>(&Router::route));
 }
 
 MsgQueue::~MsgQueue() {

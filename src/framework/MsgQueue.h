@@ -20,7 +20,7 @@ class AsyncMsgReceiver;
 
 // One address of this process and one reader thread. Replies go back to the waiting request;
 // everything else is routed by its source address to the registered receiver.
-class MsgQueue : public virtualObject, public TKSAsyncMsgReceiver {
+class MsgQueue : public virtualObject {
   public:
     static constexpr unsigned int DefaultDepth = 5;
     static constexpr unsigned int DefaultMaxRetMsgSize = 512;
@@ -73,6 +73,18 @@ class MsgQueue : public virtualObject, public TKSAsyncMsgReceiver {
     int MsgRouter(TKSMsgRef& ref);
 
   private:
+    // The transport calls back through a member of a TKSAsyncMsgReceiver; this single-base
+    // adapter keeps that call on an object of exactly that shape.
+    class Router : public TKSAsyncMsgReceiver {
+      public:
+        explicit Router(MsgQueue* q) : owner(q) {}
+        int route(TKSMsgRef& ref) { return owner->MsgRouter(ref); }
+
+      private:
+        MsgQueue* owner;
+    };
+
+    Router router{this};
     TKSMsgQueue* queue;
     sharedKeyedList<CompDesc_t, AsyncMsgReceiver*> receivers;
     std::atomic<UnregisteredHandler> unregisteredHandler;

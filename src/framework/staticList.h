@@ -54,9 +54,9 @@ class staticList : public list<T> {
             throw typename list<T>::AllocationError(n);
         }
         if (buffer != nullptr) {
-            unsigned int keep = std::min(this->len, n);
+            unsigned int keep = n < this->len ? n : this->len;
             try {
-                for (unsigned int i = 0; i < keep; ++i) {
+                for (unsigned int i = 0; i < keep && i < n; ++i) {
                     fresh[i] = buffer[i];
                 }
             } catch (...) {
