@@ -6,6 +6,7 @@
 #include <chrono>
 #include <cstdlib>
 #include <iostream>
+#include <thread>
 
 TKSMutex::TKSMutex() = default;
 TKSMutex::~TKSMutex() = default;
@@ -40,6 +41,15 @@ bool TKSMutex::tryLock(unsigned int ms, unsigned int stepMs) {
     // The wait ends when the signal is given, not at the next step; its bound is the whole
     // steps that fit in ms, which keeps the callers' 5000 and 1000 ms as they are.
     auto bound = std::chrono::milliseconds(std::uint64_t(ms / stepMs) * stepMs);
+    // A reply usually comes within tens of microseconds: look again briefly before sleeping,
+    // which saves the waiter a full wake-up.
+    auto spinEnd = std::chrono::steady_clock::now() + std::chrono::microseconds(30);
+    while (bound.count() > 0 && std::chrono::steady_clock::now() < spinEnd) {
+        if (tryLock()) {
+            return true;
+        }
+        std::this_thread::yield();
+    }
     std::unique_lock<std::mutex> lk(m);
     if (!cv.wait_for(lk, bound, [this] { return !locked; })) {
         return false;
