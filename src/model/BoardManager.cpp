@@ -55,8 +55,8 @@ void BoardMgr_UnregisteredSourceHandler(tolk::MsgQueue&, tolk::Msg* msg) {
 
 unsigned int LconParm(tolk::Board& board, unsigned int line, unsigned int parm,
                       unsigned int* second = nullptr, unsigned int secondParm = 0) {
-    tolk::Cluster cluster = board.findClustByLCON(line);
-    tolk::TmpInstance instance = cluster.find(kLconType);
+    tolk::Cluster cluster = Captured([&] { return board.findClustByLCON(line); });
+    tolk::TmpInstance instance = Captured([&] { return cluster.find(kLconType); });
     tolk::LCON lcon(instance);
     unsigned int value = ParmValue(lcon, parm);
     if (second != nullptr) {
@@ -232,9 +232,9 @@ int BoardManager::RetrieveAnalogTrunkInfo() {
     RunGuarded(std::cout, "", [&] {
         for (unsigned int i = 1; i <= kMaxTrunks; ++i) {
             // No cluster for line i raises here: the normal end of the walk.
-            tolk::Cluster cluster = board->findClustByLCON(i);
+            tolk::Cluster cluster = Captured([&] { return board->findClustByLCON(i); });
             SetNumberOfTrunks(static_cast<int>(i));
-            tolk::TmpInstance instance = cluster.find(kLconType);
+            tolk::TmpInstance instance = Captured([&] { return cluster.find(kLconType); });
             tolk::LCON lcon(instance);
             m record;
             record.trunkType = static_cast<int>(ParmValue(lcon, kParmTrunkType));
@@ -254,7 +254,7 @@ int BoardManager::GetTocRocParmValue() {
     unsigned int mode = 0;
     // A board that cannot say counts as one without flexible routing.
     RunGuarded(std::cout, "GetTocRocParmValue - ", [&] {
-        tolk::Component chp = board->findComp(19, 255);
+        tolk::Component chp = Captured([&] { return board->findComp(19, 255); });
         mode = ParmValue(chp, kParmRoutingMode);
     });
     return static_cast<int>(mode);

@@ -2,11 +2,35 @@
 
 #include <exception>
 #include <ostream>
+#include <sstream>
+#include <stdexcept>
+#include <string>
 
 #include "framework/Exception.h"
 #include "transport/TKSCommon.h"
 
 namespace vx7diag {
+
+// What a board's refusal or silence becomes when it leaves a model object: the framework's own
+// exceptions point at the proxy that made the request, which may be gone by the time anyone
+// prints them, so the text is taken while that proxy still exists.
+class BoardFailure : public std::runtime_error {
+  public:
+    using std::runtime_error::runtime_error;
+};
+
+// Runs one request whose proxy dies with the caller's scope; a framework exception comes out as
+// a BoardFailure carrying its text.
+template <class Work>
+decltype(auto) Captured(Work&& work) {
+    try {
+        return work();
+    } catch (const tolk::Exception& e) {
+        std::ostringstream text;
+        text << e;
+        throw BoardFailure(text.str());
+    }
+}
 
 // Runs `work`; an exception that a board's answer, silence or absence can raise is written to
 // `log` after `what`, and the result is false. Both exception roots are caught: the framework's

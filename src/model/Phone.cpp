@@ -5,6 +5,7 @@
 
 #include "model/Board.h"
 #include "model/BoardManager.h"
+#include "model/Guarded.h"
 #include "model/ROCCluster.h"
 #include "transport/TKSCommon.h"
 
@@ -81,8 +82,9 @@ Phone::Phone(BoardManager* manager, unsigned int t, unsigned int c)
     if (board == nullptr) {
         throw std::runtime_error("Phone::Phone() board is not available");
     }
-    tscCluster = std::make_unique<tolk::Cluster>(board->findClustByTSC(trunk, channel));
-    tolk::TmpInstance instance = tscCluster->find(TSC_COMPONENT_TYPE);
+    tscCluster = std::make_unique<tolk::Cluster>(
+        Captured([&] { return board->findClustByTSC(trunk, channel); }));
+    tolk::TmpInstance instance = Captured([&] { return tscCluster->find(TSC_COMPONENT_TYPE); });
     tsc = std::make_unique<tolk::TSC>(instance);
     RegisterPhoneHandlers(*tscCluster);
 }

@@ -26,9 +26,9 @@ class Phone {
     static constexpr unsigned int TSASSIGN_PORT = 0x8201;
     static constexpr unsigned char TSC_COMPONENT_TYPE = 18;
 
-    // Throws std::out_of_range for trunk 65 and above or channel 32 and above, std::runtime_error
-    // for a manager without a board, and whatever the searches for the channel's cluster and TSC
-    // raise.
+    // Throws std::out_of_range for trunk 65 and above or channel 32 and above, and
+    // std::runtime_error for a manager without a board or a board that has no such channel or
+    // refuses or ignores the searches for it (a BoardFailure with the reason).
     Phone(BoardManager* manager, unsigned int trunk, unsigned int channel);
     Phone(const Phone&) = delete;
     Phone& operator=(const Phone&) = delete;

@@ -64,9 +64,9 @@ Trunk::Trunk(unsigned int boardNumber, unsigned int trunk) {
     tolk::tolkInit();
     tolk::Board board(boardNumber);
     RegisterTrunkHandlers(board);
-    tolk::Cluster cluster = board.findClustByLCON(trunk);
+    tolk::Cluster cluster = Captured([&] { return board.findClustByLCON(trunk); });
     RegisterTrunkHandlers(cluster);
-    tolk::TmpInstance instance = cluster.find(kLconType);
+    tolk::TmpInstance instance = Captured([&] { return cluster.find(kLconType); });
     lcon = std::make_unique<tolk::LCON>(instance);
     RegisterTrunkHandlers(*lcon);
 }

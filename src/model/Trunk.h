@@ -17,7 +17,8 @@ class Trunk : public Subject {
     static constexpr unsigned int OUT_OF_SERVICE = 0x1610;
     static constexpr unsigned int ERROR_ALREADY_IN_SERVICE = 0x1600;
 
-    // Throws whatever the searches for the line's cluster and LCON raise.
+    // Throws BoardFailure (a std::runtime_error with the reason) when the board lacks the line or
+    // refuses or ignores the searches for its cluster and LCON.
     Trunk(unsigned int board, unsigned int trunk);
     ~Trunk() override;
 

@@ -203,10 +203,10 @@ bool VX7EventPublisher::Start(Aspect* aspect) {
         tolk::Board temporary(board);
         RegisterUnregisteredHandlers(temporary);
         std::unique_ptr<tolk::Cluster> channelCluster(
-            new tolk::Cluster(temporary.findClustByTSC(trunk, channel)));
+            new tolk::Cluster(Captured([&] { return temporary.findClustByTSC(trunk, channel); })));
         RegisterUnregisteredHandlers(*channelCluster);
         std::unique_ptr<tolk::Cluster> lineCluster(
-            new tolk::Cluster(temporary.findClustByLCON(trunk)));
+            new tolk::Cluster(Captured([&] { return temporary.findClustByLCON(trunk); })));
         RegisterUnregisteredHandlers(*lineCluster);
         tscCluster = channelCluster.release();
         lconCluster = lineCluster.release();
@@ -233,7 +233,7 @@ bool SubscribeOn(VX7EventPublisher* publisher, Component*& object, unsigned int&
     };
     try {
         if (object == nullptr) {
-            tolk::TmpInstance instance = cluster->find(type);
+            tolk::TmpInstance instance = Captured([&] { return cluster->find(type); });
             std::unique_ptr<Component> fresh(new Component(instance));
             RegisterUnregisteredHandlers(*fresh);
             object = fresh.release();

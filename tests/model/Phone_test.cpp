@@ -8,6 +8,7 @@
 
 #include "SimFixture.h"
 #include "model/BoardManager.h"
+#include "model/Guarded.h"
 
 namespace {
 
@@ -49,7 +50,7 @@ TEST_F(PhoneTest, RangeChecksComeFirstTrunkBeforeChannel) {
     EXPECT_EQ(OutOfRangeText(nullptr, 65, 1), "Phone::Phone() trunk is out of range");
     // The limits themselves pass the check; the board then has no such channel.
     EXPECT_EQ(OutOfRangeText(fixedBoard, 64, 31), "");
-    EXPECT_THROW(Phone(fixedBoard, 64, 31), tolk::Exception);
+    EXPECT_THROW(Phone(fixedBoard, 64, 31), vx7diag::BoardFailure);
 }
 
 TEST_F(PhoneTest, ManagerWithoutBoardCannotMakeAPhone) {
@@ -166,11 +167,22 @@ INSTANTIATE_TEST_SUITE_P(
     [](const ::testing::TestParamInfo<Refusal>& info) { return std::string(info.param.name); });
 
 TEST_F(PhoneTest, AcceptedOperationsGiveTheirSuccessValues) {
-    Phone phone(fixedBoard, 2, 2);
-    EXPECT_EQ(phone.SetChanState(8), 0);
-    EXPECT_EQ(phone.Reset(0x100), 1);
-    EXPECT_EQ(phone.AnswerCall(0), 1);
-    EXPECT_EQ(phone.ReleaseCall(0), 0);
+    Phone caller(fixedBoard, 2, 2);
+    Phone callee(fixedBoard, 2, 3);
+    // The board's own numbers for taking a channel out of service and back.
+    EXPECT_EQ(callee.SetChanState(257), 0);
+    EXPECT_EQ(callee.SetChanState(256), 0);
+    EXPECT_EQ(callee.Reset(0x100), 1);
+    // Channel 3 of trunk 2 answers 5551302.
+    unsigned int callId = caller.MakeCall("5551301", "5551302");
+    ASSERT_NE(callId, 0u);
+    tolk::TSC::MsgGetCallStateCmplt_t offered;
+    callee.GetCallState(0, &offered);
+    unsigned int incoming = *offered.pCallId;
+    EXPECT_EQ(callee.AcceptCall(incoming), 1);
+    EXPECT_EQ(callee.AnswerCall(incoming), 1);
+    EXPECT_EQ(caller.DropCall(callId), 0);
+    EXPECT_EQ(caller.ReleaseCall(callId), 0);
 }
 
 TEST_F(PhoneTest, FlexibleRoutingJoinsAndPartsTheVoiceResources) {
@@ -214,7 +226,7 @@ TEST_F(PhoneTest, RefusedTscDetachEndsTheParting) {
 }
 
 TEST_F(PhoneTest, ChannelTheBoardLacksIsNoPhone) {
-    EXPECT_THROW(Phone(flexibleBoard, 1, 24), tolk::Exception);
+    EXPECT_THROW(Phone(flexibleBoard, 1, 24), vx7diag::BoardFailure);
 }
 
 TEST_F(PhoneTest, SilentJoiningStopsAndReports) {
