@@ -1,0 +1,414 @@
+// The emulation's answers through the framework's own Addressable over the local transport, as
+// the program sees them.
+#include "sim/Emulation.h"
+
+#include <gtest/gtest.h>
+
+#include <chrono>
+#include <condition_variable>
+#include <cstring>
+#include <mutex>
+#include <vector>
+
+#include "catalogue/generated/cluster_bodies.h"
+#include "catalogue/generated/clustermgr_bodies.h"
+#include "catalogue/generated/lcon_bodies.h"
+#include "catalogue/generated/resourcemgr_bodies.h"
+#include "catalogue/generated/stdresource_bodies.h"
+#include "catalogue/generated/tsc_bodies.h"
+#include "framework/Addressable.h"
+#include "framework/Msg.h"
+#include "platform/farm/ActiveFarm.h"
+#include "platform/farm/Addresses.h"
+#include "sim/Builtin.h"
+#include "sim/ErrorCodes.h"
+
+namespace sim {
+namespace {
+
+// Bodies without fields, for the requests that carry none.
+tolk::LCON_Bodies::MsgGetLineState_t getLine;
+tolk::LCON_Bodies::MsgGetDiagMode_t getDiag;
+tolk::TSC_Bodies::MsgGetChanState_t getChan;
+
+using tolk::Addressable;
+using tolk::CompDesc_t;
+using Std = tolk::StdResource_Bodies;
+using Rm = tolk::ResourceMgr_Bodies;
+using Cm = tolk::ClusterMgr_Bodies;
+using Cl = tolk::Cluster_Bodies;
+using Tsc = tolk::TSC_Bodies;
+using Lcon = tolk::LCON_Bodies;
+
+CompDesc_t cd(const farm::Address& a) {
+    return CompDesc_t(a.instance, a.board, a.processor, a.component, a.node);
+}
+
+void setText(tolk::staticList<char>& l, const char* s) {
+    unsigned int n = static_cast<unsigned int>(std::strlen(s)) + 1;
+    l.realloc(n);
+    std::memcpy(l.data(), s, n);
+}
+
+// A proxy whose waits can be shortened, to see silence without waiting five seconds.
+class Proxy : public Addressable {
+  public:
+    using Addressable::Addressable;
+    void setResponseTimeout(unsigned int ms) { ResponseTimeout = ms; }
+};
+
+// Events as they reach a registered callback, for the test to wait on.
+struct Inbox {
+    std::mutex lock;
+    std::condition_variable cv;
+    std::vector<std::vector<std::uint32_t>> words;  // first words of each event body
+
+    static Inbox& get() {
+        static Inbox box;
+        return box;
+    }
+    static void take(Addressable*, tolk::Msg* m) {
+        std::vector<std::uint32_t> w;
+        // Big-endian words; a short last word is padded with zero bytes.
+        const unsigned char* p = tkMsgBody(m->getMsgRef());
+        for (unsigned int off = 0; off < m->getSize() && w.size() < 6; off += 4) {
+            std::uint32_t v = 0;
+            for (unsigned int i = 0; i < 4; ++i) {
+                v = (v << 8) | (off + i < m->getSize() ? p[off + i] : 0u);
+            }
+            w.push_back(v);
+        }
+        delete m;
+        Inbox& box = get();
+        std::lock_guard<std::mutex> g(box.lock);
+        box.words.push_back(std::move(w));
+        box.cv.notify_all();
+    }
+    std::vector<std::vector<std::uint32_t>> waitFor(std::size_t n) {
+        std::unique_lock<std::mutex> g(lock);
+        cv.wait_for(g, std::chrono::seconds(5), [&] { return words.size() >= n; });
+        return words;
+    }
+    void clear() {
+        std::lock_guard<std::mutex> g(lock);
+        words.clear();
+    }
+};
+
+class EmulationTest : public testing::Test {
+  protected:
+    static void SetUpTestSuite() {
+        unsetenv("REMOTE_TKHOST");
+        unsetenv("VX7_FARM");
+        farm::resetActiveFarm();
+        std::string error;
+        ASSERT_TRUE(startBuiltinEmulation(&error)) << error;
+    }
+    static void TearDownTestSuite() { stopBuiltinEmulation(); }
+    void SetUp() override { Inbox::get().clear(); }
+
+    // The refusal a request got, or 0xFFFFFFFF if none came.
+    static std::uint32_t refusal(Addressable& a, std::uint32_t type, tolk::MsgBody* body,
+                                 std::uint32_t retType) {
+        try {
+            a.request(type, body, retType, nullptr);
+        } catch (Addressable::UnexpectedMsg& e) {
+            Std::MsgError_t err;
+            (void)err.readMsg(e.getMsg(), 0);
+            EXPECT_EQ(err.ErrorMsg, type);
+            return err.ErrorCode;
+        }
+        return 0xFFFFFFFF;
+    }
+};
+
+TEST_F(EmulationTest, ClusterSearchFindsTheChannelClusterAndItsTsc) {
+    Addressable cm(cd(farm::clusterMgrAddress(1)));
+    Cm::ClusterFind_t find;
+    find.CompStart = CompDesc_t(0xFFFF, 1, 1, 255, 0);
+    find.attr.realloc(3);
+    *find.attr[0] = tolk::CompAttr_t(0, 18);
+    *find.attr[1] = tolk::CompAttr_t(0x1200, 2);
+    *find.attr[2] = tolk::CompAttr_t(0x1201, 5);
+    Cm::ClusterResult_t cluster;
+    cm.request(0x800053, &find, 0x80002C, &cluster, 0, 1);
+    EXPECT_EQ(cluster.desc, cd(farm::channelClusterAddress(1, 2, 5)));
+
+    Cm::ClusterCompByAttr_t inCluster;
+    inCluster.ClustDesc = cluster.desc;
+    inCluster.CompType = 18;
+    inCluster.Attrs.realloc(1);
+    *inCluster.Attrs[0] = tolk::CompAttr_t(0, 18);
+    Cm::ComponentResult_t tsc;
+    cm.request(0x80001E, &inCluster, 0x800007, &tsc, 0, 1);
+    EXPECT_EQ(tsc.desc, cd(farm::channelComponentAddress(1, 2, 5, farm::kTSC)));
+}
+
+TEST_F(EmulationTest, SearchesForWhatDoesNotExistAreRefused) {
+    Addressable cm(cd(farm::clusterMgrAddress(3)));
+    Cm::ClusterFind_t find;
+    find.CompStart = CompDesc_t(0xFFFF, 3, 1, 255, 0);
+    find.attr.realloc(2);
+    *find.attr[0] = tolk::CompAttr_t(0, 22);
+    *find.attr[1] = tolk::CompAttr_t(0x1600, 3);  // the analog board has two lines
+    EXPECT_EQ(refusal(cm, 0x800053, &find, 0x80002C), kErrNoSuchCluster);
+
+    // A channel's cluster holds no line control.
+    Addressable cm2(cd(farm::clusterMgrAddress(2)));
+    Cm::ClusterCompByAttr_t lcon;
+    lcon.ClustDesc = cd(farm::channelClusterAddress(2, 1, 1));
+    lcon.CompType = 22;
+    EXPECT_EQ(refusal(cm2, 0x80001E, &lcon, 0x800007), kErrNoSuchComponent);
+}
+
+TEST_F(EmulationTest, ResourceManagerFindsAnyChpOfTheBoard) {
+    Addressable rm(cd(farm::resourceMgrAddress(1)));
+    Rm::CompFind_t find;
+    find.CompStart = CompDesc_t(0, 1, 255, 255, 0);
+    find.attr.realloc(1);
+    *find.attr[0] = tolk::CompAttr_t(0, 19);
+    Rm::ComponentResult_t res;
+    rm.request(0x80003D, &find, 0x800007, &res);
+    EXPECT_EQ(res.desc.component, 19);
+    EXPECT_EQ(res.desc.board, 1);
+}
+
+struct ParmCase {
+    unsigned int board;
+    farm::Address target;
+    std::uint32_t parm;
+    std::uint32_t value;
+};
+
+class EmulationParm : public EmulationTest, public testing::WithParamInterface<ParmCase> {};
+
+TEST_P(EmulationParm, GetParmAnswersWhatTheFarmSays) {
+    Addressable a(cd(GetParam().target));
+    Std::MsgGetParm_t q;
+    q.Num = GetParam().parm;
+    Std::MsgGetParmCmplt_t r;
+    a.request(0x12, &q, 0x13, &r);
+    EXPECT_EQ(r.Num, GetParam().parm);
+    EXPECT_EQ(r.Val, GetParam().value);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    DefaultFarm, EmulationParm,
+    testing::Values(ParmCase{1, farm::lconAddress(1, 1), 0x1601, 1},
+                    ParmCase{1, farm::lconAddress(1, 2), 0x1602, 4},
+                    ParmCase{2, farm::lconAddress(2, 1), 0x1602, 5},
+                    ParmCase{3, farm::lconAddress(3, 2), 0x1601, 4},
+                    ParmCase{1, farm::channelComponentAddress(1, 1, 1, farm::kCHP), 0x1313, 0},
+                    ParmCase{2, farm::channelComponentAddress(2, 1, 7, farm::kCHP), 0x1313, 1}));
+
+TEST_F(EmulationTest, UnknownParameterIsRefusedNamingIt) {
+    Addressable a(cd(farm::lconAddress(1, 1)));
+    Std::MsgGetParm_t q;
+    q.Num = 0x4242;
+    try {
+        a.request(0x12, &q, 0x13, nullptr);
+        FAIL() << "no refusal";
+    } catch (Addressable::UnexpectedMsg& e) {
+        Std::MsgError_t err;
+        (void)err.readMsg(e.getMsg(), 0);
+        EXPECT_EQ(err.ErrorMsg, 0x12u);
+        EXPECT_EQ(err.ErrorCode, kErrBadParameter);
+        auto* data = reinterpret_cast<Std::MsgError_t::Data_ErrorMsg_0x12_t*>(err.Data);
+        ASSERT_NE(data, nullptr);
+        EXPECT_EQ(data->Num, 0x4242u);
+    }
+}
+
+TEST_F(EmulationTest, SubscribedCallStateEventsFollowAMakeCall) {
+    Addressable tsc(cd(farm::channelComponentAddress(1, 1, 3, farm::kTSC)));
+    tsc.asyncRegisterEvtGroup(0x1230, &Inbox::take);
+    Std::MsgDetectxEvts_t sub;
+    sub.RetAddr = tsc.getMsgQueue()->getHostDesc();
+    sub.List.realloc(18);
+    for (unsigned int i = 0; i < 18; ++i) {
+        sub.List[i]->EvtType = 0x1230 + i;
+        sub.List[i]->EvtGroup = 0x1230;
+    }
+    tsc.request(0x18, &sub, 0x19, nullptr, tsc.getId());
+
+    Tsc::MsgMakeCall_t mk;
+    setText(mk.DestAddr, "8005551000");
+    setText(mk.OrigAddr, "5551214");
+    mk.CallProgress = 0;
+    Tsc::MsgMakeCallCmplt_t done;
+    tsc.request(0x1214, &mk, 0x1215, &done);
+    EXPECT_NE(done.CallId, 0u);
+
+    auto got = Inbox::get().waitFor(4);
+    ASSERT_EQ(got.size(), 4u);
+    const std::uint32_t states[] = {5, 15, 17, 2};
+    for (int i = 0; i < 4; ++i) {
+        ASSERT_EQ(got[i].size(), 6u);
+        EXPECT_EQ(got[i][0], 0x1230u);
+        EXPECT_EQ(got[i][1], 0x1230u + states[i]);
+        EXPECT_EQ(got[i][3], done.CallId);
+        EXPECT_EQ(got[i][4], states[i]);
+    }
+
+    Tsc::MsgDropCall_t drop;
+    drop.CallId = done.CallId;
+    drop.Reason = 14;
+    tsc.request(0x120A, &drop);  // one-way: silence is success
+    Tsc::MsgReleaseCall_t rel;
+    rel.CallId = done.CallId;
+    rel.Reason = 14;
+    tsc.request(0x121C, &rel);
+    got = Inbox::get().waitFor(6);
+    ASSERT_EQ(got.size(), 6u);
+    EXPECT_EQ(got[4][4], 9u);  // Idle
+    EXPECT_EQ(got[5][4], 0u);  // Null
+
+    Std::MsgCancelxEvts_t cancel;
+    cancel.EvtTypeList.realloc(18);
+    for (unsigned int i = 0; i < 18; ++i) {
+        *cancel.EvtTypeList[i] = 0x1230 + i;
+    }
+    tsc.request(0x1C, &cancel, 0x1D, nullptr, tsc.getId());
+    EXPECT_NE(builtinControl("stats").find("subscriptions=0"), std::string::npos);
+}
+
+TEST_F(EmulationTest, LineAlreadyInServiceIsRefusedWith1600) {
+    Addressable lcon(cd(farm::lconAddress(1, 2)));
+    Lcon::MsgSetLineState_t in;
+    in.State = 0x160F;
+    in.Reason = 0;
+    in.Priority = 0;
+    EXPECT_EQ(refusal(lcon, 0x1610, &in, 0x1611), 0x1600u);
+
+    Lcon::MsgSetLineState_t out;
+    out.State = 0x1610;
+    out.Reason = 4;
+    out.Priority = 0;
+    lcon.request(0x1610, &out, 0x1611, nullptr);
+    Lcon::MsgGetLineStateCmplt_t st;
+    lcon.request(0x1608, &getLine, 0x1609, &st);
+    EXPECT_EQ(st.LineState, 0x1610u);
+    EXPECT_EQ(st.Reason, 4u);
+    lcon.request(0x1610, &in, 0x1611, nullptr);
+    lcon.request(0x1608, &getLine, 0x1609, &st);
+    EXPECT_EQ(st.LineState, 0x160Fu);
+}
+
+TEST_F(EmulationTest, DiagnosticModeShowsInTheAlarms) {
+    Addressable lcon(cd(farm::lconAddress(1, 1)));
+    Lcon::MsgSetDiagMode_t mode;
+    mode.Mode = 2;
+    lcon.request(0x160E, &mode, 0x160F, nullptr);
+    Lcon::MsgGetDiagModeCmplt_t dm;
+    lcon.request(0x1604, &getDiag, 0x1605, &dm);
+    EXPECT_EQ(dm.DiagnosticMode, 2);
+
+    Lcon::MsgGetAlarms_t q;
+    q.Alarms.realloc(1);
+    *q.Alarms[0] = 0x1600;
+    Lcon::MsgGetAlarmsCmplt_t a;
+    lcon.request(0x1602, &q, 0x1603, &a);
+    bool loopback = false;
+    for (unsigned int i = 0; i < a.AlarmInfo.length(); ++i) {
+        if (a.AlarmInfo[i]->Type == 0x1605) {
+            loopback = a.AlarmInfo[i]->State == 1;
+        }
+    }
+    EXPECT_TRUE(loopback);
+    mode.Mode = 0;
+    lcon.request(0x160E, &mode, 0x160F, nullptr);
+}
+
+TEST_F(EmulationTest, FlexibleRoutingJoinsTheSlotsOfTheTwoClusters) {
+    Addressable tscCluster(cd(farm::channelClusterAddress(2, 1, 4)));
+    Addressable rocCluster(cd(farm::rocClusterAddress(2, 4)));
+    Cl::ClusterSlotInfo_t info;
+    info.portId = 0x4201;
+    Cl::ClusterSlotInfoResult_t tscSide, rocSide;
+    tscCluster.request(0x800032, &info, 0x800033, &tscSide);
+    rocCluster.request(0x800032, &info, 0x800033, &rocSide);
+    ASSERT_EQ(tscSide.width, 1);
+    ASSERT_EQ(rocSide.width, 1);
+    EXPECT_NE(*tscSide.slotIds[0], *rocSide.slotIds[0]);
+
+    Cl::ClusterSlotAssign_t assign;
+    assign.portId = 0x8201;
+    assign.slotIds = tscSide.slotIds;
+    assign.encoding = tscSide.encoding;
+    assign.idlePattern = tscSide.idlePattern;
+    rocCluster.request(0x800030, &assign, 0x800000, nullptr);
+    Cl::ClusterActivate_t act;
+    act.portId = 0x8201;
+    act.talkerDesc = CompDesc_t(0xFFFF, 0xFF, 0xFF, 0xFF, 0xFF);
+    rocCluster.request(0x80001B, &act, 0x800000, nullptr);
+    EXPECT_EQ(refusal(rocCluster, 0x80001B, &act, 0x800000), kErrBadState);
+
+    Cl::ClusterSlotUnassign_t un;
+    un.portId = 0x8201;
+    EXPECT_EQ(refusal(rocCluster, 0x800036, &un, 0x800000), kErrBadState);  // still active
+    Cl::ClusterDeactivate_t de;
+    de.portId = 0x8201;
+    rocCluster.request(0x800023, &de, 0x800000, nullptr);
+    rocCluster.request(0x800036, &un, 0x800000, nullptr);
+}
+
+TEST_F(EmulationTest, RefuseSilenceAndNormalOverrideOneMessageType) {
+    Proxy tsc(cd(farm::channelComponentAddress(1, 2, 1, farm::kTSC)));
+    Tsc::MsgGetChanStateCmplt_t st;
+    tsc.request(0x120F, &getChan, 0x1210, &st);
+    EXPECT_EQ(st.ChanState, 1u);
+
+    EXPECT_EQ(builtinControl("refuse 120f 77"), "ok");
+    EXPECT_EQ(refusal(tsc, 0x120F, &getChan, 0x1210), 0x77u);
+
+    EXPECT_EQ(builtinControl("silence 120f"), "ok");
+    tsc.setResponseTimeout(200);
+    EXPECT_THROW(tsc.request(0x120F, &getChan, 0x1210, &st), Addressable::Timeout);
+
+    EXPECT_EQ(builtinControl("normal 120f"), "ok");
+    tsc.request(0x120F, &getChan, 0x1210, &st);
+    EXPECT_EQ(st.ChanState, 1u);
+}
+
+TEST_F(EmulationTest, DelayHoldsAnswersBack) {
+    Proxy tsc(cd(farm::channelComponentAddress(1, 2, 2, farm::kTSC)));
+    EXPECT_EQ(builtinControl("delay 300"), "ok");
+    Tsc::MsgGetChanStateCmplt_t st;
+    tsc.setResponseTimeout(100);
+    EXPECT_THROW(tsc.request(0x120F, &getChan, 0x1210, &st), Addressable::Timeout);
+    tsc.setResponseTimeout(2000);
+    auto t0 = std::chrono::steady_clock::now();
+    tsc.request(0x120F, &getChan, 0x1210, &st);
+    EXPECT_GE(std::chrono::steady_clock::now() - t0, std::chrono::milliseconds(250));
+    EXPECT_EQ(builtinControl("delay 0"), "ok");
+}
+
+TEST_F(EmulationTest, ControlCallRingsAChannelAndAnswerConnectsIt) {
+    Addressable tsc(cd(farm::channelComponentAddress(1, 1, 10, farm::kTSC)));
+    EXPECT_EQ(builtinControl("call 1 1 30 555"), "error: no channel 1.1.30 in this farm");
+    std::string r = builtinControl("call 1 1 10 5550100");
+    ASSERT_EQ(r.rfind("ok call 0x", 0), 0u) << r;
+    Tsc::MsgGetCallStateCmplt_t cs;
+    Tsc::MsgGetCallState_t q;
+    q.CallId = 0;
+    tsc.request(0x120D, &q, 0x120E, &cs);
+    EXPECT_EQ(cs.CallState, 11u);
+    EXPECT_EQ(cs.Reason, 11u);
+    EXPECT_EQ(builtinControl("call 1 1 10 5550100"), "error: the channel already has a call");
+
+    Tsc::MsgAnswerCall_t ans;
+    ans.CallId = cs.CallId;
+    tsc.request(0x1201, &ans);
+    tsc.request(0x120D, &q, 0x120E, &cs);
+    EXPECT_EQ(cs.CallState, 2u);
+    EXPECT_EQ(builtinControl("hangup 1 1 10"), "ok");
+    tsc.request(0x120D, &q, 0x120E, &cs);
+    EXPECT_EQ(cs.CallState, 6u);
+    Tsc::MsgReleaseCall_t rel;
+    rel.CallId = cs.CallId;
+    rel.Reason = 14;
+    tsc.request(0x121C, &rel);
+}
+
+}  // namespace
+}  // namespace sim

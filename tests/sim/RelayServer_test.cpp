@@ -1,0 +1,351 @@
+// vx7sim's server over TCP: the framework's remote transport on one side, raw sockets for what a
+// well-behaved client never sends.
+#include "sim/RelayServer.h"
+
+#include <arpa/inet.h>
+#include <netinet/in.h>
+#include <sys/socket.h>
+#include <unistd.h>
+
+#include <gtest/gtest.h>
+
+#include <chrono>
+#include <condition_variable>
+#include <cstring>
+#include <mutex>
+#include <set>
+#include <sstream>
+#include <thread>
+
+#include "catalogue/generated/lcon_bodies.h"
+#include "catalogue/generated/stdresource_bodies.h"
+#include "catalogue/generated/tsc_bodies.h"
+#include "framework/Addressable.h"
+#include "framework/Msg.h"
+#include "platform/farm/ActiveFarm.h"
+#include "platform/farm/Addresses.h"
+#include "transport/TKSFrame.h"
+
+namespace sim {
+namespace {
+
+// Bodies without fields, for the requests that carry none.
+tolk::LCON_Bodies::MsgGetLineState_t getLine;
+tolk::LCON_Bodies::MsgGetDiagMode_t getDiag;
+tolk::TSC_Bodies::MsgGetChanState_t getChan;
+
+using tolk::Addressable;
+using tolk::CompDesc_t;
+using Std = tolk::StdResource_Bodies;
+using Tsc = tolk::TSC_Bodies;
+using Lcon = tolk::LCON_Bodies;
+
+CompDesc_t cd(const farm::Address& a) {
+    return CompDesc_t(a.instance, a.board, a.processor, a.component, a.node);
+}
+
+struct Events {
+    std::mutex lock;
+    std::condition_variable cv;
+    std::vector<std::pair<std::uint32_t, std::vector<std::uint32_t>>>
+        got;  // source instance, words
+
+    static Events& get() {
+        static Events e;
+        return e;
+    }
+    static void take(Addressable* a, tolk::Msg* m) {
+        std::vector<std::uint32_t> w;
+        // Big-endian words; a short last word is padded with zero bytes.
+        const unsigned char* p = tkMsgBody(m->getMsgRef());
+        for (unsigned int off = 0; off < m->getSize() && w.size() < 6; off += 4) {
+            std::uint32_t v = 0;
+            for (unsigned int i = 0; i < 4; ++i) {
+                v = (v << 8) | (off + i < m->getSize() ? p[off + i] : 0u);
+            }
+            w.push_back(v);
+        }
+        std::uint32_t src = a->getTgtDesc().instance;
+        delete m;
+        Events& e = get();
+        std::lock_guard<std::mutex> g(e.lock);
+        e.got.emplace_back(src, std::move(w));
+        e.cv.notify_all();
+    }
+    // Waits until an event satisfies `pred`.
+    template <class P>
+    bool waitFor(P pred) {
+        std::unique_lock<std::mutex> g(lock);
+        return cv.wait_for(g, std::chrono::seconds(5), [&] {
+            for (auto& e : got) {
+                if (pred(e.first, e.second)) {
+                    return true;
+                }
+            }
+            return false;
+        });
+    }
+};
+
+// A plain TCP client for raw frames.
+class RawClient {
+  public:
+    explicit RawClient(int port) {
+        fd = ::socket(AF_INET, SOCK_STREAM, 0);
+        sockaddr_in sa{};
+        sa.sin_family = AF_INET;
+        sa.sin_port = htons(static_cast<std::uint16_t>(port));
+        sa.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+        connected = ::connect(fd, reinterpret_cast<sockaddr*>(&sa), sizeof sa) == 0;
+        timeval tv{5, 0};
+        setsockopt(fd, SOL_SOCKET, SO_RCVTIMEO, &tv, sizeof tv);
+    }
+    ~RawClient() {
+        if (fd >= 0) {
+            ::close(fd);
+        }
+    }
+    void send(const std::vector<unsigned char>& bytes) {
+        ASSERT_EQ(::send(fd, bytes.data(), bytes.size(), MSG_NOSIGNAL),
+                  static_cast<ssize_t>(bytes.size()));
+    }
+    std::vector<unsigned char> open() {
+        unsigned char body[TKS_OPEN_BODY_BYTES];
+        TKSOpenRequest req;
+        req.maxRetMsgSize = 512;
+        req.depth = 5;
+        tksEncodeOpen(req, body);
+        msg_t m;
+        m.type = TKS_FRAME_OPEN;
+        m.size = sizeof body;
+        m.body = body;
+        return tksEncodeFrame(m);
+    }
+    // Reads n bytes; fewer if the server closed.
+    std::vector<unsigned char> read(std::size_t n) {
+        std::vector<unsigned char> out(n);
+        std::size_t got = 0;
+        while (got < n) {
+            ssize_t r = ::recv(fd, out.data() + got, n - got, 0);
+            if (r <= 0) {
+                break;
+            }
+            got += static_cast<std::size_t>(r);
+        }
+        out.resize(got);
+        return out;
+    }
+    bool closedByServer() {
+        char c;
+        return ::recv(fd, &c, 1, 0) == 0;
+    }
+    int fd = -1;
+    bool connected = false;
+};
+
+class RelayTest : public testing::Test {
+  protected:
+    void SetUp() override {
+        farm::resetActiveFarm();
+        unsetenv("VX7_FARM");
+        unsetenv("HOST");
+        auto load = farm::activeFarm();
+        ASSERT_TRUE(load.farm);
+        RelayOptions o;
+        o.port = 0;
+        o.bindAddress = "127.0.0.1";
+        server = std::make_unique<RelayServer>(load.farm, o, log);
+        std::string error;
+        ASSERT_TRUE(server->listen(error)) << error;
+        port = server->port();
+        loop = std::thread([this] { server->run(-1, nullptr); });
+        std::string host = "127.0.0.1:" + std::to_string(port);
+        setenv("REMOTE_TKHOST", host.c_str(), 1);
+    }
+    void TearDown() override {
+        unsetenv("REMOTE_TKHOST");
+        server->stop();
+        loop.join();
+    }
+    bool waitConnections(std::size_t n) {
+        for (int i = 0; i < 500; ++i) {
+            if (server->connectionCount() == n) {
+                return true;
+            }
+            std::this_thread::sleep_for(std::chrono::milliseconds(10));
+        }
+        return false;
+    }
+
+    std::ostringstream log;
+    std::unique_ptr<RelayServer> server;
+    std::thread loop;
+    int port = 0;
+};
+
+TEST_F(RelayTest, ClientsGetTheirOwnAddressesAndAnswers) {
+    Addressable a(cd(farm::channelComponentAddress(1, 1, 2, farm::kTSC)));
+    Addressable b(cd(farm::channelComponentAddress(1, 1, 2, farm::kTSC)));
+    CompDesc_t ha = a.getMsgQueue()->getHostDesc();
+    CompDesc_t hb = b.getMsgQueue()->getHostDesc();
+    EXPECT_EQ(ha.board, 0xFF);
+    EXPECT_EQ(hb.board, 0xFF);
+    EXPECT_NE(ha.instance, hb.instance);
+
+    Tsc::MsgGetChanStateCmplt_t st;
+    a.request(0x120F, &getChan, 0x1210, &st);
+    EXPECT_EQ(st.ChanState, 1u);
+    EXPECT_EQ(server->control("stats").rfind("ok stats requests=1 answers=1", 0), 0u);
+}
+
+TEST_F(RelayTest, ControlAlarmReachesTheSubscriber) {
+    Addressable lcon(cd(farm::lconAddress(1, 2)));
+    lcon.asyncRegisterEvtGroup(0x1600, &Events::take);
+    Std::MsgDetectEvt_t sub;
+    sub.RetAddr = lcon.getMsgQueue()->getHostDesc();
+    sub.EvtType = 0x1600;
+    sub.EvtGroup = 0;
+    lcon.request(0x16, &sub, 0x17, nullptr, lcon.getId());
+    EXPECT_EQ(server->control("alarm 1 2 red on"), "ok");
+    EXPECT_TRUE(Events::get().waitFor([](std::uint32_t, const std::vector<std::uint32_t>& w) {
+        // Label, alarm, then the state byte at the top of the third word.
+        return w.size() == 3 && w[0] == 0x1600 && w[1] == 0x1601 && (w[2] >> 24) == 1;
+    }));
+    EXPECT_EQ(server->control("alarm 1 9 red on"), "error: no line 1.9 in this farm");
+}
+
+TEST_F(RelayTest, FarEndCallBetweenTwoChannelsOfTwoClients) {
+    Addressable caller(cd(farm::channelComponentAddress(1, 1, 1, farm::kTSC)));
+    Addressable called(cd(farm::channelComponentAddress(1, 1, 23, farm::kTSC)));
+    for (Addressable* a : {&caller, &called}) {
+        a->asyncRegisterEvtGroup(0x1230, &Events::take);
+        Std::MsgDetectEvt_t sub;
+        sub.RetAddr = a->getMsgQueue()->getHostDesc();
+        sub.EvtType = 0x1230;
+        sub.EvtGroup = 0;
+        a->request(0x16, &sub, 0x17, nullptr, a->getId());
+    }
+    Tsc::MsgMakeCall_t mk;
+    mk.DestAddr.realloc(8);
+    std::memcpy(mk.DestAddr.data(), "5551234", 8);
+    mk.OrigAddr.realloc(8);
+    std::memcpy(mk.OrigAddr.data(), "5551212", 8);
+    Tsc::MsgMakeCallCmplt_t done;
+    caller.request(0x1214, &mk, 0x1215, &done);
+
+    std::uint16_t calledInst = called.getTgtDesc().instance;
+    std::uint16_t callerInst = caller.getTgtDesc().instance;
+    ASSERT_TRUE(Events::get().waitFor([&](std::uint32_t src, const std::vector<std::uint32_t>& w) {
+        return src == calledInst && w.size() == 6 && w[4] == 11;  // Offered
+    }));
+    std::uint32_t farCall = 0;
+    {
+        std::lock_guard<std::mutex> g(Events::get().lock);
+        for (auto& e : Events::get().got) {
+            if (e.first == calledInst && e.second[4] == 11) {
+                farCall = e.second[3];
+            }
+        }
+    }
+    EXPECT_NE(farCall, done.CallId);
+    Tsc::MsgAnswerCall_t ans;
+    ans.CallId = farCall;
+    called.request(0x1201, &ans);
+    EXPECT_TRUE(Events::get().waitFor([&](std::uint32_t src, const std::vector<std::uint32_t>& w) {
+        return src == callerInst && w.size() == 6 && w[3] == done.CallId && w[4] == 2;
+    }));
+}
+
+TEST_F(RelayTest, MalformedFrameClosesOnlyThatConnection) {
+    Addressable good(cd(farm::lconAddress(1, 1)));
+    RawClient bad(port);
+    ASSERT_TRUE(bad.connected);
+    bad.send(bad.open());
+    std::vector<unsigned char> assigned = bad.read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+    ASSERT_EQ(assigned.size(), TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+    // A message frame whose header is 12 bytes instead of 56.
+    std::vector<unsigned char> frame = {0, 0, 0x03, 0xE9, 0, 0, 0, 0, 0, 0, 0, 12, 0, 0, 0, 0,
+                                        0, 0, 0,    0,    1, 2, 3, 4, 5, 6, 7, 8,  9, 0, 1, 2};
+    bad.send(frame);
+    EXPECT_TRUE(bad.closedByServer());
+    EXPECT_NE(log.str().find("malformed message frame"), std::string::npos);
+
+    Lcon::MsgGetLineStateCmplt_t st;
+    good.request(0x1608, &getLine, 0x1609, &st);
+    EXPECT_EQ(st.LineState, 0x160Fu);
+}
+
+TEST_F(RelayTest, OversizeAndUnknownFramesAreRefused) {
+    for (std::uint32_t type : {std::uint32_t{4242}, std::uint32_t{TKS_FRAME_MESSAGE}}) {
+        RawClient c(port);
+        c.send(c.open());
+        c.read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+        msg_t m;
+        m.type = type;
+        std::vector<unsigned char> header(TKS_FRAME_HEADER_SIZE);
+        m.size = type == 4242u ? 0 : 102401;
+        tksEncodeFrameHeader(m, header.data());
+        c.send(header);
+        EXPECT_TRUE(c.closedByServer()) << type;
+    }
+    EXPECT_TRUE(waitConnections(0));
+}
+
+TEST_F(RelayTest, ClientVanishingMidFrameCostsNothing) {
+    for (int i = 0; i < 50; ++i) {
+        RawClient c(port);
+        std::vector<unsigned char> open = c.open();
+        open.resize(open.size() / 2);
+        c.send(open);
+    }
+    EXPECT_TRUE(waitConnections(0));
+    Addressable a(cd(farm::lconAddress(3, 1)));
+    Lcon::MsgGetLineStateCmplt_t st;
+    a.request(0x1608, &getLine, 0x1609, &st);
+    EXPECT_EQ(st.LineState, 0x160Fu);
+}
+
+TEST_F(RelayTest, HundredsOfConnectionsEachGetAUniqueAddress) {
+    std::vector<std::unique_ptr<RawClient>> clients;
+    for (int i = 0; i < 300; ++i) {
+        clients.push_back(std::make_unique<RawClient>(port));
+        ASSERT_TRUE(clients.back()->connected);
+        clients.back()->send(clients.back()->open());
+    }
+    std::set<std::uint32_t> instances;
+    for (auto& c : clients) {
+        std::vector<unsigned char> f = c->read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+        ASSERT_EQ(f.size(), TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+        msg_t m;
+        tksDecodeFrameHeader(f.data(), m);
+        ASSERT_EQ(m.type, TKS_FRAME_ASSIGNED);
+        m.body = f.data() + TKS_FRAME_HEADER_SIZE;
+        TKCompDesc addr;
+        ASSERT_TRUE(tksDecodeAssigned(m, addr));
+        EXPECT_EQ(addr.board, 0xFF);
+        instances.insert(addr.instance);
+    }
+    EXPECT_EQ(instances.size(), 300u);
+    EXPECT_EQ(server->control("drop"), "ok dropped 300");
+    for (auto& c : clients) {
+        EXPECT_TRUE(c->closedByServer());
+    }
+}
+
+TEST_F(RelayTest, CloseIsAcknowledged) {
+    RawClient c(port);
+    c.send(c.open());
+    c.read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+    msg_t m;
+    m.type = TKS_FRAME_CLOSE;
+    c.send(tksEncodeFrame(m));
+    std::vector<unsigned char> ack = c.read(TKS_FRAME_HEADER_SIZE);
+    ASSERT_EQ(ack.size(), TKS_FRAME_HEADER_SIZE);
+    msg_t h;
+    tksDecodeFrameHeader(ack.data(), h);
+    EXPECT_EQ(h.type, TKS_FRAME_CLOSE_ACK);
+    EXPECT_TRUE(c.closedByServer());
+}
+
+}  // namespace
+}  // namespace sim
