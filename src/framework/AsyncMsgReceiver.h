@@ -20,10 +20,19 @@ class AsyncMsgReceiver : public virtualObject {
     virtual void receive(Msg* msg) = 0;
 
   protected:
+    // For a subclass that must be whole before the reader may call it: it calls
+    // registerReceiver() at the end of its own constructor.
+    struct Deferred {};
+    AsyncMsgReceiver(Addressable* a, Deferred);
+    void registerReceiver();
+    // Idempotent; once it returns, the queue no longer calls this receiver.
+    void deregisterReceiver();
+
     Addressable* addressable;
 
   private:
     CompDesc_t source;
+    bool registered = false;
 };
 
 }  // namespace tolk

@@ -45,11 +45,17 @@ bool Info::operator==(const callbackInfo& o) const {
 }
 
 EvtCallback::EvtCallback(Addressable* a)
-    : AsyncMsgReceiver(a),
+    : AsyncMsgReceiver(a, Deferred{}),
       unregisteredMsg(EvtCallback_unregisteredMsgHandler, 0),
-      unregisteredEvt(EvtCallback_unregisteredEvtHandler, 0) {}
+      unregisteredEvt(EvtCallback_unregisteredEvtHandler, 0) {
+    registerReceiver();
+}
 
-EvtCallback::~EvtCallback() = default;
+// Off the queue first, while the lists and the lock still exist: a dispatch in progress ends
+// before deregistration returns.
+EvtCallback::~EvtCallback() {
+    deregisterReceiver();
+}
 
 void EvtCallback::add(CallbackMap& map, unsigned int number, const callbackInfo& info) {
     MutexGuard g(lock);

@@ -86,6 +86,7 @@ void MsgQueue::RegisterAsyncMsgReceiver(CompDesc_t source, AsyncMsgReceiver* rec
 }
 
 void MsgQueue::DeregisterAsyncMsgReceiver(CompDesc_t source) {
+    std::lock_guard<std::recursive_mutex> g(dispatchLock);
     receivers.unset(source);
 }
 
@@ -104,6 +105,7 @@ void MsgQueue::toStream(std::ostream* os) const {
 int MsgQueue::MsgRouter(TKSMsgRef& ref) {
     Msg* msg = new Msg(&ref);
     CompDesc_t source = msg->getSrcAddr();
+    std::lock_guard<std::recursive_mutex> g(dispatchLock);
     AsyncMsgReceiver* receiver = nullptr;
     try {
         receiver = receivers.get(source);

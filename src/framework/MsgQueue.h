@@ -2,6 +2,7 @@
 
 #include <atomic>
 #include <memory>
+#include <mutex>
 
 #include "framework/CompDesc_t.h"
 #include "framework/Exception.h"
@@ -89,6 +90,10 @@ class MsgQueue : public virtualObject {
     sharedKeyedList<CompDesc_t, AsyncMsgReceiver*> receivers;
     std::atomic<UnregisteredHandler> unregisteredHandler;
     Mutex requestLock;
+    // Held by the reader from the lookup of a receiver to the end of its receive, and by
+    // deregistration, so that a receiver is never called after it has deregistered. Recursive:
+    // a callback on the reader may deregister.
+    std::recursive_mutex dispatchLock;
 };
 
 // Banner to the error stream for a message nobody registered for; frees the message.
