@@ -1,0 +1,117 @@
+#include "catalogue/resourcemgr/ResourceMgr.h"
+
+#include "catalogue/cluster/Cluster.h"
+
+namespace tolk {
+
+namespace {
+
+constexpr unsigned short kServiceInstance = 5;
+
+// The address that means "no cluster": every field at its maximum.
+CompDesc_t noCluster() {
+    return CompDesc_t(0xFFFF, 0xFF, 0xFF, 0xFF, 0xFF);
+}
+
+void appendType(staticList<CompAttr_t>& attrs, unsigned int type) {
+    unsigned int n = attrs.length();
+    attrs.realloc(n + 1);
+    *attrs.element(n) = CompAttr_t(0, static_cast<int>(type));
+}
+
+}  // namespace
+
+ResourceMgr::ResourceMgr(const Addressable* owner) : Addressable(owner) {
+    TgtDesc =
+        CompDesc_t(kServiceInstance, owner->getTgtDesc().board, 1, 0, owner->getTgtDesc().node);
+}
+
+MsgBody* ResourceMgr::MsgBodyLookup(unsigned int type) {
+    if (MsgBody* body = ResourceMgr_Bodies::msgLookup(type)) {
+        return body;
+    }
+    return Addressable::MsgBodyLookup(type);
+}
+
+StdResource ResourceMgr::find(unsigned int type, unsigned char processor, unsigned short instance,
+                              staticList<CompAttr_t> attrs) {
+    if (type != 0) {
+        appendType(attrs, type);
+    }
+    CompDesc_t CompStart(instance, TgtDesc.board, processor, 0xFF, TgtDesc.node);
+    unsigned int count = 0xFFFFFFFF;
+    CompFind_t body(CompStart, count, attrs);
+    ComponentResult_t answer;
+    request(0x80003D, &body, 0x800007, &answer);
+    return StdResource(answer.desc, queue);
+}
+
+TmpInstance ResourceMgr::allocate(unsigned int type, unsigned char processor,
+                                  unsigned short instance, Cluster* cluster,
+                                  staticList<CompAttr_t> attrs) {
+    if (type != 0) {
+        appendType(attrs, type);
+    }
+    CompDesc_t CompStart(instance, TgtDesc.board, processor, 0xFF, TgtDesc.node);
+    CompDesc_t ClustDesc = cluster != nullptr ? cluster->getTgtDesc() : noCluster();
+    unsigned int count = 0xFFFFFFFF;
+    CompInstAllocate_t body(CompStart, ClustDesc, count, attrs);
+    ComponentResult_t answer;
+    request(0x80003E, &body, 0x800007, &answer);
+    TmpInstance result(answer.desc, queue);
+    result.freeOnDestroy = 1;
+    return result;
+}
+
+void ResourceMgr::free(StdResource* resource) {
+    CompDesc_t desc = resource->getTgtDesc();
+    CompInstFree_t body(desc);
+    request(0x800041, &body);
+}
+
+void ResourceMgr::use(StdResource* resource, unsigned int payload) {
+    staticList<CompUse_t::List_t> list;
+    list.realloc(1);
+    list.element(0)->desc = resource->getTgtDesc();
+    list.element(0)->Payload = payload;
+    unsigned char Count = 0xFF;
+    CompUse_t body(Count, list);
+    request(0x800059, &body, 0x800000, nullptr);
+}
+
+void ResourceMgr::unuse(StdResource* resource) {
+    staticList<CompUnuse_t::List_t> list;
+    list.realloc(1);
+    list.element(0)->desc = resource->getTgtDesc();
+    unsigned char Count = 0xFF;
+    CompUnuse_t body(Count, list);
+    request(0x80005A, &body, 0x800000, nullptr);
+}
+
+void ResourceMgr::FindAllComponents(CompFindAll_t* body, CompMultipleResult_t* ret) {
+    request(0x800062, body, 0x800063, ret);
+}
+
+void ResourceMgr::FindAllComponents(CompDesc_t& startDesc, CompDesc_t& endDesc,
+                                    staticList<CompAttr_t>& attrs, CompMultipleResult_t* ret) {
+    FindAllComponents(startDesc, endDesc, attrs, 0xFFFFFFFF, ret);
+}
+
+void ResourceMgr::FindAllComponents(CompDesc_t& startDesc, CompDesc_t& endDesc,
+                                    staticList<CompAttr_t>& attrs, unsigned int count,
+                                    CompMultipleResult_t* ret) {
+    CompFindAll_t body(startDesc, endDesc, count, attrs);
+    request(0x800062, &body, 0x800063, ret);
+}
+
+void ResourceMgr::AttrInfo(CompAttrInfo_t* body, CompAttrInfoResult_t* ret) {
+    request(0x80003A, body, 0x800006, ret);
+}
+
+void ResourceMgr::AttrInfo(CompDesc_t& theInstance, unsigned int count, unsigned int attroffset,
+                           CompAttrInfoResult_t* ret) {
+    CompAttrInfo_t body(theInstance, count, attroffset);
+    request(0x80003A, &body, 0x800006, ret);
+}
+
+}  // namespace tolk
