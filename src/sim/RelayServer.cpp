@@ -235,12 +235,10 @@ void RelayServer::acceptAll() {
 }
 
 void RelayServer::readFrom(Conn& c) {
+    static thread_local std::vector<unsigned char> chunk(kReadChunk);
     for (int round = 0; round < 4; ++round) {
-        std::size_t old = c.in.size();
-        c.in.resize(old + kReadChunk);
-        ssize_t n = ::recv(c.fd, c.in.data() + old, kReadChunk, 0);
+        ssize_t n = ::recv(c.fd, chunk.data(), chunk.size(), 0);
         if (n <= 0) {
-            c.in.resize(old);
             if (n == 0) {
                 close(c, c.inPos < c.in.size() ? "closed in the middle of a frame" : nullptr);
                 return;
@@ -251,11 +249,11 @@ void RelayServer::readFrom(Conn& c) {
             close(c, std::strerror(errno));
             return;
         }
-        c.in.resize(old + static_cast<std::size_t>(n));
+        c.in.insert(c.in.end(), chunk.data(), chunk.data() + n);
         if (!processFrames(c)) {
             return;
         }
-        if (static_cast<std::size_t>(n) < kReadChunk) {
+        if (static_cast<std::size_t>(n) < chunk.size()) {
             break;
         }
     }
