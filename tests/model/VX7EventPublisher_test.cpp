@@ -84,12 +84,6 @@ TEST_F(Publisher, RefusedClusterSearchIsAFailedAttachNotAnException) {
     EXPECT_EQ(publisher.GetLconCluster(), nullptr);
 }
 
-TEST_F(Publisher, AbsentBoardIsAFailedAttach) {
-    VX7EventPublisher publisher(9, 1, 1);
-    EXPECT_FALSE(publisher.Attach(first, &trunkState));
-    EXPECT_EQ(publisher.ObserverCount(trunkState), 0);
-}
-
 TEST_F(Publisher, ChannelAspectsShareOneTscUntilTheLastGoes) {
     VX7EventPublisher publisher(1, 1, 5);
     ASSERT_TRUE(publisher.Attach(first, &callState));
