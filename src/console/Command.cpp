@@ -1,6 +1,15 @@
 #include "console/Command.h"
 
+#include "console/View.h"
+
 namespace lineprobe {
+
+namespace {
+
+constexpr int RESULT_ROW = 2;
+constexpr int RESULT_COL = 1;
+
+}  // namespace
 
 std::string Command::GetCommandName() {
     return name_;
@@ -24,6 +33,18 @@ int Command::Execute(int, int, int, char*) {
 
 int Command::Execute(std::string) {
     return 0;
+}
+
+void Command::Report(const char* text) {
+    if (view_ != nullptr) {
+        view_->PrintString(text, RESULT_ROW, RESULT_COL);
+    }
+}
+
+void Command::RefreshView() {
+    if (view_ != nullptr) {
+        view_->Refresh();
+    }
 }
 
 void Command::SetView(View* view) {

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <string>
+#include <utility>
 
 namespace lineprobe {
 
@@ -25,6 +26,10 @@ class Command {
     void SetView(View* view);
 
   protected:
+    // One-line result at row 2, column 1 of the command window, and its refresh.
+    void Report(const char* text);
+    void RefreshView();
+
     View* view_ = nullptr;
     std::string name_;
 };

@@ -6,6 +6,9 @@
 #include <iostream>
 
 #include "console/ConsoleDisplay.h"
+#include "console/PhoneViewMgr.h"
+#include "console/TrunkViewMgr.h"
+#include "console/View.h"
 
 namespace lineprobe {
 
@@ -19,6 +22,14 @@ std::optional<std::string> HelpCmd::BuildPagerCommand(const std::string& directo
 }
 
 int HelpCmd::Execute() {
+    View* phoneWindow = phoneViewMgr_ != nullptr ? phoneViewMgr_->GetView() : nullptr;
+    View* trunkWindow = trunkViewMgr_ != nullptr ? trunkViewMgr_->GetView() : nullptr;
+    if (phoneWindow != nullptr) {
+        phoneWindow->DisableRefresh();
+    }
+    if (trunkWindow != nullptr) {
+        trunkWindow->DisableRefresh();
+    }
     ConsoleDisplay* display = ConsoleDisplay::GetDisplay();
     display->Suspend();
 
@@ -44,6 +55,14 @@ int HelpCmd::Execute() {
         }
     }
 
+    // Refresh comes back before the repaint, which then shows what events drew on the
+    // rows while the pager had the terminal.
+    if (phoneWindow != nullptr) {
+        phoneWindow->EnableRefresh();
+    }
+    if (trunkWindow != nullptr) {
+        trunkWindow->EnableRefresh();
+    }
     display->Resume();
     return 0;
 }

@@ -8,6 +8,9 @@
 
 namespace lineprobe {
 
+class PhoneViewMgr;
+class TrunkViewMgr;
+
 // Room for the pager command line, terminator included.
 constexpr std::size_t MAX_FILENAME_SIZE = 256;
 
@@ -15,13 +18,15 @@ constexpr std::size_t MAX_FILENAME_SIZE = 256;
 // named by CORVO_ORVANE_DIR (with its trailing slash) in "bin/". The display is
 // suspended while the pager has the terminal, so rows that change meanwhile are drawn
 // only when the screen comes back.
-//
-// The phone and trunk view managers join this command with the views; their windows'
-// refresh is turned off around the pager as well.
+// The phone and trunk views windows also have their refresh turned off meanwhile.
 class HelpCmd : public Command {
   public:
-    HelpCmd(std::string name, std::string helpFileName)
-        : Command(std::move(name)), helpFileName_(std::move(helpFileName)) {}
+    HelpCmd(std::string name, std::string helpFileName, PhoneViewMgr* phoneViewMgr = nullptr,
+            TrunkViewMgr* trunkViewMgr = nullptr)
+        : Command(std::move(name)),
+          phoneViewMgr_(phoneViewMgr),
+          trunkViewMgr_(trunkViewMgr),
+          helpFileName_(std::move(helpFileName)) {}
 
     using Command::Execute;
     int Execute() override;
@@ -33,6 +38,8 @@ class HelpCmd : public Command {
                                                         const std::string& fileName);
 
   private:
+    PhoneViewMgr* phoneViewMgr_;
+    TrunkViewMgr* trunkViewMgr_;
     std::string helpFileName_;
     std::string orvaneDir_;
     const char* envVarName_ = "CORVO_ORVANE_DIR";

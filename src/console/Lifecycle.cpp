@@ -12,10 +12,17 @@
 
 #include "console/ConsoleDisplay.h"
 #include "console/DisplayGuard.h"
+#include "console/PhoneViewMgr.h"
+#include "console/TrunkViewMgr.h"
 #include "console/Version.h"
 #include "console/View.h"
 
 lineprobe::ConsoleDisplay* g_curDisplay = nullptr;
+lineprobe::ConsoleSystemView* g_sysView = nullptr;
+lineprobe::View* g_SystemView = nullptr;
+lineprobe::PhoneViewMgr* g_phoneViewMgr = nullptr;
+lineprobe::View* g_TrunkViewWindow = nullptr;
+lineprobe::TrunkViewMgr* g_trunkViewMgr = nullptr;
 lineprobe::View* g_CmdProcessorView = nullptr;
 
 namespace {
@@ -37,6 +44,17 @@ const char* TerminationLine(int sig) {
 }
 
 std::atomic<std::thread::id> g_terminatingThread{};
+
+// The views did not stop in time: end without them, the terminal put back first.
+void ShutdownOverdue(int) {
+    if (g_curDisplay != nullptr) {
+        lineprobe::DisplayGuard guard{std::chrono::milliseconds(SHUTDOWN_DISPLAY_WAIT_MS)};
+        g_curDisplay->Stop();
+    }
+    std::cerr << "views did not stop within " << SHUTDOWN_VIEWS_WAIT_S
+              << " s: shutdown completed without them" << std::endl;
+    _exit(1);
+}
 
 }  // namespace
 
@@ -85,9 +103,18 @@ void terminate_app(int sig) {
         g_CmdProcessorView->PrintString("starting app shutdown", 2, 1);
     }
 
-    // The phone and trunk view managers stop all their views here, once they exist
-    // (DestroyAllPhoneViews, then DestroyAllTrunkViews), without the display lock:
-    // stopping a view waits for the board, whose events need the screen.
+    // Without the display lock: stopping a view waits for the board, and the events that
+    // come meanwhile need the screen.
+    if (g_phoneViewMgr != nullptr || g_trunkViewMgr != nullptr) {
+        signal(SIGALRM, ShutdownOverdue);
+        alarm(SHUTDOWN_VIEWS_WAIT_S);
+    }
+    if (g_phoneViewMgr != nullptr) {
+        g_phoneViewMgr->DestroyAllPhoneViews();
+    }
+    if (g_trunkViewMgr != nullptr) {
+        g_trunkViewMgr->DestroyAllTrunkViews();
+    }
 
     if (g_curDisplay != nullptr) {
         lineprobe::DisplayGuard guard(wait);

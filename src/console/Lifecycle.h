@@ -2,21 +2,32 @@
 
 namespace lineprobe {
 class ConsoleDisplay;
+class ConsoleSystemView;
+class PhoneViewMgr;
+class TrunkViewMgr;
 class View;
 }  // namespace lineprobe
 
 // Process-wide objects of the console, made once by start-up and never freed. Null until
 // set: a signal can arrive at any point of start-up, and the shutdown skips what is not
 // there yet.
-//
-// The system view (g_sysView, g_SystemView) and the two view managers (g_phoneViewMgr,
-// g_trunkViewMgr, with g_TrunkViewWindow) join here with the board model.
 extern lineprobe::ConsoleDisplay* g_curDisplay;
+extern lineprobe::ConsoleSystemView* g_sysView;
+extern lineprobe::View* g_SystemView;
+extern lineprobe::PhoneViewMgr* g_phoneViewMgr;
+extern lineprobe::View* g_TrunkViewWindow;
+extern lineprobe::TrunkViewMgr* g_trunkViewMgr;
 extern lineprobe::View* g_CmdProcessorView;
 
 // Longest the shutdown waits for another thread to let go of the screen before it goes on
 // without the display lock.
 constexpr int SHUTDOWN_DISPLAY_WAIT_MS = 2000;
+
+// Longest the shutdown gives the views to stop. Stopping asks the boards to cancel their
+// subscriptions, and a board that is silent, or a request that the signal interrupted on
+// the thread that now runs the shutdown, could hold it up for good; past this the process
+// ends all the same, with the terminal put back.
+constexpr unsigned int SHUTDOWN_VIEWS_WAIT_S = 10;
 
 // Handles the command line of an invocation with arguments (argc and argv without the
 // program name): prints the version, the help path or the complaint, and returns the

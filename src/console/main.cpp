@@ -1,15 +1,43 @@
 #include <csignal>
 #include <iostream>
 
+#include <cstdlib>
+
+#include "console/AcceptCallCmd.h"
+#include "console/AnswerCallCmd.h"
+#include "console/ChanStateInServiceCmd.h"
+#include "console/ChanStateOutOfServiceCmd.h"
 #include "console/CmdProcessor.h"
 #include "console/CommandTable.h"
 #include "console/ConsoleDisplay.h"
 #include "console/ConsoleLayout.h"
+#include "console/ConsoleSystemView.h"
+#include "console/DeletePhoneCmd.h"
+#include "console/DeleteTrunkCmd.h"
+#include "console/DestAddrCmd.h"
+#include "console/DisableLoopBackCmd.h"
+#include "console/DropCallCmd.h"
+#include "console/EnableLineLoopBackCmd.h"
+#include "console/EnablePayloadLoopBackCmd.h"
 #include "console/HelpCmd.h"
 #include "console/Lifecycle.h"
+#include "console/MakeCallCmd.h"
+#include "console/NewPhoneCmd.h"
+#include "console/NewTrunkCmd.h"
+#include "console/OrigAddrCmd.h"
+#include "console/PhoneViewMgr.h"
 #include "console/QuitCmd.h"
 #include "console/Redirect.h"
+#include "console/ReleaseCallCmd.h"
+#include "console/ResetChanCmd.h"
+#include "console/StartTxRAICmd.h"
+#include "console/StopTxRAICmd.h"
+#include "console/TrunkStateInServiceCmd.h"
+#include "console/TrunkStateOutOfServiceCmd.h"
+#include "console/TrunkViewMgr.h"
 #include "console/View.h"
+#include "framework/tolk.h"
+#include "sim/Builtin.h"
 
 using namespace lineprobe;
 
@@ -25,7 +53,7 @@ int main(int argc, char* argv[]) {
         return 1;
     }
 
-    // tolk::tolkInit() comes here once the messaging framework joins the console.
+    tolk::tolkInit();
 
     g_curDisplay = ConsoleDisplay::GetDisplay();
     if (g_curDisplay == nullptr) {
@@ -48,18 +76,36 @@ int main(int argc, char* argv[]) {
         return 1;
     }
 
-    // The system view joins here with the board model: ConsoleSystemView walks the boards
-    // and fills a View of SYSVIEW_WINDOW_HEIGHT by SYSVIEW_WINDOW_WIDTH at
-    // SYSVIEW_STARTING_ROW, SYSVIEW_STARTING_COL.
+    // Without a relay host the boards are those of the farm, played in this process. A
+    // broken farm is reported in the error log and leaves the tool without boards.
+    if (std::getenv("REMOTE_TKHOST") == nullptr) {
+        std::string error;
+        if (!sim::startBuiltinEmulation(&error)) {
+            std::cerr << "board emulation not started: " << error << std::endl;
+        }
+    }
+
+    g_sysView = new ConsoleSystemView();
+    g_SystemView = new View(g_curDisplay, SYSVIEW_WINDOW_HEIGHT, SYSVIEW_WINDOW_WIDTH,
+                            SYSVIEW_STARTING_ROW, SYSVIEW_STARTING_COL);
+    g_sysView->SetView(g_SystemView);
+    g_sysView->Display();
 
     g_curDisplay->DrawHorizontalLine(SYSVIEW_SEPARATOR_ROW, STARTING_COL, MIN_COLS);
     g_curDisplay->Refresh();
 
-    // The phone views window and PhoneViewMgr::CreatePhoneViewMgr join here with the views.
+    View* phoneViewsWindow =
+        new View(g_curDisplay, PHONEVIEWS_WINDOW_HEIGHT, PHONEVIEWS_WINDOW_WIDTH,
+                 PHONEVIEWS_WINDOW_STARTING_ROW, PHONEVIEWS_WINDOW_STARTING_COL);
+    g_phoneViewMgr = PhoneViewMgr::CreatePhoneViewMgr(phoneViewsWindow);
+    phoneViewsWindow->Refresh();
 
     g_curDisplay->DrawHorizontalLine(PHONEVIEWS_SEPARATOR_ROW, STARTING_COL, MIN_COLS);
 
-    // The trunk views window and TrunkViewMgr::CreateTrunkViewMgr join here with the views.
+    g_TrunkViewWindow = new View(g_curDisplay, TRUNKVIEWS_WINDOW_HEIGHT, TRUNKVIEWS_WINDOW_WIDTH,
+                                 TRUNKVIEWS_WINDOW_STARTING_ROW, TRUNKVIEWS_WINDOW_STARTING_COL);
+    g_trunkViewMgr = TrunkViewMgr::CreateTrunkViewMgr(g_TrunkViewWindow);
+    g_TrunkViewWindow->Refresh();
 
     g_curDisplay->DrawHorizontalLine(TRUNKVIEWS_SEPARATOR_ROW, STARTING_COL, MIN_COLS);
 
@@ -68,12 +114,35 @@ int main(int argc, char* argv[]) {
                  CMDPROCESSOR_VIEW_WINDOW_STARTING_ROW, CMDPROCESSOR_VIEW_WINDOW_STARTING_COL);
     CmdProcessor processor(g_CmdProcessorView);
 
-    // Created in the order of COMMAND_CREATION_ORDER. The 21 phone and trunk commands
-    // (each given its view manager) join between help and the end of this list with the
-    // views; RegisterCommands already knows their places.
-    std::vector<Command*> commands;
-    commands.push_back(new QuitCmd("quit"));
-    commands.push_back(new HelpCmd("help", "lineprobe_help.txt"));
+    // Created in the order of COMMAND_CREATION_ORDER; RegisterCommands registers them in
+    // the order of COMMAND_REGISTRATION_ORDER.
+    PhoneViewMgr* phones = g_phoneViewMgr;
+    TrunkViewMgr* trunks = g_trunkViewMgr;
+    const std::vector<Command*> commands = {
+        new QuitCmd("quit"),
+        new HelpCmd("help", "lineprobe_help.txt", phones, trunks),
+        new NewPhoneCmd("phone", phones),
+        new NewTrunkCmd("trunk", trunks),
+        new DeletePhoneCmd("delphone", phones),
+        new MakeCallCmd("makecall", phones),
+        new AnswerCallCmd("answer", phones),
+        new AcceptCallCmd("accept", phones),
+        new DropCallCmd("drop", phones),
+        new ReleaseCallCmd("release", phones),
+        new ChanStateOutOfServiceCmd("chan_oos", phones),
+        new ChanStateInServiceCmd("chan_ins", phones),
+        new TrunkStateInServiceCmd("trunk_ins", trunks),
+        new TrunkStateOutOfServiceCmd("trunk_oos", trunks),
+        new OrigAddrCmd("origaddr", phones),
+        new DestAddrCmd("destaddr", phones),
+        new DeleteTrunkCmd("deltrunk", trunks),
+        new ResetChanCmd("reset", phones),
+        new DisableLoopBackCmd("disablelbk", trunks),
+        new EnableLineLoopBackCmd("linelbk", trunks),
+        new EnablePayloadLoopBackCmd("payloadlbk", trunks),
+        new StartTxRAICmd("startrai", trunks),
+        new StopTxRAICmd("stoprai", trunks),
+    };
     RegisterCommands(processor, commands);
 
     processor.ProcessCommands();

@@ -1,0 +1,28 @@
+#include "console/EnableLineLoopBackCmd.h"
+
+#include "console/TrunkView.h"
+#include "console/TrunkViewMgr.h"
+#include "model/Trunk.h"
+
+namespace lineprobe {
+
+int EnableLineLoopBackCmd::Execute() {
+    return 0;
+}
+
+int EnableLineLoopBackCmd::Execute(int board, int line) {
+    TrunkView* trunkView =
+        manager->FindTrunkView(static_cast<unsigned int>(board), static_cast<unsigned int>(line));
+    if (trunkView != nullptr) {
+        vx7diag::Trunk* trunk = trunkView->GetTrunk();
+        trunk->EnableLoopBack(2);
+        Report("enabling line loopback completed");
+        RefreshView();
+    } else {
+        Report("ERROR - unable to find trunk view");
+        RefreshView();
+    }
+    return 0;
+}
+
+}  // namespace lineprobe

@@ -1,0 +1,42 @@
+#pragma once
+
+#include <sys/types.h>
+
+#include <chrono>
+#include <cstdio>
+#include <string>
+
+namespace lineprobe::testing {
+
+// A vx7sim relay of its own on a free port of the loopback interface, driven by its
+// control channel: each control line gets one answer line. Stopped with the object.
+class SimServer {
+  public:
+    // The farm file is played by the relay; lineprobe must be given the same one in
+    // VX7_FARM, since its device map reads the farm itself.
+    explicit SimServer(const std::string& farmFile);
+    ~SimServer();
+
+    SimServer(const SimServer&) = delete;
+    SimServer& operator=(const SimServer&) = delete;
+
+    bool Running() const { return port_ > 0; }
+    int Port() const { return port_; }
+    // "127.0.0.1:PORT", for REMOTE_TKHOST.
+    std::string Address() const;
+
+    // Sends one control line and returns its answer, or "" when none came in time.
+    std::string Control(const std::string& line,
+                        std::chrono::milliseconds timeout = std::chrono::milliseconds(15000));
+
+  private:
+    std::string ReadLine(std::chrono::milliseconds timeout);
+
+    pid_t pid_ = -1;
+    int toSim_ = -1;
+    int fromSim_ = -1;
+    int port_ = 0;
+    std::string pending_;
+};
+
+}  // namespace lineprobe::testing
