@@ -27,6 +27,11 @@ class CountedWords : public tolk::MsgBody {
     }
     unsigned int readMsg(Msg* m, unsigned int off) override {
         off = tolk::getFirst(m, off, 0x380000, &count);
+        // Counts the list may hold but no message carries only cost time here: fold them down
+        // and keep the impossible ones, which must be refused.
+        if (count <= staticList<unsigned int>::MaxBytes / 4) {
+            count %= 65536;
+        }
         return tolk::getList(m, off, 7, words, count, false);
     }
     unsigned int GetByteSize() override { return 4 + 4 * words.length(); }
