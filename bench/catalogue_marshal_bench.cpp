@@ -1,43 +1,14 @@
-// Body marshalling cost and heap allocations per body, counted by a replaced operator new.
+// Body marshalling cost and heap allocations per body.
 
 #include <benchmark/benchmark.h>
 
-#include <atomic>
-#include <cstdlib>
 #include <cstring>
-#include <new>
 
+#include "AllocCounter.h"
 #include "catalogue/generated/stdresource_bodies.h"
 #include "catalogue/generated/tsc_bodies.h"
 #include "framework/Msg.h"
 #include "platform/tkhost/tkhost.h"
-
-namespace {
-std::atomic<unsigned long> g_allocs{0};
-}
-
-void* operator new(std::size_t n) {
-    g_allocs.fetch_add(1, std::memory_order_relaxed);
-    if (void* p = std::malloc(n == 0 ? 1 : n)) {
-        return p;
-    }
-    throw std::bad_alloc();
-}
-void* operator new[](std::size_t n) {
-    return operator new(n);
-}
-void operator delete(void* p) noexcept {
-    std::free(p);
-}
-void operator delete[](void* p) noexcept {
-    std::free(p);
-}
-void operator delete(void* p, std::size_t) noexcept {
-    std::free(p);
-}
-void operator delete[](void* p, std::size_t) noexcept {
-    std::free(p);
-}
 
 namespace {
 
@@ -61,12 +32,12 @@ void BM_Marshal_MakeCall(benchmark::State& state) {
     tolk::TSC_Bodies::MsgMakeCall_t back;
     tolk::Msg m(body.GetByteSize());
     back.readMsg(&m, 0);  // sizes the read side's arrays once
-    unsigned long before = g_allocs.load();
+    unsigned long before = lp_bench::heapAllocations();
     for (auto _ : state) {
         benchmark::DoNotOptimize(body.writeMsg(&m, 0));
         benchmark::DoNotOptimize(back.readMsg(&m, 0));
     }
-    report(state, g_allocs.load() - before, 0);
+    report(state, lp_bench::heapAllocations() - before, 0);
 }
 BENCHMARK(BM_Marshal_MakeCall);
 
@@ -81,13 +52,13 @@ void BM_Marshal_DetectxEvts18(benchmark::State& state) {
     }
     tolk::StdResource_Bodies::MsgDetectxEvts_t body(addr, count, list);
     tolk::StdResource_Bodies::MsgDetectxEvts_t back;
-    unsigned long before = g_allocs.load();
+    unsigned long before = lp_bench::heapAllocations();
     for (auto _ : state) {
         tolk::Msg m(body.GetByteSize());
         benchmark::DoNotOptimize(body.writeMsg(&m, 0));
         benchmark::DoNotOptimize(back.readMsg(&m, 0));
     }
-    report(state, g_allocs.load() - before, 0);
+    report(state, lp_bench::heapAllocations() - before, 0);
 }
 BENCHMARK(BM_Marshal_DetectxEvts18);
 
@@ -97,13 +68,13 @@ void BM_Decode_EvtCallState(benchmark::State& state) {
     const unsigned char bytes[24] = {0, 0, 0x12, 0x30, 0, 0, 0x12, 0x34, 0, 0, 0, 1,
                                      0, 0, 0,    5,    0, 0, 0,    3,    0, 0, 0, 14};
     std::memcpy(b, bytes, 24);
-    unsigned long before = g_allocs.load();
+    unsigned long before = lp_bench::heapAllocations();
     for (auto _ : state) {
         tolk::TSC_Bodies::EvtCallState_t ev;
         benchmark::DoNotOptimize(ev.readMsg(&m, 0));
         benchmark::DoNotOptimize(ev.CallState);
     }
-    report(state, g_allocs.load() - before, 0);
+    report(state, lp_bench::heapAllocations() - before, 0);
 }
 BENCHMARK(BM_Decode_EvtCallState);
 

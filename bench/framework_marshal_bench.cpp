@@ -2,23 +2,9 @@
 
 #include <benchmark/benchmark.h>
 
-#include <atomic>
-#include <cstdlib>
-
+#include "AllocCounter.h"
 #include "framework/Marshal.h"
 #include "framework/Msg.h"
-
-namespace {
-std::atomic<unsigned long> allocations{0};
-}
-
-// Heap allocations are counted at malloc, which glibc lets a program interpose; operator new is
-// left alone since another benchmark of this program replaces it.
-extern "C" void* __libc_malloc(std::size_t n);
-extern "C" void* malloc(std::size_t n) {
-    allocations.fetch_add(1, std::memory_order_relaxed);
-    return __libc_malloc(n);
-}
 
 namespace {
 
@@ -66,12 +52,13 @@ void BM_Marshal_Write20ScalarsAnd300Bytes(benchmark::State& state) {
     Scalars20 body;
     body.bytes.realloc(300);
     tolk::Msg m(body.GetByteSize());
-    unsigned long before = allocations.load();
+    unsigned long before = lp_bench::heapAllocations();
     for (auto _ : state) {
         benchmark::DoNotOptimize(m.write(&body, 0));
     }
-    state.counters["allocs_per_op"] = benchmark::Counter(
-        static_cast<double>(allocations.load() - before), benchmark::Counter::kAvgIterations);
+    state.counters["allocs_per_op"] =
+        benchmark::Counter(static_cast<double>(lp_bench::heapAllocations() - before),
+                           benchmark::Counter::kAvgIterations);
 }
 BENCHMARK(BM_Marshal_Write20ScalarsAnd300Bytes);
 
@@ -81,12 +68,13 @@ void BM_Marshal_Read20ScalarsAnd300Bytes(benchmark::State& state) {
     tolk::Msg m(body.GetByteSize());
     m.write(&body, 0);
     Scalars20 r;
-    unsigned long before = allocations.load();
+    unsigned long before = lp_bench::heapAllocations();
     for (auto _ : state) {
         benchmark::DoNotOptimize(m.read(&r, 0));
     }
-    state.counters["allocs_per_op"] = benchmark::Counter(
-        static_cast<double>(allocations.load() - before), benchmark::Counter::kAvgIterations);
+    state.counters["allocs_per_op"] =
+        benchmark::Counter(static_cast<double>(lp_bench::heapAllocations() - before),
+                           benchmark::Counter::kAvgIterations);
 }
 BENCHMARK(BM_Marshal_Read20ScalarsAnd300Bytes);
 
@@ -94,13 +82,14 @@ BENCHMARK(BM_Marshal_Read20ScalarsAnd300Bytes);
 void BM_Marshal_NewMsgWriteFree(benchmark::State& state) {
     Scalars20 body;
     body.bytes.realloc(300);
-    unsigned long before = allocations.load();
+    unsigned long before = lp_bench::heapAllocations();
     for (auto _ : state) {
         tolk::Msg m(body.GetByteSize());
         benchmark::DoNotOptimize(m.write(&body, 0));
     }
-    state.counters["allocs_per_op"] = benchmark::Counter(
-        static_cast<double>(allocations.load() - before), benchmark::Counter::kAvgIterations);
+    state.counters["allocs_per_op"] =
+        benchmark::Counter(static_cast<double>(lp_bench::heapAllocations() - before),
+                           benchmark::Counter::kAvgIterations);
 }
 BENCHMARK(BM_Marshal_NewMsgWriteFree);
 
