@@ -8,6 +8,7 @@
 #include "console/DisplayGuard.h"
 #include "console/PhoneView.h"
 #include "console/View.h"
+#include "framework/Exception.h"
 
 namespace lineprobe {
 
@@ -113,6 +114,9 @@ PhoneView* PhoneViewMgr::CreatePhoneView(unsigned int board, unsigned int line, 
     } catch (const std::exception& e) {
         std::cout << "PhoneViewMgr::CreatePhoneView - got an exception" << std::endl;
         std::cerr << "unable to create phone view " << key << ": " << e.what() << std::endl;
+    } catch (const tolk::Exception& e) {
+        std::cout << "PhoneViewMgr::CreatePhoneView - got an exception" << std::endl;
+        std::cerr << "unable to create phone view " << key << ": " << e << std::endl;
     } catch (...) {
         std::cout << "PhoneViewMgr::CreatePhoneView - got an exception" << std::endl;
         std::cerr << "unable to create phone view " << key << std::endl;

@@ -8,6 +8,7 @@
 #include "console/DisplayGuard.h"
 #include "console/TrunkView.h"
 #include "console/View.h"
+#include "framework/Exception.h"
 
 namespace lineprobe {
 
@@ -100,6 +101,9 @@ TrunkView* TrunkViewMgr::CreateTrunkView(unsigned int board, unsigned int line, 
     } catch (const std::exception& e) {
         std::cout << "TrunkViewMgr::CreateTrunkView - got an exception" << std::endl;
         std::cerr << "unable to create trunk view " << key << ": " << e.what() << std::endl;
+    } catch (const tolk::Exception& e) {
+        std::cout << "TrunkViewMgr::CreateTrunkView - got an exception" << std::endl;
+        std::cerr << "unable to create trunk view " << key << ": " << e << std::endl;
     } catch (...) {
         std::cout << "TrunkViewMgr::CreateTrunkView - got an exception" << std::endl;
         std::cerr << "unable to create trunk view " << key << std::endl;
