@@ -1,0 +1,132 @@
+// The views against vx7sim, whose control channel plays the network: alarms, error bursts,
+// line states, incoming calls, a silent board and a dropped relay connection.
+#include <gtest/gtest.h>
+
+#include <string>
+
+#include "SimServer.h"
+#include "TerminalSession.h"
+#include "ViewScreen.h"
+
+namespace lineprobe::testing {
+namespace {
+
+const std::string FARM = LINEPROBE_FARMS_DIR "/default.toml";
+
+TerminalOptions ThroughRelay(const SimServer& sim) {
+    TerminalOptions options;
+    options.env.emplace_back("REMOTE_TKHOST", sim.Address());
+    // The device map reads the farm in lineprobe's own process.
+    options.env.emplace_back("VX7_FARM", FARM);
+    return options;
+}
+
+class RelayTest : public ::testing::Test {
+  protected:
+    RelayTest() : sim(FARM), session(ThroughRelay(sim)), commands(session) {}
+    void SetUp() override {
+        ASSERT_TRUE(sim.Running());
+        ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
+    }
+
+    std::string Cell(int row, int col, std::size_t length) {
+        return session.TextAt(TRUNK_ROW0 + row, WINDOW_COL0 + col, length);
+    }
+    bool WaitTrunk(int row, int col, const std::string& text) {
+        return session.WaitForTextAt(TRUNK_ROW0 + row, WINDOW_COL0 + col, text);
+    }
+    void Control(const std::string& line) {
+        const std::string answer = sim.Control(line);
+        ASSERT_EQ(answer.rfind("ok", 0), 0u) << line << ": " << answer;
+    }
+
+    SimServer sim;
+    TerminalSession session;
+    CommandRunner commands;
+};
+
+struct AlarmCase {
+    const char* name;
+    int col;
+    const char* on;
+    const char* off;
+};
+
+TEST_F(RelayTest, InjectedAlarmsMarkTheirColumns) {
+    ASSERT_TRUE(commands.Run("trunk 1 1"));
+    ASSERT_TRUE(WaitTrunk(1, 8, "InService")) << session.Dump();
+    // "Sig" and "DChan" show that the signal or D channel is good: an alarm blanks them.
+    const AlarmCase cases[] = {{"red", 54, "X", " "},      {"yellow", 60, "X", " "},
+                               {"ais", 72, "X", " "},      {"los", 42, " ", "X"},
+                               {"loopback", 48, "X", " "}, {"raicrc", 66, "X", " "},
+                               {"dchan", 78, " ", "X"}};
+    for (const AlarmCase& c : cases) {
+        Control(std::string("alarm 1 1 ") + c.name + " on");
+        EXPECT_TRUE(WaitTrunk(1, c.col, c.on)) << c.name << "\n" << session.Dump();
+        Control(std::string("alarm 1 1 ") + c.name + " off");
+        EXPECT_TRUE(WaitTrunk(1, c.col, c.off)) << c.name << "\n" << session.Dump();
+    }
+    EXPECT_TRUE(session.StillRunning());
+}
+
+TEST_F(RelayTest, CountersAndLineStatesFollowTheLine) {
+    ASSERT_TRUE(commands.Run("trunk 1 2"));
+    ASSERT_TRUE(WaitTrunk(1, 8, "InService")) << session.Dump();
+    Control("bpv 1 2 12");
+    Control("ferr 1 2 3");
+    EXPECT_TRUE(WaitTrunk(1, 85, "12")) << session.Dump();
+    EXPECT_TRUE(WaitTrunk(1, 92, "3 ")) << session.Dump();
+    Control("line 1 2 out 3");
+    EXPECT_TRUE(WaitTrunk(1, 8, "Out of Service    Maintenance")) << session.Dump();
+    Control("line 1 2 in 0");
+    EXPECT_TRUE(WaitTrunk(1, 8, "InService         Null          ")) << session.Dump();
+
+    // A new view of the line counts from 0 again, and the deleted one draws no more.
+    ASSERT_TRUE(commands.Run("deltrunk 1 2"));
+    Control("alarm 1 2 red on");
+    ASSERT_TRUE(commands.Run("trunk 1 1"));
+    ASSERT_TRUE(WaitTrunk(1, 0, " 1.1 ")) << session.Dump();
+    EXPECT_EQ(Cell(1, 85, 8), "0      0");
+    EXPECT_EQ(Cell(1, 54, 1), " ");
+}
+
+TEST_F(RelayTest, IncomingCallRingsTheOpenPhone) {
+    ASSERT_TRUE(commands.Run("phone 1 1 2"));
+    Control("call 1 1 2 5550000");
+    ASSERT_TRUE(session.WaitForTextAt(PHONE_ROW0 + 1, WINDOW_COL0 + 47, "Offered"))
+        << session.Dump();
+    ASSERT_TRUE(commands.Run("accept 1 1 2"));
+    EXPECT_EQ(commands.Result(), "");
+    Control("hangup 1 1 2");
+    ASSERT_TRUE(session.WaitForTextAt(PHONE_ROW0 + 1, WINDOW_COL0 + 47, "Disconnected"))
+        << session.Dump();
+}
+
+TEST_F(RelayTest, SilentBoardAndDroppedRelayLeaveThePromptWorking) {
+    ASSERT_TRUE(commands.Run("phone 1 1 1"));
+    ASSERT_TRUE(commands.Run("trunk 1 1"));
+    ASSERT_TRUE(WaitTrunk(1, 8, "InService")) << session.Dump();
+    // No answer to MakeCall: the request runs out, the success text is still shown.
+    Control("silence 1214");
+    ASSERT_TRUE(commands.Run("makecall 1 1 1"));
+    EXPECT_EQ(commands.Result(), "makecall started successfully");
+    // A refusal of the loopback is reported in the logs only.
+    Control("refuse 160e");
+    ASSERT_TRUE(commands.Run("linelbk 1 1"));
+    EXPECT_EQ(commands.Result(), "enabling line loopback completed");
+
+    Control("drop");
+    ASSERT_TRUE(commands.Run("trunk_oos 1 1"));
+    ASSERT_TRUE(commands.Run("bogus"));
+    EXPECT_EQ(commands.Result(), "Unrecgnized Command");
+    // The rows keep what they last knew.
+    EXPECT_EQ(Cell(1, 8, 9), "InService");
+    EXPECT_TRUE(session.StillRunning());
+    const auto log = session.ReadLog();
+    const auto errors = session.ReadErrLog();
+    ASSERT_TRUE(log && errors);
+    EXPECT_NE((*log + *errors).find("Timeout"), std::string::npos);
+}
+
+}  // namespace
+}  // namespace lineprobe::testing
