@@ -23,7 +23,6 @@ struct RelayServer::Conn {
     int fd = -1;
     std::uint64_t serial = 0;
     bool opened = false;
-    bool closing = false;  // flush what is queued, then close
     bool dead = false;
     bool wantWrite = false;
     TKCompDesc addr{};
@@ -284,7 +283,7 @@ bool RelayServer::processFrames(Conn& c) {
         if (!handleFrame(c, h.type, body, h.size, body + h.size, h.ex_size)) {
             return false;
         }
-        if (c.dead || c.closing) {
+        if (c.dead) {
             return false;
         }
     }
@@ -354,8 +353,12 @@ bool RelayServer::handleFrame(Conn& c, std::uint32_t type, const unsigned char* 
             return true;
         }
         case TKS_FRAME_CLOSE:
+            // The client closes the socket once it has the acknowledgement; closing it first
+            // from here would look to the client's reader like a broken connection.
             sendFrame(c, TKS_FRAME_CLOSE_ACK, nullptr, 0, nullptr, 0);
-            c.closing = true;
+            if (c.opened) {
+                emu_.forget(c.addr);
+            }
             return true;
         default:
             log_ << "vx7sim: connection " << c.serial << ": unknown frame type " << type
@@ -481,10 +484,6 @@ void RelayServer::flush(Conn& c) {
     if (c.pending() == 0) {
         c.out.clear();
         c.outPos = 0;
-        if (c.closing) {
-            close(c, nullptr);
-            return;
-        }
     } else if (c.outPos > (1u << 20)) {
         c.out.erase(c.out.begin(), c.out.begin() + static_cast<std::ptrdiff_t>(c.outPos));
         c.outPos = 0;
@@ -507,7 +506,7 @@ void RelayServer::flush(Conn& c) {
 
 void RelayServer::flushAll() {
     for (auto& [fd, c] : conns_) {
-        if (!c->dead && (c->pending() > 0 || c->closing)) {
+        if (!c->dead && c->pending() > 0) {
             flush(*c);
         }
     }
