@@ -2,7 +2,9 @@
 // line states, incoming calls, a silent board and a dropped relay connection.
 #include <gtest/gtest.h>
 
+#include <chrono>
 #include <string>
+#include <thread>
 
 #include "SimServer.h"
 #include "TerminalSession.h"
@@ -126,6 +128,36 @@ TEST_F(RelayTest, SilentBoardAndDroppedRelayLeaveThePromptWorking) {
     const auto errors = session.ReadErrLog();
     ASSERT_TRUE(log && errors);
     EXPECT_NE((*log + *errors).find("Timeout"), std::string::npos);
+}
+
+TEST(RelayHelp, EventsDuringThePagerDrawOnlyWhenTheScreenComesBack) {
+    SimServer sim(FARM);
+    ASSERT_TRUE(sim.Running());
+    TerminalOptions options = ThroughRelay(sim);
+    options.env.emplace_back("CORVO_ORVANE_DIR", "inst/");
+    options.env.emplace_back("LESSHISTFILE", "-");
+    options.File("inst/bin/lineprobe_help.txt", "HELP PAGE\n");
+    TerminalSession session(options);
+    ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
+    CommandRunner commands(session);
+    ASSERT_TRUE(commands.Run("trunk 1 1"));
+    ASSERT_TRUE(session.WaitForTextAt(TRUNK_ROW0 + 1, WINDOW_COL0 + 8, "InService"))
+        << session.Dump();
+
+    session.TypeLine("help");
+    ASSERT_TRUE(session.WaitForText("HELP PAGE")) << session.Dump();
+    ASSERT_EQ(sim.Control("alarm 1 1 red on").rfind("ok", 0), 0u);
+    ASSERT_EQ(sim.Control("bpv 1 1 5").rfind("ok", 0), 0u);
+    // The events arrive while the pager has the terminal: nothing of the row shows.
+    std::this_thread::sleep_for(std::chrono::milliseconds(500));
+    EXPECT_FALSE(session.WaitForText("InService", std::chrono::milliseconds(0))) << session.Dump();
+    EXPECT_TRUE(session.WaitForText("HELP PAGE", std::chrono::milliseconds(0))) << session.Dump();
+
+    session.SendKeys({"q"});
+    EXPECT_TRUE(session.WaitForTextAt(TRUNK_ROW0 + 1, WINDOW_COL0 + 54, "X")) << session.Dump();
+    EXPECT_TRUE(session.WaitForTextAt(TRUNK_ROW0 + 1, WINDOW_COL0 + 85, "5 ")) << session.Dump();
+    EXPECT_TRUE(session.WaitForTextAt(TRUNK_ROW0 + 1, WINDOW_COL0 + 8, "InService"));
+    EXPECT_TRUE(session.StillRunning());
 }
 
 }  // namespace
