@@ -1,0 +1,214 @@
+#pragma once
+
+// Every block written to a board address lands here: it is recorded as sent, and the test's
+// rule decides what the board answers (a reply of some type, or nothing). Replies come from a
+// thread of their own, from the address the request went to, with the request's id.
+
+#include <chrono>
+#include <condition_variable>
+#include <cstdint>
+#include <cstring>
+#include <deque>
+#include <functional>
+#include <mutex>
+#include <thread>
+#include <vector>
+
+#include "framework/CompDesc_t.h"
+#include "platform/tkhost/tkhost.h"
+#include "platform/tkhost/tkhost_switch.h"
+
+struct Sent {
+    unsigned int type = 0;
+    unsigned int trans = 0;
+    tolk::CompDesc_t src;
+    tolk::CompDesc_t tgt;
+    std::vector<std::uint8_t> body;
+};
+
+struct Answer {
+    unsigned int type;
+    std::vector<std::uint8_t> body;
+    bool fromElsewhere = false;  // sent from an address other than the request's target
+};
+
+// What the services and components of a board answer: the shared completions of the
+// services, nothing to a one-way command, else the command's number + 1.
+inline std::vector<Answer> boardAnswer(const Sent& s, std::vector<std::uint8_t> body = {}) {
+    switch (s.type) {
+        case 0x800059:
+        case 0x80005A:
+        case 0x80001B:
+        case 0x800023:
+        case 0x800030:
+        case 0x800036:
+        case 0x800054:
+        case 0x800055:
+        case 0x800056:
+            return {{0x800000, body}};
+        case 0x80003D:
+        case 0x80003E:
+        case 0x80001E:
+            return {{0x800007, body}};
+        case 0x800053:
+        case 0x80001D:
+        case 0x800020:
+            return {{0x80002C, body}};
+        case 0x800032:
+            return {{0x800033, body}};
+        case 0x80003A:
+            return {{0x800006, body}};
+        case 0x800027:
+            return {{0x800028, body}};
+        case 0x00:
+        case 0x01:
+        case 0x06:
+        case 0x1200:
+        case 0x1201:
+        case 0x1202:
+        case 0x1203:
+        case 0x1204:
+        case 0x1207:
+        case 0x120A:
+        case 0x1211:
+        case 0x121A:
+        case 0x121B:
+        case 0x121C:
+        case 0x121D:
+        case 0x121E:
+        case 0x122D:
+        case 0x1612:
+        case 0x1613:
+        case 0x140D:
+        case 0x800041:
+        case 0x80001F:
+        case 0x800025:
+        case 0x800024:
+        case 0x800052:
+            return {};
+        default:
+            return {{s.type + 1, body}};
+    }
+}
+
+class FakeBoard {
+  public:
+    using Rule = std::function<std::vector<Answer>(const Sent&)>;
+
+    FakeBoard() : FakeBoard([](const Sent& s) { return boardAnswer(s); }) {}
+    explicit FakeBoard(Rule r) : rule(std::move(r)) {
+        worker = std::thread([this] { run(); });
+        tkSwitchAttachBoards(&FakeBoard::endpoint, this);
+    }
+    ~FakeBoard() {
+        tkSwitchDetachBoards();
+        {
+            std::lock_guard<std::mutex> lk(m);
+            stopping = true;
+        }
+        cv.notify_all();
+        worker.join();
+    }
+    FakeBoard(const FakeBoard&) = delete;
+    FakeBoard& operator=(const FakeBoard&) = delete;
+
+    std::vector<Sent> sent() const {
+        std::lock_guard<std::mutex> lk(m);
+        return log;
+    }
+    // Blocks until n blocks were sent or a second passed.
+    bool waitFor(std::size_t n) const {
+        std::unique_lock<std::mutex> lk(m);
+        return cv.wait_for(lk, std::chrono::seconds(1), [&] { return log.size() >= n; });
+    }
+    std::size_t count() const {
+        std::lock_guard<std::mutex> lk(m);
+        return log.size();
+    }
+    void clear() {
+        std::lock_guard<std::mutex> lk(m);
+        log.clear();
+    }
+
+  private:
+    static void endpoint(void* ctx, TKMsg32Bit* msg) {
+        auto* self = static_cast<FakeBoard*>(ctx);
+        Sent s;
+        s.type = msg->type;
+        s.trans = msg->transTag >> 8;
+        TKCompDesc d{};
+        tkMsgFieldGet(msg, TK_FIELD_SRC, &d);
+        s.src = tolk::CompDesc_t(d);
+        tkMsgFieldGet(msg, TK_FIELD_TGT, &d);
+        s.tgt = tolk::CompDesc_t(d);
+        const auto* b = reinterpret_cast<const std::uint8_t*>(tkMsgBody(msg));
+        s.body.assign(b, b + msg->size);
+        tkMsgFree(msg);
+        {
+            std::lock_guard<std::mutex> lk(self->m);
+            self->log.push_back(s);
+            self->pending.push_back(s);
+        }
+        self->cv.notify_all();
+    }
+
+    void run() {
+        std::unique_lock<std::mutex> lk(m);
+        for (;;) {
+            cv.wait(lk, [this] { return stopping || !pending.empty(); });
+            if (pending.empty()) {
+                return;
+            }
+            Sent s = pending.front();
+            pending.pop_front();
+            lk.unlock();
+            for (const Answer& a : rule(s)) {
+                reply(s, a);
+            }
+            lk.lock();
+        }
+    }
+
+    static void reply(const Sent& s, const Answer& a) {
+        TKMsg32Bit* out = nullptr;
+        tkMsgAllocate(static_cast<unsigned int>(a.body.size()), &out);
+        out->type = a.type;
+        out->transTag = s.trans << 8;
+        TKCompDesc from = s.tgt.getTKCompDesc();
+        if (a.fromElsewhere) {
+            from.instance = static_cast<std::uint16_t>(from.instance + 0x100);
+        }
+        TKCompDesc to = s.src.getTKCompDesc();
+        tkMsgFieldPut(out, TK_FIELD_SRC, &from);
+        tkMsgFieldPut(out, TK_FIELD_TGT, &to);
+        if (!a.body.empty()) {
+            std::memcpy(tkMsgBody(out), a.body.data(), a.body.size());
+        }
+        tkSwitchDeliver(out);
+    }
+
+    Rule rule;
+    mutable std::mutex m;
+    mutable std::condition_variable cv;
+    std::deque<Sent> pending;
+    std::vector<Sent> log;
+    bool stopping = false;
+    std::thread worker;
+};
+
+// Big-endian helpers for golden bodies.
+inline void put32(std::vector<std::uint8_t>& b, unsigned int v) {
+    b.push_back(static_cast<std::uint8_t>(v >> 24));
+    b.push_back(static_cast<std::uint8_t>(v >> 16));
+    b.push_back(static_cast<std::uint8_t>(v >> 8));
+    b.push_back(static_cast<std::uint8_t>(v));
+}
+
+inline void putDesc(std::vector<std::uint8_t>& b, const tolk::CompDesc_t& d) {
+    b.push_back(static_cast<std::uint8_t>(d.instance >> 8));
+    b.push_back(static_cast<std::uint8_t>(d.instance));
+    b.push_back(d.board);
+    b.push_back(d.processor);
+    b.push_back(d.component);
+    b.push_back(d.node);
+}
