@@ -170,8 +170,9 @@ void TKSThread::start(void* arg) {
     result = nullptr;
     status = RUNNING;
 
-    pthread_attr_t attr;
-    bool ok = pthread_attr_init(&attr) == 0;
+    pthread_attr_t attr{};
+    const bool haveAttr = pthread_attr_init(&attr) == 0;
+    bool ok = haveAttr;
     if (ok) {
         ok = pthread_attr_setdetachstate(&attr, PTHREAD_CREATE_DETACHED) == 0;
         applyStackSize(attr, stackSize, ok);
@@ -179,7 +180,9 @@ void TKSThread::start(void* arg) {
     if (ok) {
         ok = pthread_create(&threadId, &attr, &TKSThread::frame, this) == 0;
     }
-    pthread_attr_destroy(&attr);
+    if (haveAttr) {
+        pthread_attr_destroy(&attr);
+    }
     if (!ok) {
         status = NOT_RUNNING;
         runLock.unlock();
