@@ -256,6 +256,18 @@ void* TKSMsgQueue::readNroute(void*, void*) {
             }
             waitForStop();
             break;
+        } catch (...) {
+            // No other failure is expected from a transport; if one comes the reader must still
+            // be there for the shutdown, or the destructor would wait for it for ever.
+            std::cerr << "ERROR: TKSMsgQueue: the transport failed while reading; this queue "
+                         "receives nothing more and its requests will time out"
+                      << std::endl;
+            {
+                std::lock_guard<std::mutex> lk(waitLock);
+                failed = true;
+            }
+            waitForStop();
+            break;
         }
         if (stopping()) {
             tkMsgFree(block);

@@ -121,8 +121,19 @@ void TKSRemoteMsgQueue::closeExchange() {
 }
 
 void TKSRemoteMsgQueue::sendLastMessage() {
-    closing = true;
+    {
+        std::lock_guard<std::mutex> lk(closingLock);
+        closing = true;
+    }
+    closingCond.notify_all();
     socket->interrupt();
+}
+
+int TKSRemoteMsgQueue::closedByRelay() {
+    closeSignal.unlock();
+    std::unique_lock<std::mutex> lk(closingLock);
+    closingCond.wait(lk, [this] { return closing.load(); });
+    return 2;
 }
 
 int TKSRemoteMsgQueue::msgWrite(TKMsg32Bit* msg) {
@@ -156,9 +167,14 @@ int TKSRemoteMsgQueue::msgRead(TKMsg32Bit** out) {
         if (closing.load()) {
             return 2;
         }
+        if (closeSent.load()) {
+            return closedByRelay();
+        }
         std::cerr << "Error communicating with remote message queue on " << hostName << std::endl;
         if (--retries <= 0) {
             readerGone = true;
+            // A close that is waiting for its acknowledgement gets none from a dead reader.
+            closeSignal.unlock();
             throw TKSRemoteService_ComFailure(hostName, port);
         }
         return 2;

@@ -3,6 +3,7 @@
 #define LINEPROBE_TRANSPORT_TKSREMOTEMSGQUEUE_H
 
 #include <atomic>
+#include <condition_variable>
 #include <mutex>
 #include <vector>
 
@@ -41,6 +42,9 @@ class TKSRemoteMsgQueue : public TKSAbstractMsgQueue {
 
   private:
     bool sendClose();
+    // Once the close has been sent, the connection ending is the relay's answer, not a fault:
+    // let the close wait go and park the reader until shutdown wakes it.
+    int closedByRelay();
 
     char* hostName = nullptr;
     int retries = 10;
@@ -51,6 +55,8 @@ class TKSRemoteMsgQueue : public TKSAbstractMsgQueue {
     std::atomic<bool> closeSent{false};
     std::atomic<bool> closing{false};
     std::atomic<bool> readerGone{false};
+    std::mutex closingLock;
+    std::condition_variable closingCond;
     std::vector<unsigned char> outFrame;
 };
 

@@ -314,6 +314,61 @@ TEST(RemoteTransport, OversizeBlockIsNotSentAndStaysWithTheCaller) {
     relay.join();
 }
 
+// Once the close is sent, the relay may end the connection after its acknowledgement or in
+// place of it. Either is the end of the exchange: no error line, and no 5 s wait for an
+// acknowledgement that cannot come any more.
+struct CloseCase {
+    const char* name;
+    bool acknowledge;
+};
+
+class RemoteClose : public ::testing::TestWithParam<CloseCase> {};
+
+TEST_P(RemoteClose, RelayEndingTheConnectionIsNoErrorAndEndsTheWait) {
+    const bool ack = GetParam().acknowledge;
+    ScriptedRelay relay([ack](sock& conn) {
+        ASSERT_TRUE(ScriptedRelay::acceptOpen(conn));
+        msg_t m;
+        ASSERT_EQ(0, conn.get_msg(m));
+        EXPECT_EQ(TKS_FRAME_CLOSE, m.type);
+        free_msg(m);
+        if (ack) {
+            ScriptedRelay::sendEmpty(conn, TKS_FRAME_CLOSE_ACK);
+        }
+        // The connection ends as the script returns.
+    });
+    testing::internal::CaptureStderr();
+    std::vector<int> results;
+    {
+        TKSRemoteMsgQueue t(TKCompDesc{}, 512, 5, relay.address().c_str());
+        std::thread reader([&] {
+            for (int i = 0; i < (ack ? 2 : 1); ++i) {
+                TKMsg32Bit* b = nullptr;
+                results.push_back(t.msgRead(&b));
+                EXPECT_EQ(nullptr, b);
+            }
+        });
+        auto t0 = Clock::now();
+        t.closeExchange();
+        EXPECT_LT(Clock::now() - t0, 4s);
+        relay.join();
+        // Time for a reader that took the ended connection for a fault to say so.
+        std::this_thread::sleep_for(20ms);
+        t.sendLastMessage();
+        reader.join();
+    }
+    std::string err = testing::internal::GetCapturedStderr();
+    EXPECT_EQ(std::string::npos, err.find("Error communicating")) << err;
+    EXPECT_EQ(std::vector<int>(ack ? 2 : 1, 2), results);
+}
+
+INSTANTIATE_TEST_SUITE_P(Relay, RemoteClose,
+                         ::testing::Values(CloseCase{"AcknowledgesThenCloses", true},
+                                           CloseCase{"ClosesWithoutAcknowledging", false}),
+                         [](const ::testing::TestParamInfo<CloseCase>& i) {
+                             return std::string(i.param.name);
+                         });
+
 TEST(RemoteTransport, ComFailureCarriesHostAndPort) {
     TKSRemoteService_ComFailure f(std::string(120, 'r').c_str(), 6554);
     EXPECT_EQ(std::string(99, 'r'), f.getHostName());
