@@ -18,6 +18,9 @@ void Addressable::Timeout::toStream(std::ostream* os) const {
         << " Trans: " << trans << " Timeout: " << timeoutMs << "ms";
 }
 
+Addressable::UnexpectedMsg::UnexpectedMsg(Addressable* a, unsigned int cmd, Msg* reply)
+    : MsgQueue::ErrorMsg(a->getMsgQueue().Get(), reply), addressable(a), cmdType(cmd) {}
+
 Addressable::UnexpectedMsg::UnexpectedMsg(Addressable* a, unsigned int cmd,
                                           const MsgQueue::ErrorMsg& cause)
     : MsgQueue::ErrorMsg(cause), addressable(a), cmdType(cmd) {}

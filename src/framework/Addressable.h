@@ -33,6 +33,9 @@ class Addressable : public virtualObject {
 
     class UnexpectedMsg : public MsgQueue::ErrorMsg {
       public:
+        // Takes the reply over; the last copy of the exception frees it.
+        UnexpectedMsg(Addressable* a, unsigned int cmdType, Msg* reply);
+        // Shares the reply that the caught ErrorMsg holds.
         UnexpectedMsg(Addressable* a, unsigned int cmdType, const MsgQueue::ErrorMsg& cause);
         void toStream(std::ostream* os) const override;
 

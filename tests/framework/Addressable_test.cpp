@@ -97,6 +97,33 @@ TEST(AddressableRequest, ReplyWithoutABodyClassPrintsAsBytes) {
     }
 }
 
+TEST(AddressableRequest, UnexpectedMsgMadeFromAReplyOwnsItAcrossCopies) {
+    isa::RefPtr<MsgQueue> q = newQueue();
+    Proxy p(tolk::CompDesc_t(7, 1, 1, 18, 0), q, 5000, 1000);
+    auto* reply = new tolk::Msg(2u);
+    reply->setMsgType(0x800001);
+    tkMsgBody(reply->getMsgRef())[1] = 9;
+    std::string printed;
+    try {
+        Addressable::UnexpectedMsg original(&p, 0x1214, reply);
+        Addressable::UnexpectedMsg copy(original);
+        throw copy;
+    } catch (const MsgQueue::ErrorMsg& e) {
+        // Both earlier copies are gone; the reply must still be there.
+        EXPECT_EQ(e.msg, reply);
+        EXPECT_EQ(e.queue, q.Get());
+        printed = text(e);
+    }
+    EXPECT_EQ(printed.rfind("Addressable::UnexpectedMsg ObjSource: {TgtDesc: {Node 0 Board 0x1 "
+                            "Processor 0x1 Component 0x12 Instance 0x7} HostDesc: ",
+                            0),
+              0u)
+        << printed;
+    EXPECT_NE(printed.find(" CmdMsgType 0x1214 RespMsg: {MsgType: 0x800001 "), std::string::npos)
+        << printed;
+    EXPECT_NE(printed.find(" Body: {ByteData {0 0x9 }}}"), std::string::npos) << printed;
+}
+
 TEST(AddressableRequest, SilenceRaisesTimeoutWithTypesAndTime) {
     Responder r([](TKMsg32Bit*) { return std::vector<Outgoing>{}; });
     isa::RefPtr<MsgQueue> q = newQueue();

@@ -2,9 +2,11 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <chrono>
 #include <mutex>
 #include <sstream>
+#include <stdexcept>
 #include <thread>
 
 #include "Responder.h"
@@ -40,6 +42,12 @@ class CountedEvt : public MsgBody {
 class Component : public Addressable {
   public:
     using Addressable::Addressable;
+    MsgBody* MsgBodyLookup(unsigned int type) override {
+        if (type == 0x5E) {
+            throw std::runtime_error("lookup failed");
+        }
+        return Addressable::MsgBodyLookup(type);
+    }
     MsgBody* EvtBodyLookup(unsigned int group) override {
         if (group == 0x1230) {
             return new CountedEvt();
@@ -105,6 +113,11 @@ void throwing(Addressable*, Msg* m) {
     throw tolk::Exception("callback failed");
 }
 
+void throwingOther(Addressable*, Msg* m) {
+    delete m;
+    throw std::runtime_error("not a framework exception");
+}
+
 class Holder : public EvtCallback::Callback {
   public:
     void onMsg(Addressable*, Msg* m) {
@@ -127,11 +140,14 @@ class Dispatcher : public ::testing::Test {
     }
     static std::vector<unsigned char> evt(unsigned int group,
                                           std::vector<unsigned char> rest = {}) {
-        std::vector<unsigned char> b{
-            static_cast<unsigned char>(group >> 24), static_cast<unsigned char>(group >> 16),
-            static_cast<unsigned char>(group >> 8), static_cast<unsigned char>(group)};
-        b.insert(b.end(), rest.begin(), rest.end());
-        return b;
+        // Group in front of the rest, built in place (GCC 12 misjudges an insert at the end
+        // of a four-byte vector as out of bounds).
+        rest.resize(rest.size() + 4);
+        std::rotate(rest.rbegin(), rest.rbegin() + 4, rest.rend());
+        for (int i = 0; i < 4; ++i) {
+            rest[i] = static_cast<unsigned char>(group >> (24 - 8 * i));
+        }
+        return rest;
     }
 
     Responder board;
@@ -318,5 +334,72 @@ TEST_F(Dispatcher, EvtWaitFillsTheBody) {
     EXPECT_EQ(body.EvtGroup, 0x1299u);
     EXPECT_EQ(body.Data.length(), 2u);
 }
+
+// Whatever fails inside a dispatch is reported once, under the line that names where it came
+// from, and the dispatcher goes on: later entries and later messages still arrive.
+struct DispatchFailure {
+    const char* name;
+    unsigned int type;
+    void (*registerFailing)(Addressable&);
+    std::string report;
+    std::vector<std::string> reached;
+};
+
+class DispatchFailures : public Dispatcher,
+                         public ::testing::WithParamInterface<DispatchFailure> {};
+
+TEST_P(DispatchFailures, AreReportedOnceAndLaterMessagesStillArrive) {
+    const DispatchFailure& c = GetParam();
+    c.registerFailing(comp);
+    comp.asyncRegisterMsgType(0x5B, msgB, 0);
+    testing::internal::CaptureStderr();
+    send(c.type);
+    send(0x5B);
+    waitSeen(c.reached.size());
+    std::string err = testing::internal::GetCapturedStderr();
+    EXPECT_EQ(err, c.report);
+    std::vector<std::string> who;
+    {
+        std::lock_guard<std::mutex> g(seenLock);
+        for (const Seen& s : seen) {
+            who.push_back(s.who);
+        }
+    }
+    EXPECT_EQ(who, c.reached);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Dispatcher, DispatchFailures,
+    ::testing::Values(
+        DispatchFailure{"FrameworkExceptionFromACallback",
+                        0x5A,
+                        [](Addressable& a) {
+                            a.asyncRegisterMsgType(0x5A, throwing, 0);
+                            a.asyncRegisterMsgType(0x5A, msgA, 0);
+                        },
+                        "EvtCallback_Class(138) TOLK Exception caught from callback handler "
+                        "thread\ncallback failed\n",
+                        {"A", "B"}},
+        DispatchFailure{"OtherExceptionFromACallback",
+                        0x5A,
+                        [](Addressable& a) {
+                            a.asyncRegisterMsgType(0x5A, throwingOther, 0);
+                            a.asyncRegisterMsgType(0x5A, msgA, 0);
+                        },
+                        "EvtCallback_Class(147) general Exception caught from callback handler "
+                        "thread\n",
+                        {"A", "B"}},
+        DispatchFailure{"OtherExceptionWhileMakingTheBody",
+                        0x5E,
+                        [](Addressable& a) { a.asyncRegisterMsgType(0x5E, bodyFn, 0); },
+                        "EvtCallback_Class(330) tolk internal error\n",
+                        {"B"}},
+        DispatchFailure{"OtherExceptionFromTheUnregisteredHandler",
+                        0x5F,
+                        [](Addressable& a) { a.asyncUnregisteredMsgType(throwingOther, 0); },
+                        "EvtCallback_Class(147) general Exception caught from callback handler "
+                        "thread\n",
+                        {"B"}}),
+    [](const ::testing::TestParamInfo<DispatchFailure>& i) { return std::string(i.param.name); });
 
 }  // namespace

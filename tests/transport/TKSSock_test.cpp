@@ -3,6 +3,8 @@
 #include <arpa/inet.h>
 #include <gtest/gtest.h>
 
+#include <cstdio>
+#include <iostream>
 #include <string>
 
 namespace {
@@ -28,6 +30,29 @@ TEST(TKSSockText, DntoipResolvesOrLeavesEmpty) {
     EXPECT_EQ(std::string("127.0.0.1"), dst);
     dntoip(dst, "no-such-host.invalid");
     EXPECT_EQ(std::string(""), dst);
+}
+
+TEST(TKSSockText, FrameDiagnosticsPrintTheirFixedLayout) {
+    msg_t m;
+    m.type = 1001;
+    m.tran = 7;
+    m.size = 56;
+    m.ex_size = 3;
+    testing::internal::CaptureStdout();
+    print_msg("incoming", m);
+    const char bytes[] = {0x01, static_cast<char>(0xAB), 0x00};
+    byte_print_msg(bytes, 3);
+    std::cout.flush();
+    std::fflush(stdout);
+    EXPECT_EQ(testing::internal::GetCapturedStdout(),
+              "----------------\n"
+              "** incoming **\n"
+              "   type = 1001\n"
+              "   tran = 7\n"
+              "   size = 56\n"
+              "ex_size = 3\n"
+              "----------------\n"
+              "0x1 0xab 0x0 \n");
 }
 
 struct HostCase {
