@@ -12,6 +12,7 @@ namespace {
 
 constexpr unsigned int TYPE_ERROR = 0;
 constexpr unsigned int TYPE_RESOURCE_ERROR = 0x800001;
+constexpr unsigned int PICKUP_RECHECK_MS = 50;
 
 const char* chooseHost(const char* remoteHost) {
     const char* host = remoteHost != nullptr ? remoteHost : std::getenv("REMOTE_TKHOST");
@@ -166,26 +167,36 @@ void TKSMsgQueue::deliverAsync(TKMsg32Bit* block) {
     TKSAsyncFn fn;
     TKSAsyncMsgReceiver* obj;
     TKSAsyncMethod method;
-    {
-        std::lock_guard<std::mutex> lk(callbackLock);
-        fn = asyncFn;
-        obj = asyncObj;
-        method = asyncMethod;
-    }
-    if (fn == nullptr && (obj == nullptr || method == nullptr)) {
-        // Nobody to take it yet: leave it for a direct reader, one block at a time.
-        pickupFree.lock();
+    for (;;) {
+        {
+            std::lock_guard<std::mutex> lk(callbackLock);
+            fn = asyncFn;
+            obj = asyncObj;
+            method = asyncMethod;
+        }
+        if (fn != nullptr || (obj != nullptr && method != nullptr)) {
+            break;
+        }
+        // Nobody to take it yet: leave it for a direct reader, one block at a time. The wait for
+        // a free slot looks for a callback now and then, so that one registered meanwhile gets
+        // the block and a full slot never leaves the queue deaf.
+        if (pickupFree.tryLock(PICKUP_RECHECK_MS, 10)) {
+            if (stopping()) {
+                pickupFree.unlock();
+                tkMsgFree(block);
+                return;
+            }
+            {
+                std::lock_guard<std::mutex> lk(waitLock);
+                pickupSlot = block;
+            }
+            pickupReady.unlock();
+            return;
+        }
         if (stopping()) {
-            pickupFree.unlock();
             tkMsgFree(block);
             return;
         }
-        {
-            std::lock_guard<std::mutex> lk(waitLock);
-            pickupSlot = block;
-        }
-        pickupReady.unlock();
-        return;
     }
     unsigned int type = block->type;
     TKSMsgRef ref(block);

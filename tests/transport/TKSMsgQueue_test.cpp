@@ -313,6 +313,23 @@ TEST(LocalQueueLifecycle, BlocksBeforeAnyCallbackWaitInThePickupSlot) {
     peer.send(q.getHostDesc(), peer.addr, 1, 0x34);
 }
 
+TEST(LocalQueueLifecycle, CallbackRegisteredWhileTheSlotIsFullGetsWhatComesNext) {
+    EnvGuard env;
+    unsetenv("REMOTE_TKHOST");
+    TKSMsgQueue q(TKCompDesc{}, 512, 5, nullptr);
+    Peer peer;
+    // The first fills the pickup slot; the reader holds the second, waiting for room.
+    peer.send(q.getHostDesc(), peer.addr, 1, 0x31);
+    peer.send(q.getHostDesc(), peer.addr, 1, 0x32);
+    std::this_thread::sleep_for(50ms);
+    Receiver receiver;
+    q.registerAsyncCallback(&receiver, static_cast<TKSAsyncMethod>(&Receiver::receive));
+    peer.send(q.getHostDesc(), peer.addr, 1, kMarker);
+    std::vector<unsigned int> got = receiver.untilMarker();
+    ASSERT_FALSE(got.empty()) << "the reader stayed parked on the full slot";
+    EXPECT_EQ(0x32u, got.back());
+}
+
 TEST(LocalQueueLifecycle, OutOfDescriptorsIsACreationError) {
     EnvGuard env;
     unsetenv("REMOTE_TKHOST");
