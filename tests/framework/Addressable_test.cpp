@@ -61,6 +61,24 @@ TEST(AddressableRequest, FillsTheCompletionBodyFromTheReply) {
     EXPECT_EQ(r.received(), 2u);
 }
 
+TEST(AddressableRequest, RepliesAreTakenAsTheyArriveNotAtTheNextPoll) {
+    Responder r([](TKMsg32Bit* in) {
+        return std::vector<Outgoing>{{in->type + 1, {0, 0, 0, 1, 0, 0, 0, 2}}};
+    });
+    isa::RefPtr<MsgQueue> q = newQueue();
+    Proxy p(r.address(), q, 5000, 1000);
+    CompAttr_t cmd(1, 1);
+    CompAttr_t ret;
+    constexpr int rounds = 300;
+    auto t0 = Clock::now();
+    for (int i = 0; i < rounds; ++i) {
+        p.request(0x08, &cmd, 0x09, &ret);
+    }
+    // Waiting for the next 10 ms step after each reply would take at least 3 s.
+    EXPECT_LT(Clock::now() - t0, std::chrono::milliseconds(rounds * 10 * 3 / 4));
+    EXPECT_EQ(r.received(), static_cast<unsigned int>(rounds));
+}
+
 TEST(AddressableRequest, RefusalBecomesUnexpectedMsgWithItsBodyAttached) {
     Responder r([](TKMsg32Bit*) { return std::vector<Outgoing>{{0, {0, 0, 0, 8, 0, 0, 0, 3}}}; });
     isa::RefPtr<MsgQueue> q = newQueue();

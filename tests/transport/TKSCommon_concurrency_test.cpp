@@ -27,6 +27,20 @@ TEST(TKSMutexSignal, AnotherThreadReleasesAWaiterAtOnce) {
     opener.join();
 }
 
+TEST(TKSMutexSignal, WaitEndsAtTheSignalNotAtTheNextStep) {
+    TKSMutex gate;
+    gate.lock();
+    std::thread opener([&] {
+        std::this_thread::sleep_for(20ms);
+        gate.unlock();
+    });
+    auto t0 = Clock::now();
+    // A wait that looked again only every step would sit here for 20 s.
+    EXPECT_TRUE(gate.tryLock(60000, 20000));
+    EXPECT_LT(Clock::now() - t0, 10s);
+    opener.join();
+}
+
 TEST(TKSMutexSignal, TimeOutKeepsItsLength) {
     TKSMutex gate;
     gate.lock();
