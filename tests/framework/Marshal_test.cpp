@@ -2,8 +2,10 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstring>
 #include <iomanip>
+#include <memory>
 #include <sstream>
 
 #include "FieldCallLog.h"
@@ -11,6 +13,7 @@
 #include "framework/CompDesc_t.h"
 #include "framework/Msg.h"
 #include "framework/MsgDefault_t.h"
+#include "framework/MsgEvtDetected_t.h"
 
 namespace {
 
@@ -329,5 +332,54 @@ TEST_F(MarshalTest, TrailingBodyListWithShortTailStopsAtTheEnd) {
     EXPECT_EQ(r.attrs[0]->value, 9);
     EXPECT_EQ(r.attrs[1]->key, 0x01010100u);
 }
+
+// Every prefix of a good body, read as a message of its own: what is there decodes as sent,
+// what is missing reads as zeros, and nothing is read outside the block (ASan).
+struct PrefixCase {
+    const char* name;
+    tolk::MsgBody* (*make)();
+    Bytes whole;
+    std::size_t fixedSize;  // bytes the body always writes back; 0: as many as it read
+};
+
+class BodyPrefixes : public ::testing::TestWithParam<PrefixCase> {};
+
+TEST_P(BodyPrefixes, ReadAsSentOrAsZeros) {
+    const PrefixCase& c = GetParam();
+    for (std::size_t k = 0; k < c.whole.size(); ++k) {
+        Msg in(static_cast<unsigned int>(k));
+        if (k != 0) {
+            std::memcpy(tkMsgBody(in.getMsgRef()), c.whole.data(), k);
+        }
+        std::unique_ptr<tolk::MsgBody> b(c.make());
+        in.read(b.get(), 0);
+        Msg out(b->GetByteSize());
+        out.write(b.get(), 0);
+        Bytes expected(c.whole.begin(), c.whole.begin() + static_cast<long>(k));
+        expected.resize(std::max(k, c.fixedSize), 0);
+        EXPECT_EQ(hex(body(out)), hex(expected)) << "prefix of " << k << " bytes";
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    FrameworkBodies, BodyPrefixes,
+    ::testing::Values(
+        PrefixCase{"CompDesc",
+                   [] { return static_cast<tolk::MsgBody*>(new tolk::CompDesc_t()); },
+                   {0x12, 0x34, 5, 6, 7, 8},
+                   6},
+        PrefixCase{"CompAttr",
+                   [] { return static_cast<tolk::MsgBody*>(new tolk::CompAttr_t()); },
+                   {0, 0, 0x10, 0x01, 0xFF, 0xFF, 0xFF, 0xFE},
+                   8},
+        PrefixCase{"EvtDetected",
+                   [] { return static_cast<tolk::MsgBody*>(new tolk::MsgEvtDetected_t()); },
+                   {0, 0, 0x12, 0x30, 9, 8, 7},
+                   4},
+        PrefixCase{"Bytes",
+                   [] { return static_cast<tolk::MsgBody*>(new tolk::MsgDefault_t()); },
+                   {1, 2, 3, 4, 5},
+                   0}),
+    [](const ::testing::TestParamInfo<PrefixCase>& i) { return std::string(i.param.name); });
 
 }  // namespace
