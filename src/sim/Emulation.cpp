@@ -938,6 +938,35 @@ void Emulation::handleTsc(Request& rq, Channel& ch) {
             answer(rq, model_.blindTransfer(ch, f.CallId, ev), 0);
             return;
         }
+        case 0x1212: {
+            Tsc::MsgInitTransfer_t f;
+            (void)f.readMsg(&rq.msg, 0);
+            std::uint32_t id = 0;
+            // As with MakeCall, the completion names the consultation before its events do.
+            std::vector<Event> later;
+            std::uint32_t code = model_.initTransfer(ch, f.CallId, id, later);
+            if (code != 0) {
+                refuse(rq, code);
+                return;
+            }
+            Tsc::MsgInitTransferCmplt_t res;
+            res.CallId = id;
+            reply(rq, 0x1213, &res);
+            ev.insert(ev.end(), later.begin(), later.end());
+            return;
+        }
+        case 0x1207: {
+            Tsc::MsgCompleteTransfer_t f;
+            (void)f.readMsg(&rq.msg, 0);
+            answer(rq, model_.completeTransfer(ch, f.CallId, f.ConCallId, ev), 0);
+            return;
+        }
+        case 0x1203: {
+            Tsc::MsgCancelTransfer_t f;
+            (void)f.readMsg(&rq.msg, 0);
+            answer(rq, model_.cancelTransfer(ch, f.CallId, ev), 0);
+            return;
+        }
         case 0x122D: {
             Tsc::MsgProceedCall_t f;
             (void)f.readMsg(&rq.msg, 0);

@@ -107,6 +107,19 @@ void Model::callEvent(Channel& ch, std::vector<Event>& ev) {
     ev.push_back(std::move(e));
 }
 
+void Model::consultEvent(Channel& ch, std::uint32_t state, std::uint32_t why,
+                         std::vector<Event>& ev) {
+    Event e;
+    e.kind = Event::Kind::CallState;
+    e.source = ch.tsc;
+    e.group = kGroupCallState;
+    e.type = kGroupCallState + state;
+    e.a = ch.call->consultId;
+    e.b = state;
+    e.c = why;
+    ev.push_back(std::move(e));
+}
+
 void Model::chanEvent(Channel& ch, std::vector<Event>& ev) {
     Event e;
     e.kind = Event::Kind::ChanState;
@@ -130,6 +143,10 @@ void Model::endCall(Channel& ch, std::uint32_t localState, std::uint32_t why, st
                     std::vector<Event>& ev) {
     Channel* peer = ch.call->peer;
     ch.call->peer = nullptr;
+    if (ch.call->consultId != 0) {
+        consultEvent(ch, call::Null, why, ev);
+        ch.call->consultId = 0;
+    }
     if (!ended(*ch.call) || localState == call::Null) {
         setCall(ch, localState, why, ev);
     }
@@ -320,6 +337,57 @@ std::uint32_t Model::blindTransfer(Channel& ch, std::uint32_t callId, std::vecto
     }
     c->peer = nullptr;
     setCall(ch, call::Null, reason::Transfer, ev);
+    return 0;
+}
+
+std::uint32_t Model::initTransfer(Channel& ch, std::uint32_t callId, std::uint32_t& consultId,
+                                  std::vector<Event>& ev) {
+    Call* c = findCall(ch, callId);
+    if (!c) {
+        return kErrNoSuchCall;
+    }
+    if ((c->state != call::Connected && c->state != call::Hold) || c->consultId != 0) {
+        return kErrBadState;
+    }
+    setCall(ch, call::HoldPendXfer, reason::None, ev);
+    c->consultId = nextCallId_++;
+    consultId = c->consultId;
+    // The consulted party is played as one outside the farm: it rings and answers at once.
+    for (std::uint32_t s : {call::Dialing, call::Proceeding, call::Alerting, call::Connected}) {
+        consultEvent(ch, s, reason::None, ev);
+    }
+    return 0;
+}
+
+std::uint32_t Model::completeTransfer(Channel& ch, std::uint32_t callId, std::uint32_t consultId,
+                                      std::vector<Event>& ev) {
+    Call* c = findCall(ch, callId);
+    if (!c || c->consultId == 0 || (consultId != 0 && consultId != c->consultId)) {
+        return kErrNoSuchCall;
+    }
+    consultEvent(ch, call::Null, reason::Transfer, ev);
+    c->consultId = 0;
+    if (c->peer && c->peer->call) {
+        c->peer->call->peer = nullptr;
+    }
+    c->peer = nullptr;
+    setCall(ch, call::Null, reason::Transfer, ev);
+    return 0;
+}
+
+std::uint32_t Model::cancelTransfer(Channel& ch, std::uint32_t callId, std::vector<Event>& ev) {
+    // Either call of the transfer names it.
+    bool consultation = ch.call && callId != 0 && callId == ch.call->consultId;
+    Call* c = consultation ? &*ch.call : findCall(ch, callId);
+    if (!c) {
+        return kErrNoSuchCall;
+    }
+    if (c->consultId == 0) {
+        return kErrBadState;
+    }
+    consultEvent(ch, call::Null, reason::Canceled, ev);
+    c->consultId = 0;
+    setCall(ch, call::Connected, reason::None, ev);
     return 0;
 }
 

@@ -43,6 +43,7 @@ enum : std::uint32_t { Active = 1, OutOfService = 4, MediaDetached = 13 };
 namespace reason {
 enum : std::uint32_t {
     None = 0,
+    Canceled = 3,
     DestBusy = 5,
     DestOutOfOrder = 7,
     IncomingCall = 11,
@@ -97,8 +98,9 @@ struct Call {
     std::uint32_t id = 0;
     std::uint32_t state = call::Null;
     std::uint32_t reason = reason::None;
-    Channel* peer = nullptr;  // the farm channel at the other end, if any
-    std::string remote;       // the other party's number
+    Channel* peer = nullptr;      // the farm channel at the other end, if any
+    std::string remote;           // the other party's number
+    std::uint32_t consultId = 0;  // the consultation call of a transfer under way, if any
 };
 
 // Slots a cluster transmits on its talk port, and what it listens to on other ports.
@@ -178,6 +180,15 @@ class Model {
     std::uint32_t holdCall(Channel& ch, std::uint32_t callId, std::vector<Event>& ev);
     std::uint32_t retrieveCall(Channel& ch, std::uint32_t callId, std::vector<Event>& ev);
     std::uint32_t blindTransfer(Channel& ch, std::uint32_t callId, std::vector<Event>& ev);
+    // A supervised transfer: the call waits in HoldPendXfer while a consultation call (its own
+    // id, its own call state events) reaches the target; completing hands the far end over to
+    // the target, cancelling ends the consultation and takes the call back. Call id 0 means the
+    // channel's present call (and its present consultation).
+    std::uint32_t initTransfer(Channel& ch, std::uint32_t callId, std::uint32_t& consultId,
+                               std::vector<Event>& ev);
+    std::uint32_t completeTransfer(Channel& ch, std::uint32_t callId, std::uint32_t consultId,
+                                   std::vector<Event>& ev);
+    std::uint32_t cancelTransfer(Channel& ch, std::uint32_t callId, std::vector<Event>& ev);
     std::uint32_t dial(Channel& ch, std::uint32_t callId);
     // Call id 0 asks for the channel's present call; a channel without one answers Null.
     std::uint32_t callState(Channel& ch, std::uint32_t callId, std::uint32_t& id,
@@ -221,6 +232,7 @@ class Model {
   private:
     Call* findCall(Channel& ch, std::uint32_t callId);
     void callEvent(Channel& ch, std::vector<Event>& ev);
+    void consultEvent(Channel& ch, std::uint32_t state, std::uint32_t why, std::vector<Event>& ev);
     void chanEvent(Channel& ch, std::vector<Event>& ev);
     void setCall(Channel& ch, std::uint32_t state, std::uint32_t why, std::vector<Event>& ev);
     // Ends the call on `ch` (to `localState`) and tells a farm peer that the far end has gone.

@@ -7,6 +7,8 @@
 #include <chrono>
 #include <condition_variable>
 #include <cstring>
+#include <functional>
+#include <memory>
 #include <mutex>
 #include <vector>
 
@@ -409,6 +411,160 @@ TEST_F(EmulationTest, ControlCallRingsAChannelAndAnswerConnectsIt) {
     rel.Reason = 14;
     tsc.request(0x121C, &rel);
 }
+
+TEST_F(EmulationTest, SupervisedTransferThroughTheChannelsTsc) {
+    Addressable tsc(cd(farm::channelComponentAddress(1, 2, 9, farm::kTSC)));
+    tsc.asyncRegisterEvtGroup(0x1230, &Inbox::take);
+    Std::MsgDetectEvt_t sub;
+    sub.RetAddr = tsc.getMsgQueue()->getHostDesc();
+    sub.EvtType = 0x1230;  // the group number takes every call state
+    sub.EvtGroup = 0x1230;
+    tsc.request(0x16, &sub, 0x17, nullptr, tsc.getId());
+
+    Tsc::MsgMakeCall_t mk;
+    setText(mk.DestAddr, "8005551000");
+    setText(mk.OrigAddr, "5551242");
+    Tsc::MsgMakeCallCmplt_t call;
+    tsc.request(0x1214, &mk, 0x1215, &call);
+    ASSERT_EQ(Inbox::get().waitFor(4).size(), 4u);
+
+    Tsc::MsgInitTransfer_t init;
+    init.CallId = call.CallId;
+    setText(init.DestAddr, "8005552000");
+    setText(init.OrigAddr, "5551242");
+    Tsc::MsgInitTransferCmplt_t consult;
+    tsc.request(0x1212, &init, 0x1213, &consult);
+    EXPECT_NE(consult.CallId, 0u);
+    EXPECT_NE(consult.CallId, call.CallId);
+    EXPECT_EQ(refusal(tsc, 0x1212, &init, 0x1213), kErrBadState);  // one at a time
+
+    Tsc::MsgCompleteTransfer_t done;
+    done.CallId = call.CallId;
+    done.ConCallId = consult.CallId;
+    tsc.request(0x1207, &done);  // one-way: silence is success
+
+    auto got = Inbox::get().waitFor(11);
+    ASSERT_EQ(got.size(), 11u);
+    // {call id, state, reason} from the fifth event on.
+    const std::uint32_t want[][3] = {{call.CallId, 13, 0},    {consult.CallId, 5, 0},
+                                     {consult.CallId, 15, 0}, {consult.CallId, 17, 0},
+                                     {consult.CallId, 2, 0},  {consult.CallId, 0, 25},
+                                     {call.CallId, 0, 25}};
+    for (int i = 0; i < 7; ++i) {
+        SCOPED_TRACE(i);
+        ASSERT_EQ(got[4 + i].size(), 6u);
+        EXPECT_EQ(got[4 + i][1], 0x1230u + want[i][1]);
+        EXPECT_EQ(got[4 + i][3], want[i][0]);
+        EXPECT_EQ(got[4 + i][4], want[i][1]);
+        EXPECT_EQ(got[4 + i][5], want[i][2]);
+    }
+    Tsc::MsgGetCallState_t q;
+    q.CallId = 0;
+    Tsc::MsgGetCallStateCmplt_t cs;
+    tsc.request(0x120D, &q, 0x120E, &cs);
+    EXPECT_EQ(cs.CallState, 0u);
+    Tsc::MsgCancelTransfer_t cancel;
+    cancel.CallId = call.CallId;
+    EXPECT_EQ(refusal(tsc, 0x1203, &cancel, 0), kErrNoSuchCall);
+
+    Std::MsgCancelEvt_t off;
+    off.Type = 0x1230;
+    tsc.request(0x1A, &off, 0x1B, nullptr, tsc.getId());
+    EXPECT_NE(builtinControl("stats").find("subscriptions=0"), std::string::npos);
+}
+
+// What each further request of the program gets from a board in its first state: the answer
+// of the given type (refusal 0), or MsgError_t with the given code.
+struct Exchange {
+    const char* name;
+    farm::Address target;
+    std::uint32_t type;
+    std::function<std::unique_ptr<tolk::MsgBody>()> body;
+    std::uint32_t answerType;
+    std::uint32_t refusal;
+};
+
+class EmulationExchange : public EmulationTest, public testing::WithParamInterface<Exchange> {};
+
+TEST_P(EmulationExchange, IsAnsweredAsABoardWould) {
+    const Exchange& x = GetParam();
+    Addressable a(cd(x.target));
+    std::unique_ptr<tolk::MsgBody> body = x.body();
+    if (x.refusal != 0) {
+        EXPECT_EQ(refusal(a, x.type, body.get(), x.answerType), x.refusal);
+    } else {
+        EXPECT_NO_THROW(a.request(x.type, body.get(), x.answerType, nullptr));
+    }
+}
+
+template <typename B>
+std::function<std::unique_ptr<tolk::MsgBody>()> with(std::function<void(B&)> fill) {
+    return [fill] {
+        auto b = std::make_unique<B>();
+        fill(*b);
+        return std::unique_ptr<tolk::MsgBody>(std::move(b));
+    };
+}
+
+farm::Address tscOf(unsigned board, int trunk, int channel) {
+    return farm::channelComponentAddress(board, trunk, channel, farm::kTSC);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    DefaultFarm, EmulationExchange,
+    testing::Values(
+        Exchange{"HoldWithoutCall", tscOf(1, 1, 20), 0x1211,
+                 with<Tsc::MsgHoldCall_t>([](auto& b) { b.CallId = 0; }), 0, kErrNoSuchCall},
+        Exchange{"RetrieveWithoutCall", tscOf(1, 1, 20), 0x121E,
+                 with<Tsc::MsgRetrieveCall_t>([](auto& b) { b.CallId = 0; }), 0, kErrNoSuchCall},
+        Exchange{"AcceptWithoutCall", tscOf(1, 1, 20), 0x1200,
+                 with<Tsc::MsgAcceptCall_t>([](auto& b) { b.CallId = 0; }), 0, kErrNoSuchCall},
+        Exchange{"RejectWithoutCall", tscOf(1, 1, 20), 0x121D,
+                 with<Tsc::MsgRejectCall_t>([](auto& b) { b.CallId = 0; }), 0, kErrNoSuchCall},
+        Exchange{"BlindTransferWithoutCall", tscOf(1, 1, 20), 0x1202,
+                 with<Tsc::MsgBlindTransferCall_t>([](auto& b) { b.CallId = 0; }), 0,
+                 kErrNoSuchCall},
+        Exchange{"InitTransferWithoutCall", tscOf(1, 1, 20), 0x1212,
+                 with<Tsc::MsgInitTransfer_t>([](auto& b) { b.CallId = 0; }), 0x1213,
+                 kErrNoSuchCall},
+        Exchange{"DialWithoutCall", tscOf(1, 1, 20), 0x1224,
+                 with<Tsc::MsgDial_t>([](auto& b) { setText(b.DigitString, "12"); }), 0x1225,
+                 kErrNoSuchCall},
+        Exchange{"IsdnOnACasLine", tscOf(1, 1, 20), 0x1222,
+                 with<Tsc::MsgSendISDN_t>([](auto& b) { b.CallId = 0; }), 0x1223, kErrNotSupported},
+        Exchange{"IsdnWithoutCallOnACcsLine", tscOf(2, 1, 20), 0x1222,
+                 with<Tsc::MsgSendISDN_t>([](auto& b) { b.CallId = 0; }), 0x1223, kErrNoSuchCall},
+        Exchange{"ChannelStateOfNoMeaning", tscOf(1, 1, 20), 0x121F,
+                 with<Tsc::MsgSetChanState_t>([](auto& b) { b.State = 99; }), 0x1220,
+                 kErrBadParameter},
+        Exchange{"ChannelBackInService", tscOf(1, 1, 20), 0x121F,
+                 with<Tsc::MsgSetChanState_t>([](auto& b) { b.State = 256; }), 0x1220, 0},
+        Exchange{"ResetLineDevice", tscOf(1, 1, 21), 0x1246,
+                 with<Tsc::MsgResetLineDevice_t>([](auto&) {}), 0x1247, 0},
+        Exchange{"AttachOnAFixedBoard", tscOf(1, 1, 20), 0x1234,
+                 with<Tsc::MsgAttach_t>([](auto&) {}), 0x1235, kErrNotSupported},
+        Exchange{"DetachWhatIsNotAttached", tscOf(2, 1, 20), 0x1236,
+                 with<Tsc::MsgDetach_t>([](auto&) {}), 0x1237, kErrBadState},
+        Exchange{"StopAnAlarmNotSent", farm::lconAddress(1, 1), 0x1613,
+                 with<Lcon::MsgStopAlarm_t>([](auto& b) { b.AlarmId = 0x160C; }), 0, kErrBadState},
+        Exchange{"ClaimAComponentThatIsThere", farm::resourceMgrAddress(1), 0x800059,
+                 with<Rm::CompUse_t>([](auto& b) {
+                     b.List.realloc(1);
+                     b.List[0]->desc = cd(tscOf(1, 1, 1));
+                     b.Count = 1;
+                 }),
+                 0x800000, 0},
+        Exchange{"ClaimAComponentThatIsNot", farm::resourceMgrAddress(1), 0x800059,
+                 with<Rm::CompUse_t>([](auto& b) {
+                     b.List.realloc(1);
+                     b.List[0]->desc = cd(tscOf(1, 1, 30));
+                     b.Count = 1;
+                 }),
+                 0x800000, kErrNoSuchComponent},
+        Exchange{"ClusterOfATsc", farm::clusterMgrAddress(1), 0x80001D,
+                 with<Cm::ClusterByComp_t>([](auto& b) { b.desc = cd(tscOf(1, 2, 3)); }), 0x80002C,
+                 0}),
+    [](const testing::TestParamInfo<Exchange>& i) { return std::string(i.param.name); });
 
 }  // namespace
 }  // namespace sim

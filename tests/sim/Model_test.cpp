@@ -128,6 +128,74 @@ TEST_F(ModelTest, FarEndHangupOfAFarmCallIdlesThePeerAndDisconnectsTheChannel) {
     EXPECT_EQ(m.farEndHangup(ch(3), ev), kErrNoSuchCall);
 }
 
+// Call states with their call ids, to tell the consultation from the call it transfers.
+std::vector<std::pair<std::uint32_t, std::uint32_t>> idsAndStates(const std::vector<Event>& ev) {
+    std::vector<std::pair<std::uint32_t, std::uint32_t>> out;
+    for (const Event& e : ev) {
+        if (e.kind == Event::Kind::CallState) {
+            out.emplace_back(e.a, e.b);
+        }
+    }
+    return out;
+}
+
+TEST_F(ModelTest, SupervisedTransferHoldsTheCallConsultsAndHandsTheFarEndOver) {
+    std::uint32_t id = 0;
+    ASSERT_EQ(m.makeCall(ch(1), "1003", "1000", id, ev), 0u);
+    ASSERT_EQ(m.answerCall(ch(4), 0, ev), 0u);
+    std::uint32_t farId = ch(4).call->id;
+    EXPECT_EQ(m.completeTransfer(ch(1), id, 0, ev), kErrNoSuchCall);  // nothing under way
+
+    ev.clear();
+    std::uint32_t consult = 0;
+    ASSERT_EQ(m.initTransfer(ch(1), 0, consult, ev), 0u);
+    EXPECT_NE(consult, 0u);
+    EXPECT_NE(consult, id);
+    EXPECT_NE(consult, farId);
+    std::vector<std::pair<std::uint32_t, std::uint32_t>> want = {{id, call::HoldPendXfer},
+                                                                 {consult, call::Dialing},
+                                                                 {consult, call::Proceeding},
+                                                                 {consult, call::Alerting},
+                                                                 {consult, call::Connected}};
+    EXPECT_EQ(idsAndStates(ev), want);
+    std::uint32_t again = 0;
+    EXPECT_EQ(m.initTransfer(ch(1), id, again, ev), kErrBadState);
+    EXPECT_EQ(m.completeTransfer(ch(1), id, consult + 1, ev), kErrNoSuchCall);
+
+    ev.clear();
+    ASSERT_EQ(m.completeTransfer(ch(1), id, consult, ev), 0u);
+    std::vector<Seen> gone = {{1, call::Null, reason::Transfer}, {1, call::Null, reason::Transfer}};
+    EXPECT_EQ(callStates(ev), gone);
+    EXPECT_EQ(idsAndStates(ev).front().first, consult);
+    EXPECT_FALSE(ch(1).call);
+    // The far end now talks to the transfer target and is no longer tied to this channel.
+    ASSERT_TRUE(ch(4).call);
+    EXPECT_EQ(ch(4).call->state, call::Connected);
+    EXPECT_EQ(ch(4).call->peer, nullptr);
+}
+
+TEST_F(ModelTest, CancelledTransferEndsTheConsultationAndTakesTheCallBack) {
+    std::uint32_t id = 0, consult = 0;
+    ASSERT_EQ(m.makeCall(ch(2), "9999", "1001", id, ev), 0u);
+    EXPECT_EQ(m.cancelTransfer(ch(2), id, ev), kErrBadState);
+    ASSERT_EQ(m.initTransfer(ch(2), id, consult, ev), 0u);
+    ev.clear();
+    // The consultation's id names the transfer as well as the held call's.
+    ASSERT_EQ(m.cancelTransfer(ch(2), consult, ev), 0u);
+    std::vector<std::pair<std::uint32_t, std::uint32_t>> want = {{consult, call::Null},
+                                                                 {id, call::Connected}};
+    EXPECT_EQ(idsAndStates(ev), want);
+    EXPECT_EQ(ev.front().c, reason::Canceled);
+
+    // Dropping a call whose transfer is under way ends the consultation first.
+    ASSERT_EQ(m.initTransfer(ch(2), 0, consult, ev), 0u);
+    ev.clear();
+    ASSERT_EQ(m.dropCall(ch(2), 0, reason::Normal, ev), 0u);
+    want = {{consult, call::Null}, {id, call::Idle}};
+    EXPECT_EQ(idsAndStates(ev), want);
+    EXPECT_EQ(m.cancelTransfer(ch(2), consult, ev), kErrNoSuchCall);
+}
+
 TEST_F(ModelTest, AnswerAndRejectNeedARingingCall) {
     EXPECT_EQ(m.answerCall(ch(1), 0, ev), kErrNoSuchCall);
     std::uint32_t id = 0;
