@@ -349,6 +349,7 @@ void Emulation::handle(Request& rq) {
                 handleCas(rq);
             } else {
                 unanswerable(rq, "not a message of this component");
+                refuse(rq, kErrNotSupported);
             }
             return;
         case farm::ResourceKind::Board:
