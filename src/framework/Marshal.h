@@ -62,6 +62,14 @@ void checkElementWidth(unsigned int typeCode) {
     }
 }
 
+// One descriptor counts 1 to 256 elements; a larger fixed array would be cut short by the
+// descriptor while the caller sized its list and GetByteSize for all of it.
+inline void checkFixedCount(unsigned int n) {
+    if (n > MaxChunk + 1) {
+        throw Exception("tolk::Marshal: a fixed array holds at most 256 elements");
+    }
+}
+
 template <class T, class Move>
 unsigned int moveChunks(unsigned int off, unsigned int typeCode, staticList<T>& l, bool first,
                         Move move) {
@@ -102,11 +110,16 @@ unsigned int getList(Msg* m, unsigned int off, unsigned int typeCode, staticList
                               });
 }
 
-// A fixed array of n elements: one field with the count in its descriptor. Writing grows a
-// shorter list to n first and moves only the first n of a longer one; reading resizes to n.
+// A fixed array of n elements (at most 256): one field with the count in its descriptor.
+// Writing grows a shorter list to n first and moves only the first n of a longer one; reading
+// resizes to n. An array of none moves nothing.
 template <class T>
 unsigned int putFixed(Msg* m, unsigned int off, unsigned int typeCode, unsigned int n,
                       staticList<T>& l, bool first) {
+    detail::checkFixedCount(n);
+    if (n == 0) {
+        return off;
+    }
     if (l.length() < n) {
         l.realloc(n);
     }
@@ -117,7 +130,11 @@ unsigned int putFixed(Msg* m, unsigned int off, unsigned int typeCode, unsigned 
 template <class T>
 unsigned int getFixed(Msg* m, unsigned int off, unsigned int typeCode, unsigned int n,
                       staticList<T>& l, bool first) {
+    detail::checkFixedCount(n);
     l.realloc(n);
+    if (n == 0) {
+        return off;
+    }
     detail::checkElementWidth<T>(typeCode);
     unsigned int desc = makeDesc(typeCode, n);
     return first ? getFirst(m, off, desc, l[0]) : getField(m, off, desc, l[0]);

@@ -195,6 +195,22 @@ TEST_F(MarshalTest, ElementTypeNarrowerThanTheCodeIsRefused) {
     EXPECT_TRUE(fieldCalls().empty());
 }
 
+TEST_F(MarshalTest, FixedArrayOfNoneMovesNothingAndOneBeyond256IsRefused) {
+    Msg m(512);
+    staticList<unsigned char> l;
+    EXPECT_EQ(tolk::putFixed(&m, 4, 4, 0, l, false), 4u);
+    EXPECT_EQ(tolk::getFixed(&m, 4, 4, 0, l, false), 4u);
+    EXPECT_EQ(l.length(), 0u);
+    EXPECT_TRUE(fieldCalls().empty());
+    // 256 still fits one descriptor (count bits all ones); 257 would be cut to one element.
+    EXPECT_EQ(tolk::getFixed(&m, 4, 4, 256, l, false), 260u);
+    ASSERT_EQ(fieldCalls().size(), 1u);
+    EXPECT_EQ(fieldCalls()[0].descs, std::vector<unsigned int>{0x27F800});
+    EXPECT_THROW(tolk::putFixed(&m, 4, 4, 257, l, false), tolk::Exception);
+    EXPECT_THROW(tolk::getFixed(&m, 4, 4, 257, l, false), tolk::Exception);
+    EXPECT_EQ(fieldCalls().size(), 1u);
+}
+
 TEST_F(MarshalTest, ImpossibleCountRaisesAllocationError) {
     Msg m(8);
     staticList<unsigned int> l;
