@@ -128,6 +128,34 @@ TEST(TKSThread, CancelIsNoticedByTestCancelWhichRunsTheCleanups) {
     EXPECT_EQ(TKSThread::NOT_RUNNING, t.getStatus());
 }
 
+// Records its own end, so that a test can see who deleted it.
+class SelfDeleting : public TKSThread {
+  public:
+    explicit SelfDeleting(std::atomic<int>& deletions)
+        : TKSThread(static_cast<TKSRunnable*>(&body),
+                    static_cast<TKSThread::MemberBody>(&Body::run), 0),
+          deletions(deletions) {}
+    ~SelfDeleting() override { ++deletions; }
+    Body body;
+
+  private:
+    std::atomic<int>& deletions;
+};
+
+TEST(TKSThread, SelfDeletingThreadDeletesItsObjectOnceWhenTheBodyEnds) {
+    std::atomic<int> deletions{0};
+    auto* t = new SelfDeleting(deletions);
+    t->setSelfDelete(1);
+    t->start(nullptr);
+    EXPECT_EQ(0, deletions.load());
+    t->body.release = true;
+    for (int i = 0; i < 5000 && deletions.load() == 0; ++i) {
+        std::this_thread::sleep_for(1ms);
+    }
+    std::this_thread::sleep_for(10ms);
+    EXPECT_EQ(1, deletions.load());
+}
+
 TEST(TKSThread, ExceptionFromABodyEndsOnlyThatThread) {
     TKSThread t([](void*, void*) -> void* { throw 42; }, 0);
     testing::internal::CaptureStderr();
