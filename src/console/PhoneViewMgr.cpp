@@ -53,6 +53,13 @@ void PhoneViewMgr::MakeRows() {
     view->SetNormalVideo();
 }
 
+PhoneViewMgr::~PhoneViewMgr() {
+    for (RowInfo* row : rows) {
+        delete row;
+    }
+    delete systemView;
+}
+
 std::string PhoneViewMgr::MakeKey(unsigned int board, unsigned int line, unsigned int chan) {
     char key[3 * 12 + 3];
     std::snprintf(key, sizeof key, "%d.%d.%d", static_cast<int>(board), static_cast<int>(line),

@@ -30,6 +30,10 @@ constexpr unsigned int MAX_PHONE_VIEWS = 10;
 class PhoneViewMgr {
   public:
     static PhoneViewMgr* CreatePhoneViewMgr(View* view);
+    // The process's manager is never destroyed; one made for a test frees its rows.
+    virtual ~PhoneViewMgr();
+    PhoneViewMgr(const PhoneViewMgr&) = delete;
+    PhoneViewMgr& operator=(const PhoneViewMgr&) = delete;
 
     PhoneView* CreatePhoneView(unsigned int board, unsigned int line, unsigned int chan,
                                int& result);

@@ -49,6 +49,12 @@ TrunkViewMgr::TrunkViewMgr(View* v) : view(v) {
     view->SetNormalVideo();
 }
 
+TrunkViewMgr::~TrunkViewMgr() {
+    for (RowInfo* row : rows) {
+        delete row;
+    }
+}
+
 std::string TrunkViewMgr::MakeKey(unsigned int board, unsigned int line) {
     char key[2 * 12 + 2];
     std::snprintf(key, sizeof key, "%d.%d", static_cast<int>(board), static_cast<int>(line));

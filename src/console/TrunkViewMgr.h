@@ -26,6 +26,10 @@ constexpr unsigned int MAX_TRUNK_VIEWS = 10;
 class TrunkViewMgr {
   public:
     static TrunkViewMgr* CreateTrunkViewMgr(View* view);
+    // The process's manager is never destroyed; one made for a test frees its rows.
+    virtual ~TrunkViewMgr();
+    TrunkViewMgr(const TrunkViewMgr&) = delete;
+    TrunkViewMgr& operator=(const TrunkViewMgr&) = delete;
 
     TrunkView* CreateTrunkView(unsigned int board, unsigned int line, int& result);
     int DestroyTrunkView(unsigned int board, unsigned int line);

@@ -166,6 +166,8 @@ TEST_F(PhoneViewMgrTest, DestroyAllStopsEveryViewAndLeavesTheRows) {
     ASSERT_EQ(Open(1, 3, 2), PHONEVIEWMGR_SUCCESS);
     ASSERT_EQ(Open(1, 3, 10), PHONEVIEWMGR_SUCCESS);
     ASSERT_EQ(Open(1, 4, 1), PHONEVIEWMGR_SUCCESS);
+    std::vector<PhoneView*> left = {manager.FindPhoneView(1, 3, 2), manager.FindPhoneView(1, 3, 10),
+                                    manager.FindPhoneView(1, 4, 1)};
     const std::size_t before = view.calls.size();
     EXPECT_EQ(manager.DestroyAllPhoneViews(), 1);
     EXPECT_EQ(manager.ViewCount(), 0u);
@@ -174,6 +176,10 @@ TEST_F(PhoneViewMgrTest, DestroyAllStopsEveryViewAndLeavesTheRows) {
         EXPECT_NE(view.calls[i].what, "clear");
     }
     EXPECT_EQ(LabelRow("1.3.10"), 2);
+    // What the process would leave behind at its end, the test frees.
+    for (PhoneView* stopped : left) {
+        delete stopped;
+    }
 }
 
 struct KeyCase {
