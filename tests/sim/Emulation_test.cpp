@@ -185,6 +185,10 @@ struct ParmCase {
     std::uint32_t value;
 };
 
+void PrintTo(const ParmCase& p, std::ostream* os) {
+    *os << "parm 0x" << std::hex << p.parm << " of board " << std::dec << p.board;
+}
+
 class EmulationParm : public EmulationTest, public testing::WithParamInterface<ParmCase> {};
 
 TEST_P(EmulationParm, GetParmAnswersWhatTheFarmSays) {
@@ -275,6 +279,29 @@ TEST_F(EmulationTest, SubscribedCallStateEventsFollowAMakeCall) {
     }
     tsc.request(0x1C, &cancel, 0x1D, nullptr, tsc.getId());
     EXPECT_NE(builtinControl("stats").find("subscriptions=0"), std::string::npos);
+}
+
+TEST_F(EmulationTest, SaturationBurstSendsEveryEventToTheLinesSubscriber) {
+    Addressable lcon(cd(farm::lconAddress(3, 1)));
+    lcon.asyncRegisterEvtGroup(0x1600, &Inbox::take);
+    Std::MsgDetectEvt_t sub;
+    sub.RetAddr = lcon.getMsgQueue()->getHostDesc();
+    sub.EvtType = 0x1600;
+    sub.EvtGroup = 0;
+    lcon.request(0x16, &sub, 0x17, nullptr, lcon.getId());
+
+    EXPECT_EQ(builtinControl("ferr 3 1 300"), "ok 300");
+    auto got = Inbox::get().waitFor(300);
+    ASSERT_EQ(got.size(), 300u);
+    for (const auto& w : got) {
+        ASSERT_EQ(w.size(), 3u);
+        EXPECT_EQ(w[0], 0x1600u);  // label
+        EXPECT_EQ(w[1], 0x1617u);  // frame error saturation
+        EXPECT_EQ(w[2] >> 24, 1u);
+    }
+    Std::MsgCancelEvt_t off;
+    off.Type = 0x1600;
+    lcon.request(0x1A, &off, 0x1B, nullptr, lcon.getId());
 }
 
 TEST_F(EmulationTest, LineAlreadyInServiceIsRefusedWith1600) {
@@ -486,6 +513,10 @@ struct Exchange {
     std::uint32_t answerType;
     std::uint32_t refusal;
 };
+
+void PrintTo(const Exchange& x, std::ostream* os) {
+    *os << x.name;
+}
 
 class EmulationExchange : public EmulationTest, public testing::WithParamInterface<Exchange> {};
 

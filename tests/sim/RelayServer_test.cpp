@@ -12,9 +12,12 @@
 #include <chrono>
 #include <condition_variable>
 #include <cstring>
+#include <memory>
 #include <mutex>
 #include <set>
 #include <sstream>
+#include <streambuf>
+#include <string>
 #include <thread>
 
 #include "catalogue/generated/lcon_bodies.h"
@@ -143,6 +146,33 @@ class RawClient {
     bool connected = false;
 };
 
+// The server's log, written on its thread and read by the test while it runs.
+class LockedLog : public std::streambuf {
+  public:
+    std::string text() {
+        std::lock_guard<std::mutex> g(lock_);
+        return text_;
+    }
+
+  protected:
+    int_type overflow(int_type c) override {
+        if (c != traits_type::eof()) {
+            std::lock_guard<std::mutex> g(lock_);
+            text_.push_back(static_cast<char>(c));
+        }
+        return c;
+    }
+    std::streamsize xsputn(const char* p, std::streamsize n) override {
+        std::lock_guard<std::mutex> g(lock_);
+        text_.append(p, static_cast<std::size_t>(n));
+        return n;
+    }
+
+  private:
+    std::mutex lock_;
+    std::string text_;
+};
+
 class RelayTest : public testing::Test {
   protected:
     void SetUp() override {
@@ -177,7 +207,8 @@ class RelayTest : public testing::Test {
         return false;
     }
 
-    std::ostringstream log;
+    LockedLog logBuf;
+    std::ostream log{&logBuf};
     std::unique_ptr<RelayServer> server;
     std::thread loop;
     int port = 0;
@@ -268,7 +299,7 @@ TEST_F(RelayTest, MalformedFrameClosesOnlyThatConnection) {
                                         0, 0, 0,    0,    1, 2, 3, 4, 5, 6, 7, 8,  9, 0, 1, 2};
     bad.send(frame);
     EXPECT_TRUE(bad.closedByServer());
-    EXPECT_NE(log.str().find("malformed message frame"), std::string::npos);
+    EXPECT_NE(logBuf.text().find("malformed message frame"), std::string::npos);
 
     Lcon::MsgGetLineStateCmplt_t st;
     good.request(0x1608, &getLine, 0x1609, &st);
@@ -330,6 +361,28 @@ TEST_F(RelayTest, HundredsOfConnectionsEachGetAUniqueAddress) {
     for (auto& c : clients) {
         EXPECT_TRUE(c->closedByServer());
     }
+}
+
+TEST_F(RelayTest, DropClosesEveryConnectionAndNewOnesAreServedAfterwards) {
+    std::vector<std::unique_ptr<RawClient>> clients;
+    for (int i = 0; i < 3; ++i) {
+        clients.push_back(std::make_unique<RawClient>(port));
+        clients.back()->send(clients.back()->open());
+        ASSERT_EQ(clients.back()->read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES).size(),
+                  TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+    }
+    ASSERT_TRUE(waitConnections(3));
+    EXPECT_EQ(server->control("drop"), "ok dropped 3");
+    for (auto& c : clients) {
+        EXPECT_TRUE(c->closedByServer());
+    }
+    EXPECT_TRUE(waitConnections(0));
+    EXPECT_EQ(server->control("drop"), "ok dropped 0");
+
+    RawClient later(port);
+    later.send(later.open());
+    EXPECT_EQ(later.read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES).size(),
+              TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
 }
 
 TEST_F(RelayTest, CloseIsAcknowledged) {
