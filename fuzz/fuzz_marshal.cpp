@@ -30,7 +30,7 @@ class CountedWords : public tolk::MsgBody {
         // Counts the list may hold but no message carries only cost time here: fold them down
         // and keep the impossible ones, which must be refused.
         if (count <= staticList<unsigned int>::MaxBytes / 4) {
-            count %= 65536;
+            count %= 2048;
         }
         return tolk::getList(m, off, 7, words, count, false);
     }
