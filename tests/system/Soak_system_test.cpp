@@ -1,0 +1,273 @@
+// Soak: the real lineprobe in a terminal against vx7sim on the loopback interface, 10 phone
+// views and 10 trunk views open, while vx7sim plays calls, alarms, error bursts and line
+// state changes on all of them and the operator releases calls at the prompt. Afterwards
+// every visible row must show the last state vx7sim sent for it, the prompt must answer,
+// memory must have stayed flat after the first seconds, and the error log must be clean.
+//
+// LINEPROBE_SOAK_SECONDS lengthens the drive (default 50, 20 under a sanitizer),
+// LINEPROBE_SOAK_SEED changes the sequence; scripts/soak runs the long form.
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <array>
+#include <chrono>
+#include <cstdio>
+#include <random>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "SimServer.h"
+#include "SystemRun.h"
+#include "TerminalSession.h"
+
+namespace lineprobe::testing {
+namespace {
+
+const std::string FARM = LINEPROBE_FARMS_DIR "/big33.toml";
+constexpr int VIEWS = 10;
+constexpr int PHONE_ROW0 = 12;
+constexpr int TRUNK_ROW0 = 24;
+constexpr int COL0 = 1;
+// Memory the process may gain once the views are open and the storm has run 10 s: room
+// for allocator noise, far below what a leak of one block per event would add.
+constexpr long RSS_GROWTH_BOUND_KIB = 1024;
+// The error counters are four columns wide.
+constexpr long COUNTER_CAP = 9000;
+
+struct AlarmColumn {
+    const char* name;
+    int col;
+    // "Sig" and "DChan" show that the signal or the D channel is good, so an alarm
+    // blanks them where the other columns show X.
+    bool inverted;
+};
+
+constexpr std::array<AlarmColumn, 7> ALARMS{{{"red", 54, false},
+                                             {"yellow", 60, false},
+                                             {"ais", 72, false},
+                                             {"los", 42, true},
+                                             {"loopback", 48, false},
+                                             {"raicrc", 66, false},
+                                             {"dchan", 78, true}}};
+
+struct TrunkExpect {
+    std::array<bool, ALARMS.size()> alarm{};
+    long bpv = 0;
+    long ferr = 0;
+    bool inService = true;
+};
+
+enum class CallExpect { Null, Offered, Disconnected };
+
+const char* CallText(CallExpect c) {
+    switch (c) {
+        case CallExpect::Offered:
+            return "Offered";
+        case CallExpect::Disconnected:
+            return "Disconnected";
+        default:
+            return "Null";
+    }
+}
+
+long StatsField(const std::string& stats, const std::string& name) {
+    const auto at = stats.find(" " + name + "=");
+    return at == std::string::npos ? -1 : std::atol(stats.c_str() + at + name.size() + 2);
+}
+
+std::string Field(const std::string& row, int col, std::size_t length) {
+    if (static_cast<std::size_t>(col) >= row.size()) {
+        return {};
+    }
+    std::string text = row.substr(static_cast<std::size_t>(col), length);
+    text.erase(text.find_last_not_of(' ') + 1);
+    return text;
+}
+
+// What a trunk row should read; empty when it does.
+std::string TrunkMismatch(const std::string& row, const TrunkExpect& want) {
+    std::string why;
+    const std::string state = Field(row, COL0 + 8, 15);
+    const std::string wantState = want.inService ? "InService" : "Out of Service";
+    if (state != wantState) {
+        why += " state '" + state + "' want '" + wantState + "'";
+    }
+    for (std::size_t i = 0; i < ALARMS.size(); ++i) {
+        const bool marked = row[static_cast<std::size_t>(COL0 + ALARMS[i].col)] == 'X';
+        if (marked != (want.alarm[i] != ALARMS[i].inverted)) {
+            why += std::string(" ") + ALARMS[i].name + (want.alarm[i] ? " on" : " off");
+        }
+    }
+    if (Field(row, COL0 + 85, 4) != std::to_string(want.bpv)) {
+        why += " bpv '" + Field(row, COL0 + 85, 4) + "' want " + std::to_string(want.bpv);
+    }
+    if (Field(row, COL0 + 92, 4) != std::to_string(want.ferr)) {
+        why += " ferr '" + Field(row, COL0 + 92, 4) + "' want " + std::to_string(want.ferr);
+    }
+    return why;
+}
+
+TEST(Soak, TenPhoneAndTenTrunkViewsUnderAnEventStorm) {
+    const auto driveFor =
+        std::chrono::seconds(EnvNumber("LINEPROBE_SOAK_SECONDS", UNDER_SANITIZER ? 20 : 50));
+    std::mt19937 random(static_cast<unsigned>(EnvNumber("LINEPROBE_SOAK_SEED", 8)));
+
+    SimServer sim(FARM);
+    ASSERT_TRUE(sim.Running());
+    TerminalOptions options;
+    options.env.emplace_back("REMOTE_TKHOST", sim.Address());
+    options.env.emplace_back("VX7_FARM", FARM);
+    options.unsetEnv.push_back("CORVO_ORVANE_DIR");
+    TerminalSession session(options);
+    ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT, std::chrono::seconds(60)))
+        << session.Dump();
+    const pid_t pid = session.Pid();
+    ASSERT_EQ(ProcessName(pid), "lineprobe");
+
+    // Phones on trunk 2 and trunk views of trunk 1, so that a line taken out of service
+    // ends no call the phones' rows are expected to show.
+    TimedRunner commands(session);
+    for (int board = 0; board < VIEWS; ++board) {
+        const std::string b = std::to_string(board);
+        ASSERT_TRUE(commands.Run("phone " + b + " 2 1", std::chrono::seconds(30)).returned)
+            << session.Dump();
+        ASSERT_EQ(commands.Result(), "phone view creaed successfully") << session.Dump();
+        ASSERT_TRUE(commands.Run("trunk " + b + " 1", std::chrono::seconds(30)).returned)
+            << session.Dump();
+        ASSERT_EQ(commands.Result(), "trunk view creaed successfully") << session.Dump();
+    }
+    ASSERT_TRUE(session.WaitForTextAt(TRUNK_ROW0 + 9, COL0 + 8, "InService")) << session.Dump();
+
+    std::vector<TrunkExpect> trunks(VIEWS);
+    std::vector<CallExpect> phones(VIEWS, CallExpect::Null);
+    auto control = [&](const std::string& line) {
+        const std::string answer = sim.Control(line);
+        EXPECT_EQ(answer.rfind("ok", 0), 0u) << line << ": " << answer;
+        return answer.rfind("ok", 0) == 0;
+    };
+
+    const std::string statsBefore = sim.Control("stats");
+    const auto start = Clock::now();
+    std::optional<long> baseline;
+    long peak = 0;
+    auto lastSample = start;
+    long operations = 0;
+    long typed = 0;
+    std::chrono::milliseconds slowestTyped{0};
+    while (Clock::now() - start < driveFor && !::testing::Test::HasFailure()) {
+        const int view = static_cast<int>(random() % VIEWS);
+        const std::string b = std::to_string(view);
+        const unsigned pick = random() % 10;
+        if (pick < 3) {
+            CallExpect& call = phones[static_cast<std::size_t>(view)];
+            if (call == CallExpect::Null) {
+                control("call " + b + " 2 1 5550" + std::to_string(1000 + operations % 9000));
+                call = CallExpect::Offered;
+            } else if (call == CallExpect::Offered) {
+                control("hangup " + b + " 2 1");
+                call = CallExpect::Disconnected;
+            } else {
+                // The operator clears the call while the storm goes on.
+                const TimedRunner::Outcome done =
+                    commands.Run("release " + b + " 2 1", std::chrono::seconds(30));
+                ASSERT_TRUE(done.returned) << session.Dump();
+                slowestTyped = std::max(slowestTyped, done.took);
+                ++typed;
+                call = CallExpect::Null;
+            }
+        } else {
+            TrunkExpect& trunk = trunks[static_cast<std::size_t>(view)];
+            if (pick < 7) {
+                const std::size_t a = random() % ALARMS.size();
+                trunk.alarm[a] = !trunk.alarm[a];
+                control("alarm " + b + " 1 " + ALARMS[a].name + (trunk.alarm[a] ? " on" : " off"));
+            } else if (pick < 9) {
+                const long n = 1 + static_cast<long>(random() % 40);
+                long& counter = pick == 7 ? trunk.bpv : trunk.ferr;
+                if (counter + n <= COUNTER_CAP) {
+                    control((pick == 7 ? "bpv " : "ferr ") + b + " 1 " + std::to_string(n));
+                    counter += n;
+                }
+            } else {
+                trunk.inService = !trunk.inService;
+                control("line " + b + " 1 " + (trunk.inService ? "in 0" : "out 3"));
+            }
+        }
+        ++operations;
+        const auto now = Clock::now();
+        if (now - lastSample >= std::chrono::milliseconds(500)) {
+            lastSample = now;
+            const std::optional<long> rss = RssKiB(pid);
+            ASSERT_TRUE(rss.has_value()) << "lineprobe is gone\n" << session.Dump();
+            if (now - start >= std::chrono::seconds(10)) {
+                if (!baseline) {
+                    baseline = *rss;
+                }
+                peak = std::max(peak, *rss);
+            }
+        }
+        std::this_thread::sleep_for(std::chrono::milliseconds(4));
+    }
+    ASSERT_FALSE(::testing::Test::HasFailure());
+    const double drove = std::chrono::duration<double>(Clock::now() - start).count();
+
+    // Every visible row comes to the last state sent; the tenth row of each window lies
+    // below it and is not on the screen.
+    std::string mismatch;
+    const auto settle = Clock::now();
+    do {
+        mismatch.clear();
+        const std::vector<std::string> screen = session.Screen();
+        for (int view = 0; view < VIEWS - 1; ++view) {
+            const std::string& trunkRow = screen[static_cast<std::size_t>(TRUNK_ROW0 + 1 + view)];
+            const std::string why = TrunkMismatch(trunkRow, trunks[static_cast<std::size_t>(view)]);
+            if (!why.empty()) {
+                mismatch += "trunk " + std::to_string(view) + ".1:" + why + "\n";
+            }
+            const std::string& phoneRow = screen[static_cast<std::size_t>(PHONE_ROW0 + 1 + view)];
+            const std::string want = CallText(phones[static_cast<std::size_t>(view)]);
+            if (Field(phoneRow, COL0 + 47, 20) != want) {
+                mismatch += "phone " + std::to_string(view) + ".2.1: '" +
+                            Field(phoneRow, COL0 + 47, 20) + "' want '" + want + "'\n";
+            }
+        }
+        if (!mismatch.empty()) {
+            std::this_thread::sleep_for(std::chrono::milliseconds(100));
+        }
+    } while (!mismatch.empty() && Clock::now() - settle < std::chrono::seconds(30));
+    const double settled = std::chrono::duration<double>(Clock::now() - settle).count();
+    EXPECT_EQ(mismatch, "") << session.Dump();
+
+    // The prompt still answers.
+    ASSERT_TRUE(commands.Run("bogus", std::chrono::seconds(30)).returned) << session.Dump();
+    EXPECT_EQ(commands.Result(), "Unrecgnized Command");
+    EXPECT_TRUE(session.StillRunning());
+
+    const std::string statsAfter = sim.Control("stats");
+    const long events = StatsField(statsAfter, "events") - StatsField(statsBefore, "events");
+    const std::optional<long> rssEnd = RssKiB(pid);
+    ASSERT_TRUE(baseline.has_value()) << "the drive ended before 10 s";
+    ASSERT_TRUE(rssEnd.has_value());
+    peak = std::max(peak, *rssEnd);
+    if (!UNDER_SANITIZER) {
+        EXPECT_LE(peak - *baseline, RSS_GROWTH_BOUND_KIB)
+            << "RSS " << *baseline << " KiB at 10 s, peak " << peak << " KiB";
+    }
+
+    const std::optional<std::string> errors = session.ReadErrLog();
+    ASSERT_TRUE(errors.has_value());
+    EXPECT_EQ(*errors, "") << "unexpected lines in lineprobe_err.log";
+
+    std::printf(
+        "soak: %.1f s, %ld control operations, %ld commands typed (slowest %lld ms), "
+        "%ld events (%.0f/s), rows settled %.2f s after the storm; RSS %ld KiB at 10 s, "
+        "peak %ld KiB, %ld KiB at the end\n",
+        drove, operations, typed, static_cast<long long>(slowestTyped.count()), events,
+        static_cast<double>(events) / drove, settled, *baseline, peak, *rssEnd);
+    RecordProperty("events", static_cast<int>(events));
+    RecordProperty("rss_growth_kib", static_cast<int>(peak - *baseline));
+}
+
+}  // namespace
+}  // namespace lineprobe::testing
