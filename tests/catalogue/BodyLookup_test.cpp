@@ -117,7 +117,22 @@ TEST(ClusterLookup, KnowsItsOwnAndTheServicesAnswers) {
     EXPECT_EQ(typeid(*own), typeid(tolk::Cluster::ClusterSlotAssign_t));
     std::unique_ptr<tolk::MsgBody> result(c.MsgBodyLookup(0x80002C));
     EXPECT_EQ(typeid(*result), typeid(tolk::ClusterMgr::ClusterResult_t));
+    std::unique_ptr<tolk::MsgBody> comp(c.MsgBodyLookup(0x800007));
+    EXPECT_EQ(typeid(*comp), typeid(tolk::ClusterMgr::ComponentResult_t));
     EXPECT_THROW(c.EvtBodyLookup(0x1230), Addressable::UndefinedEvtBody);
 }
+
+// The service's own commands are not in a cluster's table, nor the resource manager's.
+class ClusterForeignNumber : public ::testing::TestWithParam<unsigned int> {};
+
+TEST_P(ClusterForeignNumber, Raises) {
+    auto queue = newQueue();
+    tolk::Cluster c(kTarget, queue);
+    EXPECT_THROW(delete c.MsgBodyLookup(GetParam()), Addressable::UndefinedMsgBody);
+}
+
+INSTANTIATE_TEST_SUITE_P(ManagerCommands, ClusterForeignNumber,
+                         ::testing::Values(0x80001Du, 0x80001Eu, 0x800020u, 0x800024u, 0x800051u,
+                                           0x800052u, 0x800053u, 0x800059u, 0x80003Du, 0x12u));
 
 }  // namespace

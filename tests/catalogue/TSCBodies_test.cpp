@@ -226,6 +226,25 @@ TEST(TSCBodies, Key1203ListGetsOneTerminator) {
     EXPECT_TRUE(SameBytes(Bytes(e2.bytes.begin(), e2.bytes.begin() + e2.written), b));
 }
 
+TEST(TSCBodies, Key1203WithoutAListSendsATerminator) {
+    KV kv;
+    kv.Key = 0x1203;
+    kv.ByteLength = 0;
+    Bytes g;
+    u32(g, 0x1203);
+    u32(g, 0);
+    u32(g, 0);
+    u32(g, 0);
+    Encoded e = encode(kv);
+    EXPECT_EQ(e.size, 16u);
+    EXPECT_EQ(e.written, 16u);
+    EXPECT_TRUE(SameBytes(e.bytes, g));
+    KV back;
+    auto m = msgOf(g);
+    EXPECT_EQ(back.readMsg(m.get(), 0), 16u);
+    EXPECT_EQ(golden::text(back), "{Key 4611 ByteLength 0 Value {}}");
+}
+
 TEST(TSCBodies, Key1203WithoutTerminatorStopsAtTheEnd) {
     Bytes b;
     u32(b, 0x1203);

@@ -55,8 +55,11 @@ MsgBody* Cluster::MsgBodyLookup(unsigned int type) {
     if (MsgBody* body = Cluster_Bodies::msgLookup(type)) {
         return body;
     }
-    if (MsgBody* body = ClusterMgr_Bodies::msgLookup(type)) {
-        return body;
+    // Only the two answers a cluster shares with the service; the service's commands are not
+    // a cluster's to receive.
+    if (type == ClusterMgr_Bodies::ComponentResult_t::MsgType ||
+        type == ClusterMgr_Bodies::ClusterResult_t::MsgType) {
+        return ClusterMgr_Bodies::msgLookup(type);
     }
     return Addressable::MsgBodyLookup(type);
 }

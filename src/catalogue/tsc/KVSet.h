@@ -81,24 +81,28 @@ class KVSetRecord : public MsgBody {
     unsigned int writeMsg(Msg* m, unsigned int off) override {
         off = putFirst(m, off, 0x380000, &Key);
         off = putField(m, off, 0x380000, &ByteLength);
-        if (Key == 0 || Value == 0) {
-            return off;
-        }
-        if (Key == 0x1202) {
-            return reinterpret_cast<Value_Key_0x1202_t*>(Value)->writeMsg(m, off);
-        }
         if (Key == 0x1203) {
-            Records& l = *reinterpret_cast<Records*>(Value);
+            // A missing list is an empty one: the receiver still needs the terminator to
+            // know where the list ends.
             bool closed = false;
-            for (unsigned int i = 0; i < l.length() && !closed; ++i) {
-                off = l[i]->writeMsg(m, off);
-                closed = l[i]->isTerminator();
+            if (Value != 0) {
+                Records& l = records();
+                for (unsigned int i = 0; i < l.length() && !closed; ++i) {
+                    off = l[i]->writeMsg(m, off);
+                    closed = l[i]->isTerminator();
+                }
             }
             if (!closed) {
                 Value_Key_0x1203_t end;
                 off = end.writeMsg(m, off);
             }
             return off;
+        }
+        if (Key == 0 || Value == 0) {
+            return off;
+        }
+        if (Key == 0x1202) {
+            return reinterpret_cast<Value_Key_0x1202_t*>(Value)->writeMsg(m, off);
         }
         return putList<unsigned char>(m, off, 4, *reinterpret_cast<Bytes*>(Value), false);
     }
@@ -139,22 +143,21 @@ class KVSetRecord : public MsgBody {
     }
 
     unsigned int GetByteSize() override {
+        if (Key == 0x1203) {
+            unsigned int n = 8;
+            for (unsigned int i = 0; Value != 0 && i < records().length(); ++i) {
+                n += records()[i]->GetByteSize();
+                if (records()[i]->isTerminator()) {
+                    return n;
+                }
+            }
+            return n + 8;
+        }
         if (Key == 0 || Value == 0) {
             return 8;
         }
         if (Key == 0x1202) {
             return 8 + reinterpret_cast<Value_Key_0x1202_t*>(Value)->GetByteSize();
-        }
-        if (Key == 0x1203) {
-            Records& l = *reinterpret_cast<Records*>(Value);
-            unsigned int n = 8;
-            for (unsigned int i = 0; i < l.length(); ++i) {
-                n += l[i]->GetByteSize();
-                if (l[i]->isTerminator()) {
-                    return n;
-                }
-            }
-            return n + 8;
         }
         return 8 + reinterpret_cast<Bytes*>(Value)->length();
     }
@@ -178,6 +181,7 @@ class KVSetRecord : public MsgBody {
     ValueWord Value = 0;
 
   private:
+    Records& records() const { return *reinterpret_cast<Records*>(Value); }
     template <class V>
     void adopt(V* v) {
         owned_.adopt(&Value, v);
