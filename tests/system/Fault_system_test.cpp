@@ -126,8 +126,19 @@ class FaultRun : public ::testing::Test {
         ASSERT_EQ(answer.rfind("ok", 0), 0u) << line << ": " << answer;
     }
 
-    std::string Logs() {
-        return session.ReadLog().value_or("") + session.ReadErrLog().value_or("");
+    struct LogMark {
+        std::size_t out = 0;
+        std::size_t err = 0;
+    };
+    LogMark Mark() {
+        return {session.ReadLog().value_or("").size(), session.ReadErrLog().value_or("").size()};
+    }
+    // What both logs gained since the mark.
+    std::string Added(const LogMark& mark) {
+        const std::string out = session.ReadLog().value_or("");
+        const std::string err = session.ReadErrLog().value_or("");
+        return out.substr(std::min(mark.out, out.size())) +
+               err.substr(std::min(mark.err, err.size()));
     }
 
     // Types the command and checks that the prompt came back within what its requests may
@@ -198,10 +209,10 @@ TEST_F(FaultRun, RefusedSilentAndDroppedRelay) {
             if (!hit && !full) {
                 continue;
             }
-            const std::string before = Logs();
+            const LogMark before = Mark();
             ASSERT_TRUE(Type(c, "refused"));
             if (hit && c.reportsRefusal) {
-                const std::string added = Logs().substr(std::min(before.size(), Logs().size()));
+                const std::string added = Added(before);
                 EXPECT_NE(added.find("1ff"), std::string::npos)
                     << "no report of the refusal after '" << c.line << "':\n"
                     << added;
@@ -238,9 +249,9 @@ TEST_F(FaultRun, RefusedSilentAndDroppedRelay) {
             const bool hit = std::any_of(c.types.begin(), c.types.end(), [&](const std::string& t) {
                 return std::find(silenced.begin(), silenced.end(), t) != silenced.end();
             });
-            const std::string before = Logs();
+            const LogMark before = Mark();
             ASSERT_TRUE(Type(c, "silent"));
-            const std::string added = Logs().substr(std::min(before.size(), Logs().size()));
+            const std::string added = Added(before);
             if (hit && c.reportsTimeout) {
                 EXPECT_NE(added.find("imeout"), std::string::npos)
                     << "no report of the time-out after '" << c.line << "':\n"
@@ -266,9 +277,9 @@ TEST_F(FaultRun, RefusedSilentAndDroppedRelay) {
         if (!full && !c.shortForm) {
             continue;
         }
-        const std::string before = Logs();
+        const LogMark before = Mark();
         ASSERT_TRUE(Type(c, "dropped"));
-        const std::string added = Logs().substr(std::min(before.size(), Logs().size()));
+        const std::string added = Added(before);
         if (!c.types.empty() && c.reportsTimeout) {
             EXPECT_NE(added.find("imeout"), std::string::npos)
                 << "no report of the failure after '" << c.line << "':\n"
