@@ -384,6 +384,36 @@ TEST_F(EmulationTest, FlexibleRoutingJoinsTheSlotsOfTheTwoClusters) {
     rocCluster.request(0x800036, &un, 0x800000, nullptr);
 }
 
+TEST_F(EmulationTest, AttachingMediaPutsAFlexibleChannelInServiceAndDetachTakesItOut) {
+    Addressable tsc(cd(farm::channelComponentAddress(2, 1, 11, farm::kTSC)));
+    Tsc::MsgGetChanStateCmplt_t st;
+    tsc.request(0x120F, &getChan, 0x1210, &st);
+    EXPECT_EQ(st.ChanState, 13u);  // OutOfServiceMediaDetached
+    Tsc::MsgMakeCall_t mk;
+    setText(mk.DestAddr, "8005551000");
+    EXPECT_EQ(refusal(tsc, 0x1214, &mk, 0x1215), kErrOutOfService);
+
+    Tsc::MsgAttach_t attach;
+    attach.MediaInfo.realloc(2);
+    attach.MediaInfo[0]->ComponentType = 7;
+    attach.MediaInfo[0]->InstDesc = cd(farm::mediaAddress(2, 11, farm::Media::SigDet));
+    attach.MediaInfo[1]->ComponentType = 5;
+    attach.MediaInfo[1]->InstDesc = cd(farm::mediaAddress(2, 11, farm::Media::ToneGen));
+    attach.Count = 2;
+    tsc.request(0x1234, &attach, 0x1235, nullptr);
+    tsc.request(0x120F, &getChan, 0x1210, &st);
+    EXPECT_EQ(st.ChanState, 1u);
+    EXPECT_EQ(refusal(tsc, 0x1234, &attach, 0x1235), kErrBadState);  // already attached
+
+    Tsc::MsgDetach_t detach;
+    tsc.request(0x1236, &detach, 0x1237, nullptr);
+    tsc.request(0x120F, &getChan, 0x1210, &st);
+    EXPECT_EQ(st.ChanState, 13u);
+    // Media of a voice channel the board lacks is no media at all.
+    attach.MediaInfo[1]->InstDesc = cd(farm::mediaAddress(2, 40, farm::Media::ToneGen));
+    EXPECT_EQ(refusal(tsc, 0x1234, &attach, 0x1235), kErrNoSuchComponent);
+}
+
 TEST_F(EmulationTest, RefuseSilenceAndNormalOverrideOneMessageType) {
     Proxy tsc(cd(farm::channelComponentAddress(1, 2, 1, farm::kTSC)));
     Tsc::MsgGetChanStateCmplt_t st;
