@@ -69,6 +69,9 @@ RelayServer::~RelayServer() {
     if (wakeFd_ >= 0) {
         ::close(wakeFd_);
     }
+    if (spareFd_ >= 0) {
+        ::close(spareFd_);
+    }
 }
 
 bool RelayServer::listen(std::string& error) {
@@ -100,6 +103,7 @@ bool RelayServer::listen(std::string& error) {
 
     epollFd_ = epoll_create1(EPOLL_CLOEXEC);
     wakeFd_ = eventfd(0, EFD_NONBLOCK | EFD_CLOEXEC);
+    spareFd_ = ::open("/dev/null", O_RDONLY | O_CLOEXEC);
     if (epollFd_ < 0 || wakeFd_ < 0) {
         error = std::string("epoll/eventfd: ") + std::strerror(errno);
         return false;
@@ -205,8 +209,19 @@ void RelayServer::acceptAll() {
             if (errno == EINTR || errno == ECONNABORTED) {
                 continue;
             }
-            if (errno == EMFILE || errno == ENFILE) {
-                log_ << "vx7sim: out of descriptors, a connection waits" << std::endl;
+            if ((errno == EMFILE || errno == ENFILE) && spareFd_ >= 0) {
+                // Level-triggered: a connection left waiting would wake the loop at once, again
+                // and again. Refuse it with the spare descriptor and keep serving the others.
+                ::close(spareFd_);
+                int refused = ::accept4(listenFd_, nullptr, nullptr, SOCK_CLOEXEC);
+                if (refused >= 0) {
+                    ::close(refused);
+                }
+                spareFd_ = ::open("/dev/null", O_RDONLY | O_CLOEXEC);
+                log_ << "vx7sim: out of descriptors, refusing a connection" << std::endl;
+                if (refused >= 0) {
+                    continue;
+                }
             }
             return;
         }

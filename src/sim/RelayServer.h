@@ -83,6 +83,9 @@ class RelayServer {
     int listenFd_ = -1;
     int epollFd_ = -1;
     int wakeFd_ = -1;
+    // Held open so that, out of descriptors, a waiting connection can still be taken and closed
+    // instead of keeping the listening socket ready for ever.
+    int spareFd_ = -1;
     int port_ = 0;
     bool running_ = false;
     std::map<int, std::unique_ptr<Conn>> conns_;  // by descriptor

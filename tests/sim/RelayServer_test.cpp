@@ -4,6 +4,7 @@
 
 #include <arpa/inet.h>
 #include <netinet/in.h>
+#include <sys/resource.h>
 #include <sys/socket.h>
 #include <unistd.h>
 
@@ -379,6 +380,40 @@ TEST_F(RelayTest, DropClosesEveryConnectionAndNewOnesAreServedAfterwards) {
     EXPECT_TRUE(waitConnections(0));
     EXPECT_EQ(server->control("drop"), "ok dropped 0");
 
+    RawClient later(port);
+    later.send(later.open());
+    EXPECT_EQ(later.read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES).size(),
+              TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+}
+
+TEST_F(RelayTest, OutOfDescriptorsAWaitingConnectionIsRefusedAndTheOthersServed) {
+    RawClient served(port);
+    served.send(served.open());
+    ASSERT_EQ(served.read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES).size(),
+              TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+    ASSERT_TRUE(waitConnections(1));
+
+    // Leave the process exactly one free descriptor: the next client takes it, so the server
+    // cannot accept that client.
+    rlimit old{};
+    ASSERT_EQ(getrlimit(RLIMIT_NOFILE, &old), 0);
+    int lowestFree = ::dup(0);
+    ASSERT_GE(lowestFree, 0);
+    ::close(lowestFree);
+    rlimit tight = old;
+    tight.rlim_cur = static_cast<rlim_t>(lowestFree) + 1;
+    ASSERT_EQ(setrlimit(RLIMIT_NOFILE, &tight), 0);
+    bool closed = false;
+    {
+        RawClient waiting(port);
+        closed = waiting.connected && waiting.closedByServer();
+    }
+    ASSERT_EQ(setrlimit(RLIMIT_NOFILE, &old), 0);
+    EXPECT_TRUE(closed);
+    EXPECT_NE(logBuf.text().find("out of descriptors, refusing a connection"), std::string::npos);
+
+    // The loop is not left spinning on the listening socket, and serves new connections.
+    EXPECT_EQ(server->control("stats").rfind("ok stats", 0), 0u);
     RawClient later(port);
     later.send(later.open());
     EXPECT_EQ(later.read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES).size(),
