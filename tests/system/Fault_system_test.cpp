@@ -47,6 +47,10 @@ struct Command {
     // A time-out is written to the log. Opening a view tolerates a subscription that gets
     // no answer and says nothing of it.
     bool reportsTimeout = true;
+    // The command sends one of its types, not each: closing a view cancels by a list or by
+    // the group, as the component's events go. Its report is looked for only when all of
+    // its types fail at once.
+    bool oneOfTypes = false;
 };
 
 // The views open through the whole run are phone 1.1.1 and trunk 1.1. Phone 1.2.5 and trunk
@@ -72,8 +76,8 @@ const std::vector<Command>& Commands() {
         {"disablelbk 1 1", {"160e"}, 1, false},
         {"startrai 1 1", {"160c"}, 1, false},
         {"stoprai 1 1", {"1613"}, 1, false},
-        {"delphone 1 2 5", {"1a", "1c"}, 6, true},
-        {"deltrunk 1 2", {"1a", "1c"}, 6, false},
+        {"delphone 1 2 5", {"1a", "1c"}, 6, true, true, true, true},
+        {"deltrunk 1 2", {"1a", "1c"}, 6, false, true, true, true},
         {"phone 1 2 6", {"16", "18", "120d", "120f"}, 8, false, false, false},
         {"trunk 1 2", {"16", "18", "1602", "1608", "12"}, 12, false, false, false},
     };
@@ -211,7 +215,7 @@ TEST_F(FaultRun, RefusedSilentAndDroppedRelay) {
             }
             const LogMark before = Mark();
             ASSERT_TRUE(Type(c, "refused"));
-            if (hit && c.reportsRefusal) {
+            if (hit && c.reportsRefusal && (!c.oneOfTypes || !full)) {
                 const std::string added = Added(before);
                 EXPECT_NE(added.find("1ff"), std::string::npos)
                     << "no report of the refusal after '" << c.line << "':\n"
@@ -252,7 +256,7 @@ TEST_F(FaultRun, RefusedSilentAndDroppedRelay) {
             const LogMark before = Mark();
             ASSERT_TRUE(Type(c, "silent"));
             const std::string added = Added(before);
-            if (hit && c.reportsTimeout) {
+            if (hit && c.reportsTimeout && (!c.oneOfTypes || !full)) {
                 EXPECT_NE(added.find("imeout"), std::string::npos)
                     << "no report of the time-out after '" << c.line << "':\n"
                     << added;
