@@ -235,10 +235,19 @@ TEST(Soak, TenPhoneAndTenTrunkViewsUnderAnEventStorm) {
                 mismatch += "trunk " + std::to_string(view) + ".1:" + why + "\n";
             }
             const std::string& phoneRow = screen[static_cast<std::size_t>(PHONE_ROW0 + 1 + view)];
-            const std::string want = CallText(phones[static_cast<std::size_t>(view)]);
+            const CallExpect call = phones[static_cast<std::size_t>(view)];
+            const std::string want = CallText(call);
             if (Field(phoneRow, COL0 + 47, 20) != want) {
                 mismatch += "phone " + std::to_string(view) + ".2.1: '" +
                             Field(phoneRow, COL0 + 47, 20) + "' want '" + want + "'\n";
+            }
+            // An offered call came in; a far-end hang-up ends it normally.
+            const char* reason = call == CallExpect::Offered        ? "IncomingCall"
+                                 : call == CallExpect::Disconnected ? "Normal"
+                                                                    : nullptr;
+            if (reason != nullptr && Field(phoneRow, COL0 + 70, 25) != reason) {
+                mismatch += "phone " + std::to_string(view) + ".2.1 reason: '" +
+                            Field(phoneRow, COL0 + 70, 25) + "' want '" + reason + "'\n";
             }
         }
         if (!mismatch.empty()) {
