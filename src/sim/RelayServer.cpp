@@ -215,10 +215,10 @@ void RelayServer::acceptAll() {
                 ::close(spareFd_);
                 int refused = ::accept4(listenFd_, nullptr, nullptr, SOCK_CLOEXEC);
                 if (refused >= 0) {
+                    log_ << "vx7sim: out of descriptors, refusing a connection" << std::endl;
                     ::close(refused);
                 }
                 spareFd_ = ::open("/dev/null", O_RDONLY | O_CLOEXEC);
-                log_ << "vx7sim: out of descriptors, refusing a connection" << std::endl;
                 if (refused >= 0) {
                     continue;
                 }

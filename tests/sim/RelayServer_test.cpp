@@ -393,6 +393,17 @@ TEST_F(RelayTest, OutOfDescriptorsAWaitingConnectionIsRefusedAndTheOthersServed)
               TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
     ASSERT_TRUE(waitConnections(1));
 
+    // The server has logged before, so that writing its log needs no new descriptor (a
+    // sanitizer's first check of the stream's type opens a pipe).
+    {
+        RawClient bad(port);
+        bad.send(bad.open());
+        bad.read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+        bad.send(std::vector<unsigned char>{0, 0, 0x03, 0xE9, 0, 0, 0, 0, 0, 0, 0, 12, 0, 0, 0, 0,
+                                            0, 0, 0,    0,    1, 2, 3, 4, 5, 6, 7, 8,  9, 0, 1, 2});
+        ASSERT_TRUE(bad.closedByServer());
+    }
+
     // Leave the process exactly one free descriptor: the next client takes it, so the server
     // cannot accept that client.
     rlimit old{};
