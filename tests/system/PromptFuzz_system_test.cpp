@@ -147,6 +147,7 @@ TEST(PromptFuzz, RandomLinesNeitherCrashNorBreakTheLayout) {
         recent.clear();
         // One batch is typed at once, each line ended by a carriage return as the Enter
         // key sends it.
+        const auto batchStart = Clock::now();
         std::string batch;
         for (int i = 0; i < 40 && typed < lines; ++i, ++typed) {
             recent.push_back(maker.Next());
@@ -160,7 +161,17 @@ TEST(PromptFuzz, RandomLinesNeitherCrashNorBreakTheLayout) {
                                                  std::chrono::seconds(60));
         std::string last;
         for (const std::string& line : recent) {
-            last += "  [" + line + "]\n";
+            std::string shown;
+            for (const char c : line.substr(0, 60)) {
+                shown += c >= ' ' && c < 0x7f ? std::string(1, c) : std::string("?");
+            }
+            last += "  [" + shown + (line.size() > 60 ? "..." : "") + "]\n";
+        }
+        // A batch that held the prompt for seconds waited on the board: worth seeing.
+        const auto batchTook = Clock::now() - batchStart;
+        if (batchTook > std::chrono::seconds(3)) {
+            std::printf("batch ending at line %ld took %.1f s:\n%s", typed,
+                        std::chrono::duration<double>(batchTook).count(), last.c_str());
         }
         ASSERT_TRUE(session.StillRunning()) << "after the lines:\n" << last << session.Dump();
         ASSERT_TRUE(read) << "the prompt stopped reading; last lines:\n" << last << session.Dump();
