@@ -193,3 +193,26 @@ TEST(PromptFuzz, RandomLinesNeitherCrashNorBreakTheLayout) {
 
 }  // namespace
 }  // namespace lineprobe::testing
+
+namespace lineprobe::testing {
+namespace {
+
+// Found by the prompt fuzz: a board number that is not one of the farm's must not open a
+// view on whichever board its low eight bits name.
+TEST(PromptBoardNumbers, ATrunkViewOfANumberPastTheBoardsIsRefused) {
+    TerminalOptions options;
+    options.unsetEnv = {"REMOTE_TKHOST", "VX7_FARM", "CORVO_ORVANE_DIR"};
+    TerminalSession session(options);
+    ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
+    TimedRunner commands(session);
+    // 257 and -255 are board 1 of the built-in farm when cut to eight bits.
+    for (const char* line : {"trunk 257 1", "trunk -255 1"}) {
+        ASSERT_TRUE(commands.Run(line, std::chrono::seconds(30)).returned) << session.Dump();
+        EXPECT_EQ(commands.Result(), "ERROR - unable to create trunk view") << line << "\n"
+                                                                            << session.Dump();
+    }
+    EXPECT_TRUE(session.StillRunning());
+}
+
+}  // namespace
+}  // namespace lineprobe::testing
