@@ -7,10 +7,12 @@
 #include <cstdint>
 #include <sstream>
 #include <string>
+#include <type_traits>
 #include <utility>
 #include <vector>
 
 #include "FakeBoard.h"
+#include "catalogue/stdresource/StdResource.h"
 #include "framework/MsgQueue.h"
 #include "framework/String.h"
 #include "transport/IsaSync.h"
@@ -25,6 +27,13 @@ class Quick : public T {
     explicit Quick(A&&... a) : T(std::forward<A>(a)...) {
         this->ResponseTimeout = 300;
         this->ErrorWaitTime = 100;
+    }
+    // As the most derived class, it ends the delivery of stray messages before its own part
+    // goes, as every class of the resource family does.
+    ~Quick() override {
+        if constexpr (std::is_base_of_v<tolk::StdResource, T>) {
+            this->endDispatch();
+        }
     }
 };
 

@@ -26,6 +26,10 @@ void CAS::registerNullHandlers() {
     asyncRegisterMsgType(0x1416, static_cast<EvtCallback::MsgFn>(nullptr), 0);
 }
 
+CAS::~CAS() {
+    endDispatch();
+}
+
 MsgBody* CAS::MsgBodyLookup(unsigned int type) {
     if (MsgBody* body = CAS_Bodies::msgLookup(type)) {
         return body;

@@ -13,6 +13,7 @@ class CAS : public Instance, public CAS_Bodies {
     explicit CAS(const Instance& other);
     CAS(const CAS& other);
     CAS& operator=(const CAS&) = delete;
+    ~CAS() override;
 
     MsgBody* MsgBodyLookup(unsigned int type) override;
     MsgBody* EvtBodyLookup(unsigned int group) override;

@@ -8,6 +8,10 @@ CHP::CHP(const StdResource& other) : StdResource(other) {}
 
 CHP::CHP(const CHP& other) : StdResource(other), CHP_Bodies() {}
 
+CHP::~CHP() {
+    endDispatch();
+}
+
 // Past StdResource on purpose: not even the standard numbers are known here.
 MsgBody* CHP::MsgBodyLookup(unsigned int type) {
     return StdResource::superMsgBodyLookup(type);

@@ -13,6 +13,7 @@ class CHP : public StdResource, public CHP_Bodies {
     explicit CHP(const StdResource& other);
     CHP(const CHP& other);
     CHP& operator=(const CHP&) = delete;
+    ~CHP() override;
 
     MsgBody* MsgBodyLookup(unsigned int type) override;
     MsgBody* EvtBodyLookup(unsigned int group) override;

@@ -8,6 +8,10 @@ Component::Component(const StdResource& other) : StdResource(other) {}
 
 Component::Component(const Component& other) : StdResource(other) {}
 
+Component::~Component() {
+    endDispatch();
+}
+
 MsgBody* Component::MsgBodyLookup(unsigned int type) {
     return StdResource::MsgBodyLookup(type);
 }

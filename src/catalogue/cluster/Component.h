@@ -11,6 +11,7 @@ class Component : public StdResource {
     explicit Component(const StdResource& other);
     Component(const Component& other);
     Component& operator=(const Component&) = delete;
+    ~Component() override;
 
     MsgBody* MsgBodyLookup(unsigned int type) override;
     MsgBody* EvtBodyLookup(unsigned int group) override;

@@ -24,6 +24,10 @@ void LCON::registerNullHandlers() {
     asyncRegisterMsgType(0x1611, static_cast<EvtCallback::MsgFn>(nullptr), 0);
 }
 
+LCON::~LCON() {
+    endDispatch();
+}
+
 MsgBody* LCON::MsgBodyLookup(unsigned int type) {
     if (MsgBody* body = LCON_Bodies::msgLookup(type)) {
         return body;

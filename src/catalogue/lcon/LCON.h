@@ -14,6 +14,7 @@ class LCON : public Instance, public LCON_Bodies {
     explicit LCON(const Instance& other);
     LCON(const LCON& other);
     LCON& operator=(const LCON&) = delete;
+    ~LCON() override;
 
     MsgBody* MsgBodyLookup(unsigned int type) override;
     MsgBody* EvtBodyLookup(unsigned int group) override;

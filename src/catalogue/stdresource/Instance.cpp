@@ -27,6 +27,10 @@ Instance::Instance(const Instance& other) : StdResource(other) {}
 
 Instance::Instance(const TmpInstance& other, int) : StdResource(other) {}
 
+Instance::~Instance() {
+    endDispatch();
+}
+
 MsgBody* Instance::MsgBodyLookup(unsigned int type) {
     return StdResource::MsgBodyLookup(type);
 }
@@ -49,6 +53,7 @@ TmpInstance::TmpInstance(const CompDesc_t& target, isa::RefPtr<MsgQueue>& q)
 TmpInstance::TmpInstance(const TmpInstance& other) : Instance(other, 0) {}
 
 TmpInstance::~TmpInstance() {
+    endDispatch();
     freeOnDestroy = 0;
     inUse = 0;
     eventsDetected = 0;

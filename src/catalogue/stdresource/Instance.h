@@ -19,6 +19,7 @@ class Instance : public StdResource {
     Instance(const Instance& other);
     Instance(const TmpInstance& other, int);
     Instance& operator=(const Instance&) = delete;
+    ~Instance() override;
 
     MsgBody* MsgBodyLookup(unsigned int type) override;
     MsgBody* EvtBodyLookup(unsigned int group) override;

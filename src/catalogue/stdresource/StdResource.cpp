@@ -29,6 +29,7 @@ StdResource::StdResource(const StdResource& other) : Addressable(other), StdReso
 }
 
 StdResource::~StdResource() {
+    endDispatch();
     if (eventsDetected != 0) {
         try {
             CancelAllEvts(static_cast<Addressable*>(nullptr));

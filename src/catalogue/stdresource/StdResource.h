@@ -113,6 +113,14 @@ class StdResource : public Addressable, public StdResource_Bodies {
   protected:
     friend class ResourceMgr;
 
+    // Ends the delivery of unsolicited messages to this object. Every destructor of the family
+    // calls it first, so that the reader thread never calls into an object whose most derived
+    // part is already gone.
+    void endDispatch() {
+        delete evtCallback;
+        evtCallback = nullptr;
+    }
+
     // The id and return address that the event operations give for `target`.
     unsigned int eventId(const Addressable* target) const;
     CompDesc_t eventRetAddr(const Addressable* target) const;

@@ -18,6 +18,10 @@ void TSC::registerNullHandlers() {
     asyncRegisterMsgType(0x1220, static_cast<EvtCallback::MsgFn>(nullptr), 0);
 }
 
+TSC::~TSC() {
+    endDispatch();
+}
+
 MsgBody* TSC::MsgBodyLookup(unsigned int type) {
     if (MsgBody* body = TSC_Bodies::msgLookup(type)) {
         return body;

@@ -15,6 +15,7 @@ class TSC : public Instance, public TSC_Bodies {
     explicit TSC(const Instance& other);
     TSC(const TSC& other);
     TSC& operator=(const TSC&) = delete;
+    ~TSC() override;
 
     MsgBody* MsgBodyLookup(unsigned int type) override;
     MsgBody* EvtBodyLookup(unsigned int group) override;

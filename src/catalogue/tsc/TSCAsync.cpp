@@ -6,6 +6,10 @@ TSCAsync::TSCAsync(const CompDesc_t& target, isa::RefPtr<MsgQueue>& q) : TSC(tar
     ErrorWaitTime = AsyncErrorWaitTime;
 }
 
+TSCAsync::~TSCAsync() {
+    endDispatch();
+}
+
 TSCAsync::TSCAsync(const Instance& other) : TSC(other) {
     ErrorWaitTime = AsyncErrorWaitTime;
 }

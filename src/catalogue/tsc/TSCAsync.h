@@ -11,6 +11,7 @@ class TSCAsync : public TSC {
 
     TSCAsync(const CompDesc_t& target, isa::RefPtr<MsgQueue>& queue);
     explicit TSCAsync(const Instance& other);
+    ~TSCAsync() override;
 };
 
 }  // namespace tolk
