@@ -1,6 +1,7 @@
 #include "model/Trunk.h"
 
 #include <iostream>
+#include <string>
 
 #include "catalogue/stdresource/StdResource.h"
 #include "framework/Msg.h"
@@ -13,6 +14,7 @@ namespace vx7diag {
 namespace {
 
 constexpr unsigned char kLconType = 22;
+constexpr unsigned int kLastAddressableBoard = 0xFF;
 constexpr unsigned int kOutOfServiceReason = 4;
 constexpr unsigned int kAllAlarms = 0x1600;
 
@@ -62,6 +64,12 @@ int Read(Work&& work) {
 
 Trunk::Trunk(unsigned int boardNumber, unsigned int trunk) {
     tolk::tolkInit();
+    // An address holds the board in one byte: a larger number (or a negative one typed at the
+    // prompt) would wrap onto a board that does exist and open a view of the wrong line.
+    if (boardNumber > kLastAddressableBoard) {
+        throw BoardFailure("Trunk::Trunk() board " + std::to_string(boardNumber) +
+                           " is out of range");
+    }
     tolk::Board board(boardNumber);
     RegisterTrunkHandlers(board);
     tolk::Cluster cluster = Captured([&] { return board.findClustByLCON(trunk); });

@@ -27,6 +27,13 @@ TEST_F(TrunkTest, AbsentLineIsNoTrunk) {
     EXPECT_THROW(Trunk(1, 3), vx7diag::BoardFailure);
 }
 
+// 257 and the unsigned form of -255 both end in the byte 1: they must not reach board 1's line.
+TEST_F(TrunkTest, BoardNumbersPastTheAddressByteAreRefusedNotWrapped) {
+    EXPECT_NO_THROW(Trunk(1, 1));
+    EXPECT_THROW(Trunk(257, 1), vx7diag::BoardFailure);
+    EXPECT_THROW(Trunk(static_cast<unsigned int>(-255), 1), vx7diag::BoardFailure);
+}
+
 TEST_F(TrunkTest, ServiceChangesTheLineState) {
     Trunk trunk(1, 1);
     unsigned int state = 0, reason = 0;
