@@ -257,9 +257,12 @@ void* TKSMsgQueue::readNroute(void*, void*) {
         try {
             status = transport->msgRead(&block);
         } catch (const TKSRemoteService_ComFailure& f) {
-            std::cerr << "ERROR: TKSMsgQueue: lost the relay connection to " << f.getHostName()
-                      << " port " << f.getPort()
-                      << "; this queue receives nothing more and its requests will time out"
+            // The name is the relay as the user gave it, with its port when one was given.
+            std::cerr << "ERROR: TKSMsgQueue: lost the relay connection to " << f.getHostName();
+            if (std::strchr(f.getHostName(), ':') == nullptr) {
+                std::cerr << " port " << f.getPort();
+            }
+            std::cerr << "; this queue receives nothing more and its requests will time out"
                       << std::endl;
             {
                 std::lock_guard<std::mutex> lk(waitLock);

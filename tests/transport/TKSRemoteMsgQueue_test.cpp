@@ -261,6 +261,10 @@ TEST(RemoteQueue, BrokenConnectionMidFrameIsReportedOnceAndRequestsTimeOut) {
     std::size_t first = err.find("lost the relay connection");
     ASSERT_NE(std::string::npos, first) << err;
     EXPECT_EQ(std::string::npos, err.find("lost the relay connection", first + 1));
+    // The relay is named as it was given, host and port, and its port is not repeated.
+    std::string lost = err.substr(first, err.find('\n', first) - first);
+    EXPECT_NE(std::string::npos, lost.find("to " + relay.address() + ";")) << lost;
+    EXPECT_EQ(std::string::npos, lost.find(" port ")) << lost;
 }
 
 TEST(RemoteQueue, RefusedOpenIsACreationError) {
