@@ -11,8 +11,8 @@
 #include <string>
 #include <thread>
 
+#include "EchoPeers.h"
 #include "platform/tkhost/tkhost.h"
-#include "transport/TKSFrame.h"
 #include "transport/TKSMsgQueue.h"
 #include "transport/TKSSock.h"
 
@@ -106,21 +106,7 @@ void BM_MsgQueueRoundTrip_Local(benchmark::State& state) {
     TKQueueHandle peer = tkQueueOpen();
     TKCompDesc peerAddr{};
     tkQueueBind(peer, &peerAddr);
-    std::thread responder([peer, peerAddr] {
-        for (;;) {
-            TKMsg32Bit* m = nullptr;
-            if (tkMsgRead(peer, 0, &m) != TK_OK) {
-                return;
-            }
-            TKCompDesc from{};
-            tkMsgFieldGet(m, TK_FIELD_SRC, &from);
-            tkMsgFieldPut(m, TK_FIELD_TGT, &from);
-            TKCompDesc self = peerAddr;
-            tkMsgFieldPut(m, TK_FIELD_SRC, &self);
-            m->type = kCompletion;
-            tkMsgWrite(peer, m, 0);
-        }
-    });
+    std::thread responder([peer] { lp_bench::serveEchoQueue(peer, kCompletion); });
     roundTrips(state, q, peerAddr);
     tkQueueUnbind(peer, peerAddr);
     responder.join();
@@ -133,55 +119,7 @@ void BM_MsgQueueRoundTrip_Relay(benchmark::State& state) {
     listener.bind();
     listener.listen(1);
     std::string where = "127.0.0.1:" + std::to_string(listener.localPort());
-    std::thread relay([&listener] {
-        std::unique_ptr<sock> conn(listener.accept());
-        if (!conn) {
-            return;
-        }
-        msg_t open;
-        if (conn->get_msg(open) != 0) {
-            return;
-        }
-        free_msg(open);
-        TKCompDesc assigned{};
-        assigned.board = 0xFE;
-        assigned.instance = 1;
-        unsigned char body[TKS_ASSIGNED_BODY_BYTES];
-        tksEncodeAssigned(assigned, body);
-        msg_t a;
-        a.type = TKS_FRAME_ASSIGNED;
-        a.size = TKS_ASSIGNED_BODY_BYTES;
-        a.body = body;
-        conn->snd_msg(a);
-        std::vector<unsigned char> out;
-        for (;;) {
-            msg_t m;
-            if (conn->get_msg(m) != 0) {
-                return;
-            }
-            if (m.type == TKS_FRAME_CLOSE) {
-                free_msg(m);
-                msg_t ack;
-                ack.type = TKS_FRAME_CLOSE_ACK;
-                conn->snd_msg(ack);
-                return;
-            }
-            TKMsg32Bit* b = tksBlockFromFrame(m);
-            free_msg(m);
-            if (b == nullptr) {
-                continue;
-            }
-            TKCompDesc from{}, to{};
-            tkMsgFieldGet(b, TK_FIELD_SRC, &from);
-            tkMsgFieldGet(b, TK_FIELD_TGT, &to);
-            tkMsgFieldPut(b, TK_FIELD_SRC, &to);
-            tkMsgFieldPut(b, TK_FIELD_TGT, &from);
-            b->type = kCompletion;
-            tksEncodeMessageFrame(b, out);
-            tkMsgFree(b);
-            conn->writeblock(out.data(), static_cast<long>(out.size()));
-        }
-    });
+    std::thread relay([&listener] { lp_bench::serveEchoRelay(listener, kCompletion); });
     {
         TKSMsgQueue q(TKCompDesc{}, 512, 5, where.c_str());
         TKCompDesc target{};
