@@ -198,7 +198,10 @@ INSTANTIATE_TEST_SUITE_P(Keys, PhoneKeyTest,
                          ::testing::Values(KeyCase{1, 1, 23, "1.1.23"}, KeyCase{10, 2, 3, "10.2.3"},
                                            KeyCase{static_cast<unsigned int>(-1), 1, 1, "-1.1.1"},
                                            KeyCase{UINT_MAX / 2, 2147483648u, 2147483648u,
-                                                   "2147483647.-2147483648.-2147483648"}));
+                                                   "2147483647.-2147483648.-2147483648"}),
+                         [](const ::testing::TestParamInfo<KeyCase>& info) {
+                             return "Case" + std::to_string(info.index);
+                         });
 
 }  // namespace
 }  // namespace lineprobe
