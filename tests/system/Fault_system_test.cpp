@@ -45,7 +45,8 @@ struct Command {
     // that says it already is; any other refusal leaves no line by design.
     bool reportsRefusal = true;
     // A time-out is written to the log. Opening a view tolerates a subscription that gets
-    // no answer and says nothing of it.
+    // no answer and says nothing of it; a one-way command waits only for a refusal, so a
+    // board that says nothing has, to it, accepted.
     bool reportsTimeout = true;
     // The command sends one of its types, not each: closing a view cancels by a list or by
     // the group, as the component's events go. Its report is looked for only when all of
@@ -60,10 +61,10 @@ struct Command {
 const std::vector<Command>& Commands() {
     static const std::vector<Command> commands = {
         {"makecall 1 1 1", {"1214"}, 1, true},
-        {"answer 1 1 1", {"1201"}, 1, false},
-        {"accept 1 1 1", {"1200"}, 1, false},
-        {"drop 1 1 1", {"120a"}, 1, false},
-        {"release 1 1 1", {"121c"}, 1, false},
+        {"answer 1 1 1", {"1201"}, 1, false, true, false},
+        {"accept 1 1 1", {"1200"}, 1, false, true, false},
+        {"drop 1 1 1", {"120a"}, 1, false, true, false},
+        {"release 1 1 1", {"121c"}, 1, false, true, false},
         {"reset 1 1 1", {"1246"}, 1, false},
         {"chan_oos 1 1 1", {"121f"}, 1, true},
         {"chan_ins 1 1 1", {"121f"}, 1, false},
@@ -75,7 +76,7 @@ const std::vector<Command>& Commands() {
         {"payloadlbk 1 1", {"160e"}, 1, false},
         {"disablelbk 1 1", {"160e"}, 1, false},
         {"startrai 1 1", {"160c"}, 1, false},
-        {"stoprai 1 1", {"1613"}, 1, false},
+        {"stoprai 1 1", {"1613"}, 1, false, true, false},
         {"delphone 1 2 5", {"1a", "1c"}, 6, true, true, true, true},
         {"deltrunk 1 2", {"1a", "1c"}, 6, false, true, true, true},
         {"phone 1 2 6", {"16", "18", "120d", "120f"}, 8, false, false, false},
