@@ -14,7 +14,8 @@ namespace vx7diag {
 namespace {
 
 constexpr unsigned char kLconType = 22;
-constexpr unsigned int kLastAddressableBoard = 0xFF;
+// Boards are the device map's logical ids, 0 to 32.
+constexpr unsigned int kLastBoard = 32;
 constexpr unsigned int kOutOfServiceReason = 4;
 constexpr unsigned int kAllAlarms = 0x1600;
 
@@ -65,8 +66,9 @@ int Read(Work&& work) {
 Trunk::Trunk(unsigned int boardNumber, unsigned int trunk) {
     tolk::tolkInit();
     // An address holds the board in one byte: a larger number (or a negative one typed at the
-    // prompt) would wrap onto a board that does exist and open a view of the wrong line.
-    if (boardNumber > kLastAddressableBoard) {
+    // prompt) would wrap onto a board that does exist and open a view of the wrong line. Past
+    // the last board nothing can answer either, so it is refused before a request waits for it.
+    if (boardNumber > kLastBoard) {
         throw BoardFailure("Trunk::Trunk() board " + std::to_string(boardNumber) +
                            " is out of range");
     }

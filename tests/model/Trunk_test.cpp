@@ -28,8 +28,9 @@ TEST_F(TrunkTest, AbsentLineIsNoTrunk) {
 }
 
 // 257 and the unsigned form of -255 both end in the byte 1: they must not reach board 1's line.
-TEST_F(TrunkTest, BoardNumbersPastTheAddressByteAreRefusedNotWrapped) {
+TEST_F(TrunkTest, BoardNumbersPastTheLastBoardAreRefusedNotWrapped) {
     EXPECT_NO_THROW(Trunk(1, 1));
+    EXPECT_THROW(Trunk(33, 1), vx7diag::BoardFailure);
     EXPECT_THROW(Trunk(257, 1), vx7diag::BoardFailure);
     EXPECT_THROW(Trunk(static_cast<unsigned int>(-255), 1), vx7diag::BoardFailure);
 }
