@@ -181,9 +181,12 @@ class Reader {
                      "R2MFP or CALLERID" +
                          (s ? ", not " + quoted(s->get()) : std::string()));
             }
-            auto i = static_cast<std::size_t>(*media);
+            // value(), not *: fail() does not return, but the optimizer of a sanitizer build
+            // cannot always see that and would warn of an unset value.
+            const Media named = media.value();
+            auto i = static_cast<std::size_t>(named);
             if (seen[i]) {
-                fail(item.source(), "media lists " + std::string(mediaName(*media)) + " twice");
+                fail(item.source(), "media lists " + std::string(mediaName(named)) + " twice");
             }
             seen[i] = true;
         }
