@@ -25,7 +25,7 @@ SystemView::SystemView() {
         systemName = new std::string(name);
     }
 
-    for (unsigned int logicalId = 0; logicalId <= MAX_LOGICAL_ID; ++logicalId) {
+    for (unsigned int logicalId = 0; logicalId <= BoardManager::LAST_LOGICAL_ID; ++logicalId) {
         char platform[4] = {'V', 'X', '7', '\0'};
         std::uint32_t id = logicalId;
         um_attribute search[2]{};

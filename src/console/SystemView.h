@@ -12,9 +12,6 @@ class BoardManager;
 // later is not seen. The managers are never freed.
 class SystemView {
   public:
-    // Logical board numbers tried, from 0 up to and including this one.
-    static constexpr unsigned int MAX_LOGICAL_ID = 32;
-
     SystemView();
     ~SystemView();
     SystemView(const SystemView&) = delete;

@@ -30,6 +30,8 @@ struct m {
 // (GetBoard() is null), no name, no trunks, no flexible routing.
 class BoardManager {
   public:
+    // Boards are the device map's logical ids, 0 up to and including this one.
+    static constexpr unsigned int LAST_LOGICAL_ID = 32;
     static constexpr int DIGITAL_BOARD = 1;
     static constexpr int ANALOG_BOARD = 2;
 

@@ -7,6 +7,7 @@
 #include "framework/Msg.h"
 #include "framework/tolk.h"
 #include "model/Board.h"
+#include "model/BoardManager.h"
 #include "model/Guarded.h"
 
 namespace vx7diag {
@@ -14,8 +15,6 @@ namespace vx7diag {
 namespace {
 
 constexpr unsigned char kLconType = 22;
-// Boards are the device map's logical ids, 0 to 32.
-constexpr unsigned int kLastBoard = 32;
 constexpr unsigned int kOutOfServiceReason = 4;
 constexpr unsigned int kAllAlarms = 0x1600;
 
@@ -68,7 +67,7 @@ Trunk::Trunk(unsigned int boardNumber, unsigned int trunk) {
     // An address holds the board in one byte: a larger number (or a negative one typed at the
     // prompt) would wrap onto a board that does exist and open a view of the wrong line. Past
     // the last board nothing can answer either, so it is refused before a request waits for it.
-    if (boardNumber > kLastBoard) {
+    if (boardNumber > BoardManager::LAST_LOGICAL_ID) {
         throw BoardFailure("Trunk::Trunk() board " + std::to_string(boardNumber) +
                            " is out of range");
     }
