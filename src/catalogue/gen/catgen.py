@@ -23,12 +23,16 @@ A field is <Label>:<type> with <type> one of
   @Ops(X)                          hand-written field: cat::Ops<Outer>::ops, argument field X
 
 Output (deterministic, no timestamps): <outdir>/catalogue/generated/<name>_bodies.{h,cpp}
-for each class and <outdir>/catalogue/generated/index.{h,cpp} listing every body.
+for each class, <outdir>/catalogue/generated/index.{h,cpp} listing every body, and
+<outdir>/catalogue/generated/vx7relay.lua, the Wireshark decoder of the relay protocol
+(written by luagen.py from the same tables).
 """
 
 import os
 import re
 import sys
+
+import luagen
 
 FORMAT_VERSION = 3
 
@@ -526,6 +530,8 @@ def main(argv):
     ih, isrc = index_files(classes, headers)
     write_if_changed(os.path.join(outdir, "index.h"), ih)
     write_if_changed(os.path.join(outdir, "index.cpp"), isrc)
+    schemas = [os.path.basename(p) for p in argv[2:]]
+    write_if_changed(os.path.join(outdir, "vx7relay.lua"), luagen.dissector(classes, schemas))
     return 0
 
 
