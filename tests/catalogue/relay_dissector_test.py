@@ -295,7 +295,8 @@ def check_shapes(frames):
     check(alarms.get(p + "State") == ["1", "0"], "alarm states")
     p = "vx7relay.LCON.Std_MsgGetVParmCmplt_t.Parms_t."
     check(vparm.get(p + "Parm") == ["4", "5"], "descriptor-shaped: Parm")
-    check(vparm.get(p + "Val") == ["77", "1", "2", "3"], f"descriptor-shaped: {vparm.get(p + 'Val')}")
+    check(vparm.get(p + "Val") == ["77", "1", "2", "3"],
+          f"descriptor-shaped values {vparm.get(p + 'Val')}")
     check(info.get("vx7relay.compdesc.component") == ["2", "18", "20"], "counted addresses")
     check(info.get("vx7relay.Cluster.ClusterCompInfoResult_t.count") == ["2"], "address count")
     check(find.get("vx7relay.compattr.key") == ["3"], "attribute key")
@@ -371,7 +372,8 @@ def check_session(frames, seen):
         check(one(m, p + "OrigAddr") == "5551212", "MakeCall OrigAddr")
         check(one(m, p + "CallProgress") == "1", "MakeCall CallProgress")
         check(one(m, "vx7relay.msg.trans") == str(MAKECALL_TRANS), "MakeCall transaction id")
-        check(one(m, "vx7relay.msg.type") == "0x00001214", f"MakeCall type {one(m, 'vx7relay.msg.type')}")
+        check(one(m, "vx7relay.msg.type") == "0x00001214",
+              f"MakeCall type {one(m, 'vx7relay.msg.type')}")
         for k, v in TSC_1_1_1.items():
             check(one(m, f"vx7relay.msg.tgt.{k}") == str(v), f"MakeCall target {k}")
         for k, v in me.items():

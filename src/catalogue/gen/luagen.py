@@ -81,8 +81,10 @@ class Emitter:
                 return f'{{{lab}, k="list", {ref}, elem="compattr"}}'
             decl = next((e for e in body.elems if e.name == f.elem), None)
             if decl is None:  # hand-written element: its shape is not in the tables
-                return f'{{{lab}, k="opaque", what={lua_str(f.text)}, f={self.pf("bytes", ab, f.label)}}}'
-            return f'{{{lab}, k="list", {ref}, elem={self.desc(decl, body, f"{prefix}.{decl.name}")}}}'
+                pf = self.pf("bytes", ab, f.label)
+                return f'{{{lab}, k="opaque", what={lua_str(f.text)}, f={pf}}}'
+            elem = self.desc(decl, f"{prefix}.{decl.name}")
+            return f'{{{lab}, k="list", {ref}, elem={elem}}}'
         if f.kind == "DescValue":
             return f'{{{lab}, k="dcv", {ref}, f={self.pf("uint32", ab, f.label, "base.DEC")}}}'
         if f.kind == "Custom" and f.custom == "ErrorData":
@@ -92,12 +94,12 @@ class Emitter:
             for e in body.elems:
                 tail = e.name[len(f"{f.label}_{f.ref_name}_") : -2]
                 if e.name.startswith(f"{f.label}_{f.ref_name}_0x") and e.name.endswith("_t"):
-                    recs.append(f"[{int(tail, 16)}]={self.desc(e, body, f'{prefix}.{e.name}')}")
+                    recs.append(f"[{int(tail, 16)}]={self.desc(e, f'{prefix}.{e.name}')}")
             pf = self.pf("uint32", ab, f.label, "base.DEC")
             return f'{{{lab}, k="errordata", {ref}, records={{{", ".join(recs)}}}, f={pf}}}'
         return f'{{{lab}, k="opaque", what={lua_str(f.text)}, f={self.pf("bytes", ab, f.label)}}}'
 
-    def desc(self, b, outer, prefix):
+    def desc(self, b, prefix):
         fields = ",\n    ".join(self.field(f, b, prefix) for f in b.fields)
         mw = sum(f.min_wire() for f in b.fields)
         return f"{{name={lua_str(b.name)}, min={mw}, fields={{\n    {fields}}}}}"
@@ -113,12 +115,13 @@ def dissector(classes, schemas):
         msgs = []
         evts = []
         for b in c.bodies:
-            d = em.desc(b, None, f"vx7relay.{c.name}.{b.name}")
+            d = em.desc(b, f"vx7relay.{c.name}.{b.name}")
             (msgs if b.role == "msg" else evts).append(f"[0x{b.number:X}]={d}")
+        sep = ",\n  "
         tables.append(
             f"{{name={lua_str(c.name)}, component={comp_s}, instance={inst_s},\n"
-            f"  msg={{\n  {(','+chr(10)+'  ').join(msgs)}}},\n"
-            f"  evt={{\n  {(','+chr(10)+'  ').join(evts)}}}}}"
+            f"  msg={{\n  {sep.join(msgs)}}},\n"
+            f"  evt={{\n  {sep.join(evts)}}}}}"
         )
     comps = ", ".join(
         f"[{v[0]}]={lua_str(k)}" for k, v in CLASS_ADDRESS.items() if v[1] is None
@@ -375,7 +378,9 @@ local function decode_dcv(tree, tvb, off, f, vals)
   if not need(tree, tvb, off, n * w, f.label) then return off, false end
   if n == 1 then
     local it = tree:add(f.f, tvb(off, w), tvb(off, w):uint())
-    if signed then it:append_text(string.format(" (signed %d)", elem_value(tvb(off, w), w, true))) end
+    if signed then
+      it:append_text(string.format(" (signed %d)", elem_value(tvb(off, w), w, true)))
+    end
     return off + w, true
   end
   local st = tree:add(tvb(off, n * w), string.format("%s (%d elements of type %d)", f.label, n, t))
