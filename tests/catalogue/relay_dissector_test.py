@@ -11,6 +11,7 @@ client sent and received. Exit 77 (skipped) only when tshark is not installed.
 """
 
 import os
+import random
 import select
 import shutil
 import socket
@@ -308,12 +309,38 @@ def check_shapes(frames):
           f"KVSet bytes {one(answer, 'vx7relay.TSC.MsgAnswerCall_t.KVSet')}")
 
 
+RANDOM_FRAMES = 300
+
+
+def random_segments():
+    """Random bodies of every catalogue number range, to any kind of resource, events among
+    them: the decoder has to stop at each body's end without a Lua error."""
+    rnd = random.Random(6554)
+    types = [*range(0, 0x31), *range(0x1200, 0x1250), *range(0x1400, 0x1420),
+             *range(0x1600, 0x161A), *range(0x800000, 0x800064)]
+    groups = [0x1200, 0x1201, 0x1217, 0x121B, 0x121C, 0x121D, 0x1230, 0x1250, 0x1260, 0x126B,
+              0x1402, 0x1405, 0x1600, 0x1611, 0x1616, 5, 6]
+    me = dict(node=0, board=0, processor=0, component=0, instance=1)
+    segs = []
+    for i in range(RANDOM_FRAMES):
+        res = dict(node=0, board=1, processor=1, component=rnd.choice([0, 2, 18, 19, 20, 22]),
+                   instance=rnd.choice([1, 5, 8, 33]))
+        body = bytes(rnd.randrange(256) for _ in range(rnd.choice([0, 1, 3, 4, 8, 14, 40, 300])))
+        mtype = 0x20 if rnd.random() < 0.3 else rnd.choice(types)
+        if mtype == 0x20 and len(body) >= 4:
+            body = struct.pack(">I", rnd.choice(groups)) + body[4:]
+        src, tgt = (me, res) if rnd.random() < 0.5 else (res, me)
+        segs.append(("c", message(mtype, i, src, tgt, body)))
+    return segs
+
+
 # ---------------------------------------------------------------- decoding
 
 
 def decode(tshark, lua, cap, extra=()):
     cmd = [tshark, "-n", "-X", f"lua_script:{lua}", *extra, "-r", cap, "-T", "pdml"]
-    r = subprocess.run(cmd, capture_output=True, text=True, timeout=120)
+    # tshark cuts long labels inside a UTF-8 sequence, so random text can end in half of one.
+    r = subprocess.run(cmd, capture_output=True, text=True, errors="replace", timeout=240)
     if r.returncode != 0:
         raise RuntimeError(f"tshark failed ({r.returncode}): {r.stderr}")
     check("Lua Error" not in r.stdout + r.stderr, "tshark reports a Lua error")
@@ -451,12 +478,15 @@ def main(argv):
         p.connection(40000, RELAY_PORT, session, [])
         p.connection(40001, RELAY_PORT, malformed_segments(), [])
         p.connection(40002, RELAY_PORT, shape_segments(), [])
+        p.connection(40003, RELAY_PORT, random_segments(), [])
         with open(cap, "wb") as f:
             f.write(p.out)
         frames = decode(tshark, lua, cap)
         check_session([f for f in frames if one(f, "stream") == "0"], seen)
         check_malformed([f for f in frames if one(f, "stream") == "1"])
         check_shapes([f for f in frames if one(f, "stream") == "2"])
+        decoded = len([f for f in frames if one(f, "stream") == "3"])
+        check(decoded == RANDOM_FRAMES, f"{decoded} of {RANDOM_FRAMES} random frames decoded")
 
         # The same session on another port: decoded only once the preference names it.
         moved = os.path.join(tmp, "moved.pcap")
