@@ -3,8 +3,6 @@
 #include <poll.h>
 #include <unistd.h>
 
-#include <chrono>
-
 #include "console/ConsoleDisplay.h"
 #include "console/Curses.h"
 #include "console/DisplayGuard.h"
@@ -20,16 +18,31 @@ constexpr int KEY_POLL_INTERVAL_MS = 250;
 // Wake-ups that report input yet yield no key; this many in a row mean the input is gone.
 constexpr int MAX_EMPTY_WAKEUPS = 40;
 
-bool IsEndOfLine(int key) {
-    return key == '\n' || key == '\r' || key == KEY_ENTER;
-}
-
-bool IsErase(int key) {
-    return key == KEY_BACKSPACE || key == 127 || key == '\b';
-}
-
-bool IsPrintable(int key) {
-    return key >= 0x20 && key < 0x7f;
+// The editor's code for a key as curses reports it; 0, which the editor ignores, for the
+// function keys it has no use for.
+int EditorKey(int key) {
+    switch (key) {
+        case KEY_ENTER:
+            return '\n';
+        case KEY_LEFT:
+            return LineEditor::Left;
+        case KEY_RIGHT:
+            return LineEditor::Right;
+        case KEY_HOME:
+            return LineEditor::Home;
+        case KEY_END:
+            return LineEditor::End;
+        case KEY_UP:
+            return LineEditor::Up;
+        case KEY_DOWN:
+            return LineEditor::Down;
+        case KEY_BACKSPACE:
+            return LineEditor::Backspace;
+        case KEY_DC:
+            return LineEditor::Delete;
+        default:
+            return key >= 0 && key <= 0xff ? key : 0;
+    }
 }
 
 }  // namespace
@@ -56,8 +69,8 @@ int ConsoleWindow::SetWindow(WindowHandle window) {
 
 void ConsoleWindow::Refresh() {
     DisplayGuard guard;
-    if (refreshEnabled_ && !display_->IsSuspended()) {
-        wrefresh(window_);
+    if (refreshEnabled_) {
+        display_->RefreshWindow(window_);
     }
 }
 
@@ -122,17 +135,20 @@ void ConsoleWindow::EnableRefresh() {
 
 ConsoleWindow::LineStatus ConsoleWindow::ReadLine(std::string& line, std::size_t maxLength) {
     line.clear();
+    int row = 0;
+    int col = 0;
     {
         DisplayGuard guard;
         if (window_ == nullptr) {
             return LineStatus::InputClosed;
         }
-        nodelay(window_, TRUE);
-        keypad(window_, TRUE);
+        row = getcury(window_);
+        col = getcurx(window_);
+        editor_.Start(maxLength);
+        display_->SetCursorWindow(window_);
         Refresh();
     }
 
-    std::size_t shown = 0;
     int emptyWakeups = 0;
     for (;;) {
         pollfd input{STDIN_FILENO, POLLIN, 0};
@@ -144,41 +160,22 @@ ConsoleWindow::LineStatus ConsoleWindow::ReadLine(std::string& line, std::size_t
 
         DisplayGuard guard;
         bool gotKey = false;
-        for (int key = wgetch(window_); key != ERR; key = wgetch(window_)) {
+        for (int key = display_->ReadKey(); key != ERR; key = display_->ReadKey()) {
             gotKey = true;
-            if (IsEndOfLine(key)) {
-                const int nextRow = getcury(window_) + 1;
+            if (editor_.Feed(EditorKey(key)) == LineEditor::Result::Entered) {
+                line = editor_.Line();
+                const int nextRow = row + 1;
                 if (nextRow < getmaxy(window_)) {
                     wmove(window_, nextRow, 0);
                 }
                 Refresh();
                 return LineStatus::Complete;
             }
-            if (IsErase(key)) {
-                if (line.empty()) {
-                    continue;
-                }
-                line.pop_back();
-                // Only the characters that fitted on the row were shown; erase one of
-                // them only when the line is no longer than what is on screen.
-                const int col = getcurx(window_);
-                if (display_->IsEchoOn() && col > 0 && line.size() < shown) {
-                    mvwaddch(window_, getcury(window_), col - 1, ' ');
-                    wmove(window_, getcury(window_), col - 1);
-                    --shown;
-                }
-                continue;
-            }
-            if (!IsPrintable(key) || line.size() >= maxLength) {
-                continue;
-            }
-            line.push_back(static_cast<char>(key));
-            if (display_->IsEchoOn() && getcurx(window_) < getmaxx(window_) - 1) {
-                waddch(window_, static_cast<chtype>(key));
-                ++shown;
-            }
         }
-        Refresh();
+        if (gotKey) {
+            DrawLine(row, col);
+            Refresh();
+        }
 
         if (ready > 0 && !gotKey) {
             if (++emptyWakeups >= MAX_EMPTY_WAKEUPS) {
@@ -188,6 +185,19 @@ ConsoleWindow::LineStatus ConsoleWindow::ReadLine(std::string& line, std::size_t
             emptyWakeups = 0;
         }
     }
+}
+
+void ConsoleWindow::DrawLine(int row, int col) {
+    if (!display_->IsEchoOn()) {
+        return;
+    }
+    // The window's last column lies one past a terminal of the smallest width: the line
+    // ends one column short of it.
+    const int width = getmaxx(window_) - 1 - col;
+    const LineEditor::Visible shown = editor_.Show(width > 0 ? static_cast<std::size_t>(width) : 0);
+    mvwaddnstr(window_, row, col, shown.text.c_str(), static_cast<int>(shown.text.size()));
+    wclrtoeol(window_);
+    wmove(window_, row, col + static_cast<int>(shown.cursor));
 }
 
 }  // namespace lineprobe

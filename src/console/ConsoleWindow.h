@@ -4,6 +4,7 @@
 #include <cstddef>
 #include <string>
 
+#include "console/LineEditor.h"
 #include "console/WindowHandle.h"
 
 namespace lineprobe {
@@ -37,13 +38,15 @@ class ConsoleWindow {
 
     // Reads one line typed into this window, at the cursor, without ever holding the
     // display lock while waiting for a key, so that other threads can draw meanwhile.
-    // Printable characters are kept up to `maxLength` (the rest of a longer line is
-    // dropped) and echoed while they fit on the cursor's row; backspace edits; other
-    // control characters and function keys are ignored. When the line ends the cursor
-    // moves to the start of the next row, as a curses line read leaves it.
+    // The line is edited as in a shell (see LineEditor); lines read before are recalled
+    // with Up and Down. A line longer than the rest of the row scrolls within it. At most
+    // `maxLength` characters are kept. When the line ends the cursor moves to the start
+    // of the next row, as a curses line read leaves it.
     LineStatus ReadLine(std::string& line, std::size_t maxLength);
 
   private:
+    void DrawLine(int row, int col);
+
     WindowHandle window_ = nullptr;
     [[maybe_unused]] int rows_;
     [[maybe_unused]] int cols_;
@@ -51,6 +54,8 @@ class ConsoleWindow {
     [[maybe_unused]] int startRow_;
     ConsoleDisplay* display_;
     std::atomic<bool> refreshEnabled_{true};
+    // Keeps the lines typed into this window for recall; used by the main thread only.
+    LineEditor editor_;
 };
 
 }  // namespace lineprobe

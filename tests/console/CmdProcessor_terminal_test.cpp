@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <string>
+#include <utility>
 
 #include "ConsoleScreen.h"
 #include "TerminalSession.h"
@@ -125,7 +126,7 @@ TEST_F(PromptTest, LineOfAThousandCharactersIsCutSafely) {
 
 TEST_F(PromptTest, ControlCharactersAndKeysAreIgnored) {
     session_.Type("bo");
-    session_.SendKeys({"C-a", "C-e", "Tab", "Escape", "Left", "Up", "F1", "C-l"});
+    session_.SendKeys({"Escape", "F1", "C-l", "C-g", "NPage", "IC"});
     session_.Type("gus");
     EXPECT_TRUE(session_.WaitForRow(PROMPT_ROW, "  -> bogus")) << session_.Dump();
 
@@ -133,6 +134,100 @@ TEST_F(PromptTest, ControlCharactersAndKeysAreIgnored) {
     ASSERT_TRUE(WaitForLookups("Calling CmdProcessor::FindCommand: cmdStr= bogus", 1))
         << session_.Dump();
     EXPECT_TRUE(session_.WaitForRow(RESULT_ROW, "  Unrecgnized Command")) << session_.Dump();
+    EXPECT_TRUE(session_.StillRunning());
+}
+
+TEST_F(PromptTest, TabSeparatesFields) {
+    session_.Type("bogus");
+    for (const char* number : {"1", "2", "3"}) {
+        session_.SendKeys({"Tab"});
+        session_.Type(number);
+    }
+    EXPECT_TRUE(session_.WaitForRow(PROMPT_ROW, "  -> bogus 1 2 3")) << session_.Dump();
+    Enter("", "bogus");
+    EXPECT_TRUE(HasLine(*session_.ReadLog(), "validArgs: 4"));
+    EXPECT_TRUE(session_.StillRunning());
+}
+
+TEST_F(PromptTest, CursorKeysEditWithinTheLine) {
+    session_.Type("ogs 1");
+    session_.SendKeys({"Home"});
+    session_.Type("b");
+    EXPECT_TRUE(session_.WaitForRow(PROMPT_ROW, "  -> bogs 1")) << session_.Dump();
+    // The cursor stands where the next character goes: after the "b".
+    EXPECT_EQ(session_.Cursor(), std::make_pair(PROMPT_ROW, PROMPT_COL + 4)) << session_.Dump();
+
+    session_.SendKeys({"Right", "Right"});
+    session_.Type("u");
+    session_.SendKeys({"End", "Left", "BSpace"});
+    session_.Type("2");
+    EXPECT_TRUE(session_.WaitForRow(PROMPT_ROW, "  -> bogus21")) << session_.Dump();
+    EXPECT_EQ(session_.Cursor(), std::make_pair(PROMPT_ROW, PROMPT_COL + 3 + 6)) << session_.Dump();
+
+    Enter("", "bogus21");
+    EXPECT_TRUE(HasLine(*session_.ReadLog(), "validArgs: 1"));
+    EXPECT_TRUE(session_.StillRunning());
+}
+
+TEST_F(PromptTest, CtrlUAndCtrlWKillBehindTheCursor) {
+    session_.Type("wrong words bogus");
+    session_.SendKeys({"Left", "Left", "Left", "Left", "Left", "C-u"});
+    EXPECT_TRUE(session_.WaitForRow(PROMPT_ROW, "  -> bogus")) << session_.Dump();
+    session_.SendKeys({"End"});
+    session_.Type(" 1 2 oops");
+    session_.SendKeys({"C-w", "C-w"});
+    EXPECT_TRUE(session_.WaitForRow(PROMPT_ROW, "  -> bogus 1")) << session_.Dump();
+    // Ctrl-U is not text: the line holds the word and one number.
+    Enter("", "bogus");
+    EXPECT_TRUE(HasLine(*session_.ReadLog(), "validArgs: 2"));
+    EXPECT_TRUE(session_.StillRunning());
+}
+
+TEST_F(PromptTest, UpAndDownRecallEarlierLines) {
+    Enter("bogus 1", "bogus");
+    Enter("other 1 2", "other");
+    session_.Type("draft");
+    session_.SendKeys({"Up"});
+    EXPECT_TRUE(session_.WaitForRow(PROMPT_ROW, "  -> other 1 2")) << session_.Dump();
+    session_.SendKeys({"Up"});
+    EXPECT_TRUE(session_.WaitForRow(PROMPT_ROW, "  -> bogus 1")) << session_.Dump();
+    session_.SendKeys({"Down"});
+    EXPECT_TRUE(session_.WaitForRow(PROMPT_ROW, "  -> other 1 2")) << session_.Dump();
+    session_.SendKeys({"Down"});
+    EXPECT_TRUE(session_.WaitForRow(PROMPT_ROW, "  -> draft")) << session_.Dump();
+
+    // A recalled line runs again as typed.
+    session_.SendKeys({"C-u", "Up", "Up"});
+    EXPECT_TRUE(session_.WaitForRow(PROMPT_ROW, "  -> bogus 1")) << session_.Dump();
+    Enter("", "bogus", 2);
+    const std::string log = *session_.ReadLog();
+    EXPECT_EQ(CountLines(log, "validArgs: 2"), 2u) << log;
+    EXPECT_TRUE(session_.StillRunning());
+}
+
+TEST_F(PromptTest, LongLineScrollsWithinItsRow) {
+    std::string line = "bogus 1 2 3 ";
+    while (line.size() < 150) {
+        line += "abcdefghij";
+    }
+    // The window's last column lies past the terminal: the line has the 95 columns from
+    // the one after the prompt up to the terminal's last but one.
+    constexpr std::size_t SHOWN = 95;
+    const int firstCol = PROMPT_COL + 3;
+    session_.Type(line);
+    EXPECT_TRUE(session_.WaitForRow(PROMPT_ROW, "  -> " + line.substr(line.size() - (SHOWN - 1))))
+        << session_.Dump();
+    EXPECT_EQ(session_.Cursor(),
+              std::make_pair(PROMPT_ROW, firstCol + static_cast<int>(SHOWN) - 1));
+    EXPECT_TRUE(session_.WaitForRow(RESULT_ROW, "")) << session_.Dump();
+
+    session_.SendKeys({"Home"});
+    EXPECT_TRUE(session_.WaitForRow(PROMPT_ROW, "  -> " + line.substr(0, SHOWN)))
+        << session_.Dump();
+    EXPECT_EQ(session_.Cursor(), std::make_pair(PROMPT_ROW, firstCol));
+
+    Enter("", "bogus");
+    EXPECT_TRUE(HasLine(*session_.ReadLog(), "validArgs: 5"));
     EXPECT_TRUE(session_.StillRunning());
 }
 

@@ -248,6 +248,26 @@ void TerminalSession::SendKeys(const std::vector<std::string>& keys) {
     Tmux(args);
 }
 
+void TerminalSession::Resize(int rows, int cols) {
+    int status = 0;
+    Tmux({"resize-window", "-t", SESSION, "-x", std::to_string(cols), "-y", std::to_string(rows)},
+         &status);
+    if (status != 0) {
+        throw std::runtime_error("tmux could not resize the window");
+    }
+    rows_ = rows;
+    cols_ = cols;
+}
+
+std::pair<int, int> TerminalSession::Cursor() {
+    const std::string position = PaneFormat("#{cursor_y} #{cursor_x}");
+    std::istringstream fields(position);
+    int row = -1;
+    int col = -1;
+    fields >> row >> col;
+    return {row, col};
+}
+
 std::vector<std::string> TerminalSession::Screen() {
     const std::vector<std::string> capture = {"capture-pane", "-p", "-t", SESSION};
     std::istringstream lines(Tmux(capture));

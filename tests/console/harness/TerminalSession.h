@@ -64,6 +64,12 @@ class TerminalSession {
     // tmux key names: "Enter", "BSpace", "C-a", "Escape", "Left", "q", ...
     void SendKeys(const std::vector<std::string>& keys);
 
+    // Resizes the terminal, as an operator dragging its corner would: the program gets
+    // SIGWINCH. Screen() and Row() read the new size from then on.
+    void Resize(int rows, int cols);
+    // Where the terminal's cursor stands: {row, column}.
+    std::pair<int, int> Cursor();
+
     // The screen, one string per row, each padded with blanks to the full width.
     std::vector<std::string> Screen();
     std::string Row(int row);
