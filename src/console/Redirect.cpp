@@ -23,10 +23,11 @@ std::streambuf* sbuf_cerr = nullptr;
 
 namespace {
 
-// Longest a writer waits for another to finish its line. Only a thread stuck in write(2) on a
-// full disk, or a signal handler that interrupted the holder on its own thread, waits that
-// long; the shutdown's trace must reach the file all the same, so the line then goes out
-// without the lock, still in a single write to an append-only descriptor.
+// Longest a writer waits for another to finish its line. Only a holder stuck in write(2) (a log
+// on a hung file system), or one that a signal handler interrupted on its own thread just as
+// it took or gave up the lock, keeps it that long; the shutdown's trace must reach the file all
+// the same, so the line then goes out without the lock, still in a single write to an
+// append-only descriptor.
 constexpr std::chrono::milliseconds kWriteWait{1000};
 
 // A line that grows past this without an end goes out as it is, so that a runaway trace
@@ -42,8 +43,8 @@ class LogFile {
     LogFile& operator=(const LogFile&) = delete;
 
     void Write(const char* data, std::size_t size) {
-        std::unique_lock<std::timed_mutex> guard(lock, std::defer_lock);
-        if (owner.load() != std::this_thread::get_id() && guard.try_lock_for(kWriteWait)) {
+        const bool locked = owner.load() != std::this_thread::get_id() && Lock();
+        if (locked) {
             owner.store(std::this_thread::get_id());
         }
         while (size > 0) {
@@ -57,13 +58,37 @@ class LogFile {
             data += written;
             size -= static_cast<std::size_t>(written);
         }
-        if (guard.owns_lock()) {
+        if (locked) {
             owner.store(std::thread::id{});
+            lock.unlock();
         }
     }
 
   private:
-    std::timed_mutex lock;
+    // Polls rather than using a timed lock: the standard library's timed wait goes through a
+    // call that thread checkers do not follow. A holder keeps the lock for one write(2), so a
+    // few yields nearly always do; past them the wait sleeps in short steps.
+    bool Lock() {
+        if (lock.try_lock()) {
+            return true;
+        }
+        const auto deadline = std::chrono::steady_clock::now() + kWriteWait;
+        for (unsigned int tries = 0;; ++tries) {
+            if (tries < 64) {
+                std::this_thread::yield();
+            } else {
+                std::this_thread::sleep_for(std::chrono::microseconds(200));
+            }
+            if (lock.try_lock()) {
+                return true;
+            }
+            if (std::chrono::steady_clock::now() >= deadline) {
+                return false;
+            }
+        }
+    }
+
+    std::mutex lock;
     std::atomic<std::thread::id> owner{};
     int fd;
 };
