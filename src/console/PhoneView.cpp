@@ -41,8 +41,16 @@ int PhoneView::Start() {
 
     // Watch before reading: an event that comes while the state is read then shows on
     // the row, whichever of the two is the later.
-    publisher->Attach(observerRef, callStateAspect);
-    publisher->Attach(observerRef, chanStateAspect);
+    const bool callsFollowed = publisher->Attach(observerRef, callStateAspect);
+    const bool chanFollowed = publisher->Attach(observerRef, chanStateAspect);
+    // The command still reports the view as made, and the row shows the state read below;
+    // what failed is in the trace log, this says what it costs.
+    if (!callsFollowed || !chanFollowed) {
+        std::cerr << "phone view " << board << "." << line << "." << chan
+                  << ": subscription to the board's events failed, the view will not follow "
+                     "the board"
+                  << std::endl;
+    }
 
     GetCurrentPhoneState();
     phone->Start();

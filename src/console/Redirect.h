@@ -14,8 +14,10 @@ extern std::ofstream* ferr;
 extern std::streambuf* sbuf_cout;
 extern std::streambuf* sbuf_cerr;
 
-// Points std::cout or std::cerr at a file of the working directory, truncating it.
-// False for any other stream or when the file cannot be opened.
+// Points std::cout or std::cerr at a file of the working directory, truncating it. Every
+// line then reaches the file whole and once, whichever threads write at the same time: a
+// thread's text is held until it ends its line. False for any other stream or when the file
+// cannot be opened.
 bool Redirect(std::ostream& stream, const char* fileName);
 
 }  // namespace lineprobe

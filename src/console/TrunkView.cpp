@@ -38,9 +38,17 @@ int TrunkView::Start() {
     trunkStateAspect = AspectInstanceFactory::GetTrunkStateAspectInstance();
 
     std::cout << "TrunkView::STart() - attachig AllAlarms Aspect" << std::endl;
-    publisher->Attach(observerRef, allAlarmsAspect);
+    const bool alarmsFollowed = publisher->Attach(observerRef, allAlarmsAspect);
     std::cout << "TrunkView::STart() - attachig TrunkState Aspect" << std::endl;
-    publisher->Attach(observerRef, trunkStateAspect);
+    const bool stateFollowed = publisher->Attach(observerRef, trunkStateAspect);
+    // The command still reports the view as made; what failed is in the trace log, this
+    // says what it costs.
+    if (!alarmsFollowed || !stateFollowed) {
+        std::cerr << "trunk view " << board << "." << line
+                  << ": subscription to the board's events failed, the view will not follow "
+                     "the board"
+                  << std::endl;
+    }
 
     std::cout << "TrunkView::STart() - Displaying Trunk View string" << std::endl;
     if (view != nullptr) {

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cstring>
 #include <iostream>
+#include <optional>
 
 #include "catalogue/lcon/LCON.h"
 #include "model/Guarded.h"
@@ -231,10 +232,15 @@ int BoardManager::RetrieveTrunkInfo() {
 int BoardManager::RetrieveAnalogTrunkInfo() {
     RunGuarded(std::cout, "", [&] {
         for (unsigned int i = 1; i <= kMaxTrunks; ++i) {
-            // No cluster for line i raises here: the normal end of the walk.
-            tolk::Cluster cluster = Captured([&] { return board->findClustByLCON(i); });
+            // The board refusing the search for line i is the normal end of the walk, and
+            // nothing to log; silence or another answer still is.
+            std::optional<tolk::Cluster> cluster =
+                FoundOrRefused([&] { return board->findClustByLCON(i); });
+            if (!cluster) {
+                return;
+            }
             SetNumberOfTrunks(static_cast<int>(i));
-            tolk::TmpInstance instance = Captured([&] { return cluster.find(kLconType); });
+            tolk::TmpInstance instance = Captured([&] { return cluster->find(kLconType); });
             tolk::LCON lcon(instance);
             m record;
             record.trunkType = static_cast<int>(ParmValue(lcon, kParmTrunkType));

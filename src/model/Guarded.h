@@ -1,12 +1,15 @@
 #pragma once
 
 #include <exception>
+#include <optional>
 #include <ostream>
 #include <sstream>
 #include <stdexcept>
 #include <string>
 
+#include "framework/Addressable.h"
 #include "framework/Exception.h"
+#include "framework/Msg.h"
 #include "transport/TKSCommon.h"
 
 namespace vx7diag {
@@ -30,6 +33,24 @@ decltype(auto) Captured(Work&& work) {
         text << e;
         throw BoardFailure(text.str());
     }
+}
+
+// Runs one search for which the board's refusal (a MsgError_t in place of the result) is an
+// answer: there is nothing to find. That gives an empty result; silence or any other reply is a
+// failure and comes out as Captured makes it.
+template <class Work>
+auto FoundOrRefused(Work&& work) -> std::optional<decltype(work())> {
+    return Captured([&]() -> std::optional<decltype(work())> {
+        try {
+            return work();
+        } catch (const tolk::Addressable::UnexpectedMsg& e) {
+            const tolk::Msg* reply = e.getMsg();
+            if (reply != nullptr && reply->getMsgType() == 0) {
+                return std::nullopt;
+            }
+            throw;
+        }
+    });
 }
 
 // Runs `work`; an exception that a board's answer, silence or absence can raise is written to

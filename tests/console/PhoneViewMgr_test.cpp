@@ -4,7 +4,9 @@
 
 #include <climits>
 #include <cstdlib>
+#include <iostream>
 #include <map>
+#include <sstream>
 #include <string>
 #include <tuple>
 #include <vector>
@@ -180,6 +182,37 @@ TEST_F(PhoneViewMgrTest, DestroyAllStopsEveryViewAndLeavesTheRows) {
     for (PhoneView* stopped : left) {
         delete stopped;
     }
+}
+
+// What is written to std::cerr, the error log, while it lives.
+class ErrLog {
+  public:
+    ErrLog() : saved(std::cerr.rdbuf(text.rdbuf())) {}
+    ~ErrLog() { std::cerr.rdbuf(saved); }
+    std::string Text() const { return text.str(); }
+
+  private:
+    std::ostringstream text;
+    std::streambuf* saved;
+};
+
+TEST_F(PhoneViewMgrTest, ViewWhoseSubscriptionFailedSaysSoInTheErrorLog) {
+    // The channel's event subscription is refused; the view is made and drawn all the same.
+    sim::builtinControl("refuse 18");
+    std::string failed;
+    {
+        ErrLog err;
+        EXPECT_EQ(Open(1, 1, 4), PHONEVIEWMGR_SUCCESS);
+        failed = err.Text();
+    }
+    sim::builtinControl("normal 18");
+    EXPECT_EQ(LabelRow("1.1.4"), 1);
+    EXPECT_NE(failed.find("1.1.4"), std::string::npos) << failed;
+    EXPECT_NE(failed.find("will not follow the board"), std::string::npos) << failed;
+
+    ErrLog err;
+    EXPECT_EQ(Open(1, 1, 5), PHONEVIEWMGR_SUCCESS);
+    EXPECT_EQ(err.Text(), "");
 }
 
 struct KeyCase {

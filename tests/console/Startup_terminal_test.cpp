@@ -114,6 +114,18 @@ TEST(Startup, RegistersTheCommandsOfTheTableInOrder) {
     EXPECT_TRUE(session.StillRunning());
 }
 
+// The analog board of the default farm ends its line walk on the board's refusal, as it
+// should: that is no failure, and the trace says none.
+TEST(Startup, WalkingTheBoardsLogsNoFailure) {
+    TerminalSession session;
+
+    ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
+    ASSERT_TRUE(session.WaitForLogLine("lineprobe.log", "command name: stoprai"));
+    const std::optional<std::string> log = session.ReadLog();
+    ASSERT_TRUE(log);
+    EXPECT_EQ(log->find("UnexpectedMsg"), std::string::npos) << *log;
+}
+
 TEST(Startup, BothLogsStartEmptyOnEachRun) {
     TerminalSession session(TerminalOptions()
                                 .File("lineprobe.log", "stale trace line\n")

@@ -3,6 +3,8 @@
 #include <gtest/gtest.h>
 
 #include <cstdlib>
+#include <iostream>
+#include <sstream>
 #include <string>
 #include <utility>
 #include <vector>
@@ -137,6 +139,25 @@ TEST_F(TrunkViewMgrTest, DeleteGivesTheLowestRowBack) {
     EXPECT_EQ(manager.DestroyTrunkView(1, 1), TRUNKVIEWMGR_ERROR);
     ASSERT_EQ(Open(2, 3), TRUNKVIEWMGR_SUCCESS);
     EXPECT_EQ(LabelRow("2.3"), 1);
+}
+
+TEST_F(TrunkViewMgrTest, ViewWhoseSubscriptionFailedSaysSoInTheErrorLog) {
+    std::ostringstream failed;
+    std::streambuf* saved = std::cerr.rdbuf(failed.rdbuf());
+    // The line's event subscription is refused; the view is made and drawn all the same.
+    sim::builtinControl("refuse 16");
+    EXPECT_EQ(Open(3, 1), TRUNKVIEWMGR_SUCCESS);
+    sim::builtinControl("normal 16");
+    std::cerr.rdbuf(saved);
+    EXPECT_EQ(LabelRow("3.1"), 1);
+    EXPECT_NE(failed.str().find("3.1"), std::string::npos) << failed.str();
+    EXPECT_NE(failed.str().find("will not follow the board"), std::string::npos) << failed.str();
+
+    std::ostringstream quiet;
+    saved = std::cerr.rdbuf(quiet.rdbuf());
+    EXPECT_EQ(Open(3, 2), TRUNKVIEWMGR_SUCCESS);
+    std::cerr.rdbuf(saved);
+    EXPECT_EQ(quiet.str(), "");
 }
 
 TEST(TrunkViewMgrKey, KeyHoldsAnyTwoNumbersAsSignedDecimals) {

@@ -2,9 +2,12 @@
 
 #include <gtest/gtest.h>
 
+#include <string>
 #include <vector>
 
 #include "SimFixture.h"
+#include "model/Board.h"
+#include "model/Guarded.h"
 #include "platform/farm/Addresses.h"
 
 namespace {
@@ -58,6 +61,28 @@ TEST_F(DefaultFarm, AnalogBoardIsWalkedLineByLine) {
         EXPECT_EQ(manager.GetSignalingType(trunk), 4);
     }
     EXPECT_EQ(manager.GetNumChannelsOnTrunk(3), 0);
+}
+
+TEST_F(DefaultFarm, AnalogWalkEndsOnTheRefusalWithoutLoggingIt) {
+    CaptureOut out;
+    BoardManager manager(3);
+    EXPECT_EQ(manager.GetNumberOfTrunks(), 2);
+    EXPECT_EQ(out.Text().find("UnexpectedMsg"), std::string::npos) << out.Text();
+}
+
+// The walk's end is told from a failure by the answer: only a refusal means "no such line".
+TEST_F(DefaultFarm, OnlyARefusedSearchFindsNothing) {
+    tolk::Board board(3);
+    EXPECT_TRUE(vx7diag::FoundOrRefused([&] { return board.findClustByLCON(2); }).has_value());
+    EXPECT_FALSE(vx7diag::FoundOrRefused([&] { return board.findClustByLCON(3); }).has_value());
+
+    Silence(0x800053);
+    try {
+        vx7diag::FoundOrRefused([&] { return board.findClustByLCON(3); });
+        ADD_FAILURE() << "a search nobody answered counted as refused";
+    } catch (const vx7diag::BoardFailure& e) {
+        EXPECT_NE(std::string(e.what()).find("Timeout"), std::string::npos) << e.what();
+    }
 }
 
 TEST_F(DefaultFarm, FlexibleRoutingMapsVoiceChannelsInOrder) {
