@@ -1,6 +1,7 @@
 // `help` hands the terminal to the pager and gets the screen back whole.
 #include <gtest/gtest.h>
 
+#include <filesystem>
 #include <string>
 
 #include "ConsoleScreen.h"
@@ -51,6 +52,28 @@ TEST(HelpTerminal, PagerShowsTheHelpFileAndQuitReturnsToAnIntactScreen) {
     EXPECT_TRUE(session.WaitForRow(RESULT_ROW, "  Unrecgnized Command")) << session.Dump();
     EXPECT_EQ(session.ReadErrLog(), std::optional<std::string>(""));
     EXPECT_TRUE(session.StillRunning());
+}
+
+TEST(HelpTerminal, DirectoryReachesThePagerAsOnePathNeverAsAShellLine) {
+    // A blank would split the path in two; the semicolons would run a command.
+    for (const std::string dir : {"in st/", "x;touch INJECTED;/"}) {
+        SCOPED_TRACE(dir);
+        TerminalOptions options = WithOrvaneDir(dir);
+        options.files = {{dir + "bin/lineprobe_help.txt", *ReadWholeFile(LINEPROBE_HELP_FILE)}};
+        TerminalSession session(options);
+        ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
+
+        session.TypeLine("help");
+        EXPECT_TRUE(session.WaitForText(HELP_TITLE)) << session.Dump();
+        // The trace still shows the command line as the operator would type it.
+        EXPECT_TRUE(
+            session.WaitForLogLine("lineprobe.log", "less " + dir + "bin/lineprobe_help.txt"));
+        session.SendKeys({"q"});
+        ExpectScreenIntact(session);
+        EXPECT_FALSE(std::filesystem::exists(session.WorkDir() / "INJECTED"));
+        EXPECT_EQ(session.ReadErrLog(), std::optional<std::string>(""));
+        EXPECT_TRUE(session.StillRunning());
+    }
 }
 
 TEST(HelpTerminal, WithoutTheVariableComesStraightBackSilently) {
