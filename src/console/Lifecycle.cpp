@@ -12,6 +12,7 @@
 
 #include "console/ConsoleDisplay.h"
 #include "console/DisplayGuard.h"
+#include "console/Pager.h"
 #include "console/PhoneViewMgr.h"
 #include "console/TrunkViewMgr.h"
 #include "console/Version.h"
@@ -97,7 +98,15 @@ void terminate_app(int sig) {
 
     std::cout << TerminationLine(sig) << std::endl;
 
+    // A pager that help started goes first, so that nothing of the tool is left reading
+    // the terminal, and the screen comes back for the rest of the shutdown.
     const std::chrono::milliseconds wait(SHUTDOWN_DISPLAY_WAIT_MS);
+    if (lineprobe::EndPager(std::chrono::milliseconds(PAGER_END_WAIT_MS)) &&
+        g_curDisplay != nullptr) {
+        lineprobe::DisplayGuard guard(wait);
+        g_curDisplay->Resume();
+    }
+
     if (g_CmdProcessorView != nullptr) {
         lineprobe::DisplayGuard guard(wait);
         g_CmdProcessorView->PrintString("starting app shutdown", 2, 1);

@@ -29,13 +29,16 @@ constexpr int SHUTDOWN_DISPLAY_WAIT_MS = 2000;
 // ends all the same, with the terminal put back.
 constexpr unsigned int SHUTDOWN_VIEWS_WAIT_S = 10;
 
+// Longest the shutdown waits for the pager to go after asking it to; then it is killed.
+constexpr int PAGER_END_WAIT_MS = 1000;
+
 // Handles the command line of an invocation with arguments (argc and argv without the
 // program name): prints the version, the help path or the complaint, and returns the
 // index at which it stopped.
 int ProcessCmdLineArgs(int argc, char** argv);
 
 // Handler of SIGINT, SIGTERM and SIGUSR1, and the only way the process ends in normal
-// use: logs the cause, tells the operator, stops every view, ends curses and exits with
-// status 1. Returns only to a shutdown it interrupted on the same thread, which then
+// use: logs the cause, ends the pager, tells the operator, stops every view, ends curses
+// and exits with status 1. Returns only to a shutdown it interrupted on the same thread, which then
 // goes on to the end.
 void terminate_app(int sig);
