@@ -39,6 +39,8 @@ const char* TerminationLine(int sig) {
             return "terninating app due to SIGTERM";
         case SIGUSR1:
             return "terninating app due to SIGUSR1";
+        case SIGHUP:
+            return "terninating app due to SIGHUP";
         default:
             return "terninating app due to an unexpected signal";
     }

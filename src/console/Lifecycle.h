@@ -37,8 +37,8 @@ constexpr int PAGER_END_WAIT_MS = 1000;
 // index at which it stopped.
 int ProcessCmdLineArgs(int argc, char** argv);
 
-// Handler of SIGINT, SIGTERM and SIGUSR1, and the only way the process ends in normal
-// use: logs the cause, ends the pager, tells the operator, stops every view, ends curses
-// and exits with status 1. Returns only to a shutdown it interrupted on the same thread, which then
-// goes on to the end.
+// Handler of SIGINT, SIGTERM, SIGUSR1 and SIGHUP, and the only way the process ends in
+// normal use, a keyboard gone for good included: logs the cause, ends the pager, tells the
+// operator, stops every view, ends curses and exits with status 1. Returns only to a shutdown it
+// interrupted on the same thread, which then goes on to the end.
 void terminate_app(int sig);

@@ -4,9 +4,11 @@
 
 #include <csignal>
 #include <string>
+#include <vector>
 
 #include "ConsoleScreen.h"
 #include "TerminalSession.h"
+#include "ViewScreen.h"
 
 namespace lineprobe::testing {
 namespace {
@@ -57,8 +59,39 @@ INSTANTIATE_TEST_SUITE_P(
         EndCase{"QuitFollowedByAWord", "quit now 1 2", 0, "terninating app due to SIGUSR1"},
         EndCase{"Sigint", "", SIGINT, "terninating app due to SIGINT"},
         EndCase{"Sigterm", "", SIGTERM, "terninating app due to SIGTERM"},
-        EndCase{"Sigusr1", "", SIGUSR1, "terninating app due to SIGUSR1"}),
+        EndCase{"Sigusr1", "", SIGUSR1, "terninating app due to SIGUSR1"},
+        EndCase{"Sighup", "", SIGHUP, "terninating app due to SIGHUP"}),
     [](const ::testing::TestParamInfo<EndCase>& info) { return std::string(info.param.name); });
+
+// True when the log holds these whole lines in this order.
+bool LogHasInOrder(const std::string& log, const std::vector<std::string>& lines) {
+    const std::string text = "\n" + log;
+    std::size_t from = 0;
+    for (const std::string& line : lines) {
+        const std::size_t at = text.find("\n" + line + "\n", from);
+        if (at == std::string::npos) {
+            return false;
+        }
+        from = at + line.size() + 1;
+    }
+    return true;
+}
+
+TEST(ShutdownTerminal, ClosedKeyboardEndsThroughTheShutdown) {
+    TerminalSession session;
+    CommandRunner commands(session);
+    ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
+    ASSERT_TRUE(commands.Run("trunk 1 1"));
+    ASSERT_EQ(commands.Result(), "trunk view creaed successfully");
+
+    session.HangUp();
+    ASSERT_EQ(session.WaitForExit(), std::optional<int>(1));
+    const std::optional<std::string> log = session.ReadLog();
+    ASSERT_TRUE(log.has_value());
+    EXPECT_TRUE(LogHasInOrder(
+        *log, {"terninating app due to SIGHUP", "Stopping Trunk Viev: board=1 line=1"}))
+        << *log;
+}
 
 }  // namespace
 }  // namespace lineprobe::testing
