@@ -23,11 +23,13 @@ extern lineprobe::View* g_CmdProcessorView;
 // without the display lock.
 constexpr int SHUTDOWN_DISPLAY_WAIT_MS = 2000;
 
-// Longest the shutdown gives the views to stop. Stopping asks the boards to cancel their
-// subscriptions, and a board that is silent, or a request that the signal interrupted on
-// the thread that now runs the shutdown, could hold it up for good; past this the process
-// ends all the same, with the terminal put back.
-constexpr unsigned int SHUTDOWN_VIEWS_WAIT_S = 10;
+// Longest the shutdown waits while stopping the views makes no progress. Stopping asks
+// the boards to cancel their subscriptions, one request after another, and each request
+// ends within its time-out, so slow or silent boards only make it slow. A request that the
+// signal interrupted on the thread that now runs the shutdown could hold it up for good:
+// when no request has ended for this long the process ends all the same, with the terminal
+// put back.
+constexpr unsigned int SHUTDOWN_STALL_LIMIT_S = 10;
 
 // Longest the shutdown waits for the pager to go after asking it to; then it is killed.
 constexpr int PAGER_END_WAIT_MS = 1000;

@@ -2,11 +2,13 @@
 // the trace log.
 #include <gtest/gtest.h>
 
+#include <chrono>
 #include <csignal>
 #include <string>
 #include <vector>
 
 #include "ConsoleScreen.h"
+#include "SimServer.h"
 #include "TerminalSession.h"
 #include "ViewScreen.h"
 
@@ -90,6 +92,34 @@ TEST(ShutdownTerminal, ClosedKeyboardEndsThroughTheShutdown) {
     ASSERT_TRUE(log.has_value());
     EXPECT_TRUE(LogHasInOrder(
         *log, {"terninating app due to SIGHUP", "Stopping Trunk Viev: board=1 line=1"}))
+        << *log;
+}
+
+// Boards that answer slowly make the views slow to stop, not stuck: the shutdown waits for
+// them, however long all of it takes (here six requests of 3 s each), and stops every view.
+TEST(ShutdownTerminal, SlowButProgressingShutdownIsNotCut) {
+    const std::string farm = LINEPROBE_FARMS_DIR "/default.toml";
+    SimServer sim(farm);
+    ASSERT_TRUE(sim.Running());
+    TerminalOptions options;
+    options.env = {{"REMOTE_TKHOST", sim.Address()}, {"VX7_FARM", farm}};
+    TerminalSession session(options);
+    CommandRunner commands(session);
+    ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
+    ASSERT_TRUE(commands.Run("trunk 1 1"));
+    ASSERT_TRUE(commands.Run("trunk 1 2"));
+    ASSERT_TRUE(commands.Run("phone 1 1 1"));
+    ASSERT_EQ(commands.Result(), "phone view creaed successfully");
+    ASSERT_EQ(sim.Control("delay 3000").rfind("ok", 0), 0u);
+
+    session.TypeLine("quit");
+    ASSERT_EQ(session.WaitForExit(std::chrono::seconds(90)), std::optional<int>(1));
+    EXPECT_EQ(session.ReadErrLog(), std::optional<std::string>(""));
+    const std::optional<std::string> log = session.ReadLog();
+    ASSERT_TRUE(log.has_value());
+    EXPECT_TRUE(LogHasInOrder(
+        *log, {"terninating app due to SIGUSR1", "PhoneView::Stop() called: board=1 line=1 chan=1",
+               "Stopping Trunk Viev: board=1 line=1", "Stopping Trunk Viev: board=1 line=2"}))
         << *log;
 }
 
