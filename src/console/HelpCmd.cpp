@@ -2,19 +2,32 @@
 
 #include <sys/wait.h>
 
+#include <cerrno>
 #include <cstdlib>
+#include <cstring>
 #include <iostream>
 
 #include "console/ConsoleDisplay.h"
+#include "console/Pager.h"
 #include "console/PhoneViewMgr.h"
 #include "console/TrunkViewMgr.h"
 #include "console/View.h"
 
 namespace lineprobe {
 
+namespace {
+
+constexpr const char* PAGER = "less";
+
+}  // namespace
+
+std::string HelpCmd::HelpFilePath(const std::string& directory, const std::string& fileName) {
+    return directory + "bin/" + fileName;
+}
+
 std::optional<std::string> HelpCmd::BuildPagerCommand(const std::string& directory,
                                                       const std::string& fileName) {
-    std::string command = "less " + directory + "bin/" + fileName;
+    std::string command = std::string(PAGER) + " " + HelpFilePath(directory, fileName);
     if (command.size() >= MAX_FILENAME_SIZE) {
         return std::nullopt;
     }
@@ -45,9 +58,10 @@ int HelpCmd::Execute() {
             std::cout << *command << std::endl;
             // The pager's own messages (a missing file, say) are on the screen it
             // leaves; the log only records that it did not end cleanly.
-            const int status = std::system(command->c_str());
+            const int status = RunPager(PAGER, HelpFilePath(orvaneDir_, helpFileName_));
             if (status == -1) {
-                std::cerr << "help: unable to run \"" << *command << "\"" << std::endl;
+                std::cerr << "help: unable to run \"" << *command << "\": " << std::strerror(errno)
+                          << std::endl;
             } else if (!WIFEXITED(status) || WEXITSTATUS(status) != 0) {
                 std::cerr << "help: \"" << *command << "\" ended with status "
                           << (WIFEXITED(status) ? WEXITSTATUS(status) : -1) << std::endl;

@@ -12,10 +12,13 @@
 
 #include "console/ConsoleDisplay.h"
 #include "console/DisplayGuard.h"
+#include "console/Pager.h"
 #include "console/PhoneViewMgr.h"
+#include "console/ShutdownWatchdog.h"
 #include "console/TrunkViewMgr.h"
 #include "console/Version.h"
 #include "console/View.h"
+#include "framework/MsgQueue.h"
 
 lineprobe::ConsoleDisplay* g_curDisplay = nullptr;
 lineprobe::ConsoleSystemView* g_sysView = nullptr;
@@ -38,6 +41,8 @@ const char* TerminationLine(int sig) {
             return "terninating app due to SIGTERM";
         case SIGUSR1:
             return "terninating app due to SIGUSR1";
+        case SIGHUP:
+            return "terninating app due to SIGHUP";
         default:
             return "terninating app due to an unexpected signal";
     }
@@ -45,13 +50,13 @@ const char* TerminationLine(int sig) {
 
 std::atomic<std::thread::id> g_terminatingThread{};
 
-// The views did not stop in time: end without them, the terminal put back first.
-void ShutdownOverdue(int) {
+// Stopping the views has stalled: end without them, the terminal put back first.
+void ShutdownOverdue() {
     if (g_curDisplay != nullptr) {
         lineprobe::DisplayGuard guard{std::chrono::milliseconds(SHUTDOWN_DISPLAY_WAIT_MS)};
         g_curDisplay->Stop();
     }
-    std::cerr << "views did not stop within " << SHUTDOWN_VIEWS_WAIT_S
+    std::cerr << "stopping the views made no progress for " << SHUTDOWN_STALL_LIMIT_S
               << " s: shutdown completed without them" << std::endl;
     _exit(1);
 }
@@ -97,17 +102,27 @@ void terminate_app(int sig) {
 
     std::cout << TerminationLine(sig) << std::endl;
 
+    // A pager that help started goes first, so that nothing of the tool is left reading
+    // the terminal, and the screen comes back for the rest of the shutdown.
     const std::chrono::milliseconds wait(SHUTDOWN_DISPLAY_WAIT_MS);
+    if (lineprobe::EndPager(std::chrono::milliseconds(PAGER_END_WAIT_MS)) &&
+        g_curDisplay != nullptr) {
+        lineprobe::DisplayGuard guard(wait);
+        g_curDisplay->Resume();
+    }
+
     if (g_CmdProcessorView != nullptr) {
         lineprobe::DisplayGuard guard(wait);
         g_CmdProcessorView->PrintString("starting app shutdown", 2, 1);
     }
 
     // Without the display lock: stopping a view waits for the board, and the events that
-    // come meanwhile need the screen.
+    // come meanwhile need the screen. Each stop is a series of requests, and each request
+    // ends within its time-out: while they keep ending the shutdown gets on, however slow
+    // the boards; when none has ended for a while, a stop is stuck for good.
     if (g_phoneViewMgr != nullptr || g_trunkViewMgr != nullptr) {
-        signal(SIGALRM, ShutdownOverdue);
-        alarm(SHUTDOWN_VIEWS_WAIT_S);
+        lineprobe::StartShutdownWatchdog(SHUTDOWN_STALL_LIMIT_S, tolk::MsgQueue::endedRequests,
+                                         ShutdownOverdue);
     }
     if (g_phoneViewMgr != nullptr) {
         g_phoneViewMgr->DestroyAllPhoneViews();

@@ -23,19 +23,24 @@ extern lineprobe::View* g_CmdProcessorView;
 // without the display lock.
 constexpr int SHUTDOWN_DISPLAY_WAIT_MS = 2000;
 
-// Longest the shutdown gives the views to stop. Stopping asks the boards to cancel their
-// subscriptions, and a board that is silent, or a request that the signal interrupted on
-// the thread that now runs the shutdown, could hold it up for good; past this the process
-// ends all the same, with the terminal put back.
-constexpr unsigned int SHUTDOWN_VIEWS_WAIT_S = 10;
+// Longest the shutdown waits while stopping the views makes no progress. Stopping asks
+// the boards to cancel their subscriptions, one request after another, and each request
+// ends within its time-out, so slow or silent boards only make it slow. A request that the
+// signal interrupted on the thread that now runs the shutdown could hold it up for good:
+// when no request has ended for this long the process ends all the same, with the terminal
+// put back.
+constexpr unsigned int SHUTDOWN_STALL_LIMIT_S = 10;
+
+// Longest the shutdown waits for the pager to go after asking it to; then it is killed.
+constexpr int PAGER_END_WAIT_MS = 1000;
 
 // Handles the command line of an invocation with arguments (argc and argv without the
 // program name): prints the version, the help path or the complaint, and returns the
 // index at which it stopped.
 int ProcessCmdLineArgs(int argc, char** argv);
 
-// Handler of SIGINT, SIGTERM and SIGUSR1, and the only way the process ends in normal
-// use: logs the cause, tells the operator, stops every view, ends curses and exits with
-// status 1. Returns only to a shutdown it interrupted on the same thread, which then
-// goes on to the end.
+// Handler of SIGINT, SIGTERM, SIGUSR1 and SIGHUP, and the only way the process ends in
+// normal use, a keyboard gone for good included: logs the cause, ends the pager, tells the
+// operator, stops every view, ends curses and exits with status 1. Returns only to a shutdown it
+// interrupted on the same thread, which then goes on to the end.
 void terminate_app(int sig);

@@ -47,8 +47,9 @@ int main(int argc, char* argv[]) {
         return 0;
     }
 
+    // A terminal that hangs up ends the tool as the closed keyboard below does.
     if (signal(SIGINT, terminate_app) == SIG_ERR || signal(SIGTERM, terminate_app) == SIG_ERR ||
-        signal(SIGUSR1, terminate_app) == SIG_ERR) {
+        signal(SIGUSR1, terminate_app) == SIG_ERR || signal(SIGHUP, terminate_app) == SIG_ERR) {
         std::cerr << "unable to register signal handlers" << std::endl;
         return 1;
     }
@@ -147,6 +148,8 @@ int main(int argc, char* argv[]) {
 
     processor.ProcessCommands();
 
-    g_curDisplay->Stop();
-    return 0;
+    // The loop ends by itself only when the keyboard is gone for good, as when the
+    // terminal hangs up: the views are stopped all the same.
+    terminate_app(SIGHUP);
+    return 1;
 }

@@ -40,6 +40,17 @@ MsgQueue::~MsgQueue() {
     delete queue;
 }
 
+namespace {
+
+std::atomic<unsigned long> g_endedRequests{0};
+static_assert(std::atomic<unsigned long>::is_always_lock_free, "read in signal handlers");
+
+}  // namespace
+
+unsigned long MsgQueue::endedRequests() {
+    return g_endedRequests.load();
+}
+
 Msg* MsgQueue::request(Msg* msg, unsigned int timeoutMs, unsigned int retMsgType, int anySource) {
     TKSMsgRef ref(*msg->getTKMsgRef());
     TKSMsgRef reply;
@@ -48,7 +59,9 @@ Msg* MsgQueue::request(Msg* msg, unsigned int timeoutMs, unsigned int retMsgType
     }
     try {
         reply = queue->request(ref, timeoutMs, retMsgType, anySource);
+        ++g_endedRequests;
     } catch (...) {
+        ++g_endedRequests;
         if (timeoutMs != 0) {
             requestLock.unlock();
         }

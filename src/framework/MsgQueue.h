@@ -63,6 +63,11 @@ class MsgQueue : public virtualObject {
     // than retMsgType: ErrorMsg holding it.
     Msg* request(Msg* msg, unsigned int timeoutMs, unsigned int retMsgType, int anySource);
 
+    // How many requests of the whole process have ended so far, answered, timed out or
+    // failed. A waiting request ends within its time-out, so a count that stands still
+    // tells a caller stuck elsewhere from one held up by slow boards. Async-signal-safe.
+    static unsigned long endedRequests();
+
     void RegisterAsyncMsgReceiver(CompDesc_t source, AsyncMsgReceiver* receiver);
     void DeregisterAsyncMsgReceiver(CompDesc_t source);
     void unregisteredSource(UnregisteredHandler handler);

@@ -1,6 +1,10 @@
 // `help` hands the terminal to the pager and gets the screen back whole.
 #include <gtest/gtest.h>
+#include <sys/types.h>
 
+#include <csignal>
+#include <filesystem>
+#include <fstream>
 #include <string>
 
 #include "ConsoleScreen.h"
@@ -51,6 +55,97 @@ TEST(HelpTerminal, PagerShowsTheHelpFileAndQuitReturnsToAnIntactScreen) {
     EXPECT_TRUE(session.WaitForRow(RESULT_ROW, "  Unrecgnized Command")) << session.Dump();
     EXPECT_EQ(session.ReadErrLog(), std::optional<std::string>(""));
     EXPECT_TRUE(session.StillRunning());
+}
+
+TEST(HelpTerminal, DirectoryReachesThePagerAsOnePathNeverAsAShellLine) {
+    // A blank would split the path in two; the semicolons would run a command.
+    for (const std::string dir : {"in st/", "x;touch INJECTED;/"}) {
+        SCOPED_TRACE(dir);
+        TerminalOptions options = WithOrvaneDir(dir);
+        options.files = {{dir + "bin/lineprobe_help.txt", *ReadWholeFile(LINEPROBE_HELP_FILE)}};
+        TerminalSession session(options);
+        ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
+
+        session.TypeLine("help");
+        EXPECT_TRUE(session.WaitForText(HELP_TITLE)) << session.Dump();
+        // The trace still shows the command line as the operator would type it.
+        EXPECT_TRUE(
+            session.WaitForLogLine("lineprobe.log", "less " + dir + "bin/lineprobe_help.txt"));
+        session.SendKeys({"q"});
+        ExpectScreenIntact(session);
+        EXPECT_FALSE(std::filesystem::exists(session.WorkDir() / "INJECTED"));
+        EXPECT_EQ(session.ReadErrLog(), std::optional<std::string>(""));
+        EXPECT_TRUE(session.StillRunning());
+    }
+}
+
+// State letter and parent of a process from /proc, or nothing when it is gone.
+std::optional<std::pair<char, pid_t>> ProcState(pid_t pid) {
+    std::ifstream stat("/proc/" + std::to_string(pid) + "/stat");
+    std::string text;
+    if (!std::getline(stat, text)) {
+        return std::nullopt;
+    }
+    // "pid (comm) S ppid ...": the name may hold blanks and parentheses.
+    const std::size_t close = text.rfind(')');
+    if (close == std::string::npos || close + 2 >= text.size()) {
+        return std::nullopt;
+    }
+    char state = text[close + 2];
+    pid_t parent = static_cast<pid_t>(std::stol(text.substr(close + 4)));
+    return std::make_pair(state, parent);
+}
+
+// A process named `name` that descends from `ancestor`.
+std::optional<pid_t> DescendantRunning(pid_t ancestor, const std::string& name) {
+    for (const auto& entry : std::filesystem::directory_iterator("/proc")) {
+        const std::string pid = entry.path().filename().string();
+        if (pid.find_first_not_of("0123456789") != std::string::npos) {
+            continue;
+        }
+        std::ifstream comm(entry.path() / "comm");
+        std::string command;
+        if (!std::getline(comm, command) || command != name) {
+            continue;
+        }
+        for (auto state = ProcState(static_cast<pid_t>(std::stol(pid))); state && state->second > 1;
+             state = ProcState(state->second)) {
+            if (state->second == ancestor) {
+                return static_cast<pid_t>(std::stol(pid));
+            }
+        }
+    }
+    return std::nullopt;
+}
+
+// A signal that ends the tool while the pager has the terminal ends both: the tool through
+// its shutdown, the pager before the tool is gone, so that nothing of it is left reading
+// the terminal.
+void ExpectSignalEndsToolAndPager(int sig, const std::string& trace) {
+    TerminalOptions options = WithOrvaneDir("inst/");
+    options.files = {{"inst/bin/lineprobe_help.txt", *ReadWholeFile(LINEPROBE_HELP_FILE)}};
+    TerminalSession session(options);
+    ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
+    session.TypeLine("help");
+    ASSERT_TRUE(session.WaitForText(HELP_TITLE)) << session.Dump();
+    const std::optional<pid_t> pager = DescendantRunning(session.Pid(), "less");
+    ASSERT_TRUE(pager.has_value());
+
+    session.Signal(sig);
+    ASSERT_EQ(session.WaitForExit(), std::optional<int>(1)) << session.Dump();
+    const std::optional<std::string> log = session.ReadLog();
+    ASSERT_TRUE(log.has_value());
+    EXPECT_TRUE(HasLine(*log, trace)) << *log;
+    const auto left = ProcState(*pager);
+    EXPECT_TRUE(!left || left->first == 'Z') << "the pager still runs, state " << left->first;
+}
+
+TEST(HelpTerminal, SigintDuringThePagerEndsTheToolAndThePager) {
+    ExpectSignalEndsToolAndPager(SIGINT, "terninating app due to SIGINT");
+}
+
+TEST(HelpTerminal, SigtermDuringThePagerLeavesNoPagerBehind) {
+    ExpectSignalEndsToolAndPager(SIGTERM, "terninating app due to SIGTERM");
 }
 
 TEST(HelpTerminal, WithoutTheVariableComesStraightBackSilently) {

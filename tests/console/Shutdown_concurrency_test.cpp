@@ -71,7 +71,8 @@ TEST_P(ShutdownLineTest, LogsTheCauseAndExitsWithOne) {
 INSTANTIATE_TEST_SUITE_P(Signals, ShutdownLineTest,
                          ::testing::Values(SignalCase{SIGINT, "terninating app due to SIGINT"},
                                            SignalCase{SIGTERM, "terninating app due to SIGTERM"},
-                                           SignalCase{SIGUSR1, "terninating app due to SIGUSR1"}));
+                                           SignalCase{SIGUSR1, "terninating app due to SIGUSR1"},
+                                           SignalCase{SIGHUP, "terninating app due to SIGHUP"}));
 
 TEST_F(ShutdownTest, RaisedSignalEndsTheProcessBeforeRaiseReturns) {
     EXPECT_EXIT(

@@ -2,11 +2,15 @@
 // the trace log.
 #include <gtest/gtest.h>
 
+#include <chrono>
 #include <csignal>
 #include <string>
+#include <vector>
 
 #include "ConsoleScreen.h"
+#include "SimServer.h"
 #include "TerminalSession.h"
+#include "ViewScreen.h"
 
 namespace lineprobe::testing {
 namespace {
@@ -57,8 +61,67 @@ INSTANTIATE_TEST_SUITE_P(
         EndCase{"QuitFollowedByAWord", "quit now 1 2", 0, "terninating app due to SIGUSR1"},
         EndCase{"Sigint", "", SIGINT, "terninating app due to SIGINT"},
         EndCase{"Sigterm", "", SIGTERM, "terninating app due to SIGTERM"},
-        EndCase{"Sigusr1", "", SIGUSR1, "terninating app due to SIGUSR1"}),
+        EndCase{"Sigusr1", "", SIGUSR1, "terninating app due to SIGUSR1"},
+        EndCase{"Sighup", "", SIGHUP, "terninating app due to SIGHUP"}),
     [](const ::testing::TestParamInfo<EndCase>& info) { return std::string(info.param.name); });
+
+// True when the log holds these whole lines in this order.
+bool LogHasInOrder(const std::string& log, const std::vector<std::string>& lines) {
+    const std::string text = "\n" + log;
+    std::size_t from = 0;
+    for (const std::string& line : lines) {
+        const std::size_t at = text.find("\n" + line + "\n", from);
+        if (at == std::string::npos) {
+            return false;
+        }
+        from = at + line.size() + 1;
+    }
+    return true;
+}
+
+TEST(ShutdownTerminal, ClosedKeyboardEndsThroughTheShutdown) {
+    TerminalSession session;
+    CommandRunner commands(session);
+    ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
+    ASSERT_TRUE(commands.Run("trunk 1 1"));
+    ASSERT_EQ(commands.Result(), "trunk view creaed successfully");
+
+    session.HangUp();
+    ASSERT_EQ(session.WaitForExit(), std::optional<int>(1));
+    const std::optional<std::string> log = session.ReadLog();
+    ASSERT_TRUE(log.has_value());
+    EXPECT_TRUE(LogHasInOrder(
+        *log, {"terninating app due to SIGHUP", "Stopping Trunk Viev: board=1 line=1"}))
+        << *log;
+}
+
+// Boards that answer slowly make the views slow to stop, not stuck: the shutdown waits for
+// them, however long all of it takes (here six requests of 3 s each), and stops every view.
+TEST(ShutdownTerminal, SlowButProgressingShutdownIsNotCut) {
+    const std::string farm = LINEPROBE_FARMS_DIR "/default.toml";
+    SimServer sim(farm);
+    ASSERT_TRUE(sim.Running());
+    TerminalOptions options;
+    options.env = {{"REMOTE_TKHOST", sim.Address()}, {"VX7_FARM", farm}};
+    TerminalSession session(options);
+    CommandRunner commands(session);
+    ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
+    ASSERT_TRUE(commands.Run("trunk 1 1"));
+    ASSERT_TRUE(commands.Run("trunk 1 2"));
+    ASSERT_TRUE(commands.Run("phone 1 1 1"));
+    ASSERT_EQ(commands.Result(), "phone view creaed successfully");
+    ASSERT_EQ(sim.Control("delay 3000").rfind("ok", 0), 0u);
+
+    session.TypeLine("quit");
+    ASSERT_EQ(session.WaitForExit(std::chrono::seconds(90)), std::optional<int>(1));
+    EXPECT_EQ(session.ReadErrLog(), std::optional<std::string>(""));
+    const std::optional<std::string> log = session.ReadLog();
+    ASSERT_TRUE(log.has_value());
+    EXPECT_TRUE(LogHasInOrder(
+        *log, {"terninating app due to SIGUSR1", "PhoneView::Stop() called: board=1 line=1 chan=1",
+               "Stopping Trunk Viev: board=1 line=1", "Stopping Trunk Viev: board=1 line=2"}))
+        << *log;
+}
 
 }  // namespace
 }  // namespace lineprobe::testing

@@ -171,7 +171,12 @@ TerminalSession::TerminalSession(TerminalOptions options)
     // The program runs in the foreground of the pane's shell, which records its exit
     // status and then keeps the pane open, so the last screen stays readable. The inner
     // shell writes its pid and becomes the program, so that signals reach the program.
-    std::string command = "env";
+    // When the terminal is hung up (HangUp) the pane's shell gets SIGHUP: its trap waits
+    // for the program and records its status all the same, then leaves.
+    const std::string statusFile = (root_ / "status").string();
+    const std::string recordStatus = "echo $? > " + ShellQuote(statusFile + ".new") + " && mv " +
+                                     ShellQuote(statusFile + ".new") + " " + ShellQuote(statusFile);
+    std::string command = "trap " + ShellQuote(recordStatus + "; exit") + " HUP; env";
     for (const std::string& name : options.unsetEnv) {
         command += " -u " + ShellQuote(name);
     }
@@ -188,10 +193,7 @@ TerminalSession::TerminalSession(TerminalOptions options)
     for (const std::string& arg : options.args) {
         command += " " + ShellQuote(arg);
     }
-    const std::string statusFile = (root_ / "status").string();
-    command += "; echo $? > " + ShellQuote(statusFile + ".new") + " && mv " +
-               ShellQuote(statusFile + ".new") + " " + ShellQuote(statusFile) +
-               "; exec sleep infinity";
+    command += "; " + recordStatus + "; exec sleep infinity";
 
     int status = 0;
     RunCapture({"tmux", "-L", socket_, "-f", (root_ / "tmux.conf").string(), "new-session", "-d",
@@ -370,6 +372,10 @@ std::optional<int> TerminalSession::WaitForExit(std::chrono::milliseconds timeou
 
 void TerminalSession::Signal(int sig) {
     kill(pid_, sig);
+}
+
+void TerminalSession::HangUp() {
+    Tmux({"kill-pane", "-t", SESSION});
 }
 
 }  // namespace lineprobe::testing

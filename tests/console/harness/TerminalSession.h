@@ -101,6 +101,9 @@ class TerminalSession {
     // The exit status if the program has ended, without waiting.
     std::optional<int> ExitStatus() const;
     void Signal(int sig);
+    // Closes the terminal as a lost connection would: the program's input ends for good.
+    // The screen cannot be read afterwards; the logs and the exit status can.
+    void HangUp();
 
   private:
     std::string Tmux(const std::vector<std::string>& args, int* status = nullptr);
