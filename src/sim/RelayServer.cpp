@@ -25,6 +25,7 @@ struct RelayServer::Conn {
     bool opened = false;
     bool dead = false;
     bool wantWrite = false;
+    Clock::time_point accepted;
     TKCompDesc addr{};
     std::vector<unsigned char> in;
     std::size_t inPos = 0;
@@ -170,6 +171,7 @@ void RelayServer::run(int controlFd, std::ostream* controlOut) {
         if (stopRequested_.load()) {
             running_ = false;
         }
+        expireUnopened(Clock::now());
         drainEmulation();
         pumpBursts();
         flushAll();
@@ -185,6 +187,12 @@ int RelayServer::timeoutMs() const {
         return 0;
     }
     auto due = emu_.nextDue();
+    if (!unopened_.empty()) {
+        Clock::time_point expiry = unopened_.begin()->second->accepted + options_.openTimeout;
+        if (!due || expiry < *due) {
+            due = expiry;
+        }
+    }
     if (!due) {
         return emu_.burstsPending() ? 10 : -1;
     }
@@ -225,8 +233,9 @@ void RelayServer::acceptAll() {
             }
             return;
         }
-        if (conns_.size() >= options_.maxConnections) {
-            log_ << "vx7sim: refusing a connection: " << conns_.size() << " already open"
+        makeRoomForNewcomer();
+        if (liveConnections() >= options_.maxConnections) {
+            log_ << "vx7sim: refusing a connection: " << liveConnections() << " already open"
                  << std::endl;
             ::close(fd);
             continue;
@@ -236,6 +245,7 @@ void RelayServer::acceptAll() {
         auto c = std::make_unique<Conn>();
         c->fd = fd;
         c->serial = ++serial_;
+        c->accepted = Clock::now();
         epoll_event ev{};
         ev.events = EPOLLIN;
         ev.data.fd = fd;
@@ -243,8 +253,33 @@ void RelayServer::acceptAll() {
             ::close(fd);
             continue;
         }
+        unopened_[c->serial] = c.get();
         conns_[fd] = std::move(c);
-        connectionCount_.store(conns_.size());
+        connectionCount_.store(liveConnections());
+    }
+}
+
+void RelayServer::makeRoomForNewcomer() {
+    std::size_t unopenedShare = options_.maxConnections > options_.reservedForOpen
+                                    ? options_.maxConnections - options_.reservedForOpen
+                                    : 1;
+    // A newcomer is as likely to open as the oldest idle connection is unlikely to by now.
+    while (!unopened_.empty() &&
+           (unopened_.size() >= unopenedShare || liveConnections() >= options_.maxConnections)) {
+        Conn& oldest = *unopened_.begin()->second;
+        log_ << "vx7sim: connection " << oldest.serial
+             << " has not opened; closing it to make room for a new one" << std::endl;
+        close(oldest, nullptr);
+    }
+}
+
+void RelayServer::expireUnopened(Clock::time_point now) {
+    while (!unopened_.empty() &&
+           now - unopened_.begin()->second->accepted >= options_.openTimeout) {
+        Conn& c = *unopened_.begin()->second;
+        log_ << "vx7sim: connection " << c.serial << " did not open within "
+             << options_.openTimeout.count() << " ms; closing it" << std::endl;
+        close(c, nullptr);
     }
 }
 
@@ -338,6 +373,7 @@ bool RelayServer::handleFrame(Conn& c, std::uint32_t type, const unsigned char* 
             c.addr.board = TK_HOST_BOARD;
             c.addr.instance = inst;
             c.opened = true;
+            unopened_.erase(c.serial);
             byInstance_[inst] = &c;
             unsigned char assigned[TKS_ASSIGNED_BODY_BYTES];
             tksEncodeAssigned(c.addr, assigned);
@@ -536,6 +572,7 @@ void RelayServer::close(Conn& c, const char* why) {
     }
     c.dead = true;
     epoll_ctl(epollFd_, EPOLL_CTL_DEL, c.fd, nullptr);
+    unopened_.erase(c.serial);
     if (c.opened) {
         byInstance_.erase(c.addr.instance);
         emu_.forget(c.addr);
@@ -587,7 +624,7 @@ void RelayServer::readControl(int fd, std::ostream* out) {
 std::string RelayServer::runControl(const std::string& line) {
     ControlOutcome o = emu_.control(line);
     if (o.drop) {
-        std::size_t n = conns_.size();
+        std::size_t n = liveConnections();
         dropAll();
         reap();
         o.reply = "ok dropped " + std::to_string(n);
@@ -596,7 +633,7 @@ std::string RelayServer::runControl(const std::string& line) {
         running_ = false;
     }
     if (o.reply.rfind("ok stats", 0) == 0) {
-        o.reply += " connections=" + std::to_string(conns_.size());
+        o.reply += " connections=" + std::to_string(liveConnections());
     }
     drainEmulation();
     return o.reply;

@@ -5,6 +5,7 @@
 #define LINEPROBE_SIM_RELAYSERVER_H
 
 #include <atomic>
+#include <chrono>
 #include <cstdint>
 #include <deque>
 #include <future>
@@ -25,6 +26,10 @@ struct RelayOptions {
     int port = 6554;  // 0 picks a free port
     std::string bindAddress = "0.0.0.0";
     std::size_t maxConnections = 4096;
+    // A connection that has not opened within this time is closed. Those not yet open never
+    // hold the last reservedForOpen slots: past that, the oldest of them makes way for a newcomer.
+    std::chrono::milliseconds openTimeout{5000};
+    std::size_t reservedForOpen = 64;
     // A client that lets this much pile up unread is cut off.
     std::size_t maxPendingOutput = 64u << 20;
 };
@@ -66,6 +71,9 @@ class RelayServer {
     void flush(Conn& c);
     void flushAll();
     void close(Conn& c, const char* why);
+    void expireUnopened(Clock::time_point now);
+    void makeRoomForNewcomer();
+    std::size_t liveConnections() const { return conns_.size() - doomed_.size(); }
     void reap();
     void dropAll();
     void drainEmulation();
@@ -90,6 +98,7 @@ class RelayServer {
     bool running_ = false;
     std::map<int, std::unique_ptr<Conn>> conns_;  // by descriptor
     std::map<std::uint16_t, Conn*> byInstance_;   // by assigned address
+    std::map<std::uint64_t, Conn*> unopened_;     // by serial, so the oldest first
     std::vector<int> doomed_;
     std::uint16_t lastInstance_ = 0;
     std::uint64_t serial_ = 0;

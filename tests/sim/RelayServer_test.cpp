@@ -94,8 +94,13 @@ struct Events {
 // A plain TCP client for raw frames.
 class RawClient {
   public:
-    explicit RawClient(int port) {
+    // A receive buffer of rcvbuf bytes (0: the system's) keeps what the kernel holds for a
+    // client that does not read small against what the server queues.
+    explicit RawClient(int port, int rcvbuf = 0) {
         fd = ::socket(AF_INET, SOCK_STREAM, 0);
+        if (rcvbuf > 0) {
+            setsockopt(fd, SOL_SOCKET, SO_RCVBUF, &rcvbuf, sizeof rcvbuf);
+        }
         sockaddr_in sa{};
         sa.sin_family = AF_INET;
         sa.sin_port = htons(static_cast<std::uint16_t>(port));
@@ -124,6 +129,22 @@ class RawClient {
         m.size = sizeof body;
         m.body = body;
         return tksEncodeFrame(m);
+    }
+    // A message frame of a request without a body.
+    static std::vector<unsigned char> request(const farm::Address& to, std::uint32_t type) {
+        TKMsg32Bit* block = nullptr;
+        EXPECT_EQ(tkMsgAllocate(0, &block), 0);
+        block->type = type;
+        block->transTag = 0x4200;
+        block->tgtInstance = to.instance;
+        block->tgtBoard = to.board;
+        block->tgtProcessor = to.processor;
+        block->tgtComponent = to.component;
+        block->tgtNode = to.node;
+        std::vector<unsigned char> frame;
+        EXPECT_TRUE(tksEncodeMessageFrame(block, frame));
+        tkMsgFree(block);
+        return frame;
     }
     // Reads n bytes; fewer if the server closed.
     std::vector<unsigned char> read(std::size_t n) {
@@ -182,21 +203,23 @@ class RelayTest : public testing::Test {
         unsetenv("HOST");
         auto load = farm::activeFarm();
         ASSERT_TRUE(load.farm);
-        RelayOptions o;
-        o.port = 0;
-        o.bindAddress = "127.0.0.1";
-        server = std::make_unique<RelayServer>(load.farm, o, log);
-        std::string error;
-        ASSERT_TRUE(server->listen(error)) << error;
-        port = server->port();
-        loop = std::thread([this] { server->run(-1, nullptr); });
-        std::string host = "127.0.0.1:" + std::to_string(port);
-        setenv("REMOTE_TKHOST", host.c_str(), 1);
+        farm_ = load.farm;
+        start(defaults());
     }
     void TearDown() override {
         unsetenv("REMOTE_TKHOST");
-        server->stop();
-        loop.join();
+        halt();
+    }
+    static RelayOptions defaults() {
+        RelayOptions o;
+        o.port = 0;
+        o.bindAddress = "127.0.0.1";
+        return o;
+    }
+    // Replaces the running server by one with these options and control channel.
+    void restart(const RelayOptions& o, int controlFd = -1, std::ostream* controlOut = nullptr) {
+        halt();
+        start(o, controlFd, controlOut);
     }
     bool waitConnections(std::size_t n) {
         for (int i = 0; i < 500; ++i) {
@@ -213,6 +236,25 @@ class RelayTest : public testing::Test {
     std::unique_ptr<RelayServer> server;
     std::thread loop;
     int port = 0;
+
+  private:
+    void start(const RelayOptions& o, int controlFd = -1, std::ostream* controlOut = nullptr) {
+        server = std::make_unique<RelayServer>(farm_, o, log);
+        std::string error;
+        ASSERT_TRUE(server->listen(error)) << error;
+        port = server->port();
+        loop = std::thread([this, controlFd, controlOut] { server->run(controlFd, controlOut); });
+        std::string host = "127.0.0.1:" + std::to_string(port);
+        setenv("REMOTE_TKHOST", host.c_str(), 1);
+    }
+    void halt() {
+        if (loop.joinable()) {
+            server->stop();
+            loop.join();
+        }
+    }
+
+    std::shared_ptr<const farm::Farm> farm_;
 };
 
 TEST_F(RelayTest, ClientsGetTheirOwnAddressesAndAnswers) {
@@ -446,6 +488,37 @@ TEST_F(RelayTest, CloseIsAcknowledged) {
     ::close(c.fd);
     c.fd = -1;
     EXPECT_TRUE(waitConnections(0));
+}
+
+TEST_F(RelayTest, IdleConnectionsDoNotLockOutAClientThatOpens) {
+    RelayOptions o = defaults();
+    o.maxConnections = 8;
+    o.reservedForOpen = 2;
+    o.openTimeout = std::chrono::milliseconds(600);
+    restart(o);
+
+    std::vector<std::unique_ptr<RawClient>> idle;
+    for (int i = 0; i < 8; ++i) {
+        idle.push_back(std::make_unique<RawClient>(port));
+        ASSERT_TRUE(idle.back()->connected);
+    }
+    RawClient late(port);
+    late.send(late.open());
+    ASSERT_EQ(late.read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES).size(),
+              TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+
+    // Every idle one is closed in time (the oldest first, to make room), the open one stays.
+    for (auto& c : idle) {
+        EXPECT_TRUE(c->closedByServer());
+    }
+    EXPECT_TRUE(waitConnections(1));
+    EXPECT_NE(logBuf.text().find("did not open within 600 ms"), std::string::npos);
+    late.send(RawClient::request(farm::lconAddress(1, 1), Lcon::MsgGetLineState_t::MsgType));
+    msg_t h;
+    std::vector<unsigned char> reply = late.read(TKS_FRAME_HEADER_SIZE);
+    ASSERT_EQ(reply.size(), TKS_FRAME_HEADER_SIZE);
+    tksDecodeFrameHeader(reply.data(), h);
+    EXPECT_EQ(h.type, TKS_FRAME_MESSAGE);
 }
 
 }  // namespace
