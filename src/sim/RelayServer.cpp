@@ -496,10 +496,30 @@ void RelayServer::sendFrame(Conn& c, std::uint32_t type, const unsigned char* bo
     if (exSize) {
         c.out.insert(c.out.end(), ex, ex + exSize);
     }
+    queued_ += sizeof header + size + exSize;
     if (c.pending() > options_.maxPendingOutput) {
         log_ << "vx7sim: connection " << c.serial << " reads too slowly (" << c.pending()
              << " bytes waiting); closing it" << std::endl;
         close(c, nullptr);
+    }
+    enforceQueuedCap();
+}
+
+void RelayServer::enforceQueuedCap() {
+    while (queued_ > options_.maxQueuedOutput) {
+        Conn* worst = nullptr;
+        for (auto& [fd, c] : conns_) {
+            if (!c->dead && (!worst || c->pending() > worst->pending())) {
+                worst = c.get();
+            }
+        }
+        if (!worst) {
+            return;
+        }
+        log_ << "vx7sim: " << queued_ << " bytes waiting for all clients, over the cap of "
+             << options_.maxQueuedOutput << "; connection " << worst->serial
+             << " has the most unread (" << worst->pending() << "); closing it" << std::endl;
+        close(*worst, nullptr);
     }
 }
 
@@ -528,6 +548,7 @@ void RelayServer::flush(Conn& c) {
             return;
         }
         c.outPos += static_cast<std::size_t>(n);
+        queued_ -= static_cast<std::size_t>(n);
     }
     if (c.dead) {
         return;
@@ -573,6 +594,9 @@ void RelayServer::close(Conn& c, const char* why) {
     c.dead = true;
     epoll_ctl(epollFd_, EPOLL_CTL_DEL, c.fd, nullptr);
     unopened_.erase(c.serial);
+    queued_ -= c.pending();
+    c.out.clear();
+    c.outPos = 0;
     if (c.opened) {
         byInstance_.erase(c.addr.instance);
         emu_.forget(c.addr);
@@ -633,7 +657,8 @@ std::string RelayServer::runControl(const std::string& line) {
         running_ = false;
     }
     if (o.reply.rfind("ok stats", 0) == 0) {
-        o.reply += " connections=" + std::to_string(liveConnections());
+        o.reply += " connections=" + std::to_string(liveConnections()) +
+                   " queued=" + std::to_string(queued_);
     }
     drainEmulation();
     return o.reply;

@@ -32,6 +32,8 @@ struct RelayOptions {
     std::size_t reservedForOpen = 64;
     // A client that lets this much pile up unread is cut off.
     std::size_t maxPendingOutput = 64u << 20;
+    // What all clients together may leave unread; past it the worst reader is cut off first.
+    std::size_t maxQueuedOutput = 256u << 20;
 };
 
 class RelayServer {
@@ -73,6 +75,7 @@ class RelayServer {
     void close(Conn& c, const char* why);
     void expireUnopened(Clock::time_point now);
     void makeRoomForNewcomer();
+    void enforceQueuedCap();
     std::size_t liveConnections() const { return conns_.size() - doomed_.size(); }
     void reap();
     void dropAll();
@@ -99,6 +102,7 @@ class RelayServer {
     std::map<int, std::unique_ptr<Conn>> conns_;  // by descriptor
     std::map<std::uint16_t, Conn*> byInstance_;   // by assigned address
     std::map<std::uint64_t, Conn*> unopened_;     // by serial, so the oldest first
+    std::size_t queued_ = 0;                      // unsent bytes of every live connection
     std::vector<int> doomed_;
     std::uint16_t lastInstance_ = 0;
     std::uint64_t serial_ = 0;

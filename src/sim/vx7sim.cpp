@@ -15,7 +15,7 @@
 namespace {
 
 const char* kUsage =
-    "usage: vx7sim [--farm FILE] [--port PORT] [--bind ADDRESS]\n"
+    "usage: vx7sim [--farm FILE] [--port PORT] [--bind ADDRESS] [--max-queued MIB]\n"
     "\n"
     "Serves the board emulation of a farm on TCP with the relay protocol of the host\n"
     "transport, so that lineprobe can reach the boards with REMOTE_TKHOST=host:PORT.\n"
@@ -24,12 +24,16 @@ const char* kUsage =
     "                   the same as farms/default.toml)\n"
     "  --port PORT      TCP port, default 6554; 0 picks a free one\n"
     "  --bind ADDRESS   IPv4 address to listen on, default 0.0.0.0 (every interface)\n"
+    "  --max-queued MIB answers and events that all clients together may leave unread, in\n"
+    "                   MiB, default 256; past it the client with the most unread is cut off\n"
+    "                   (each one is also cut off alone at 64 MiB)\n"
     "  --help           this text\n"
     "\n"
     "The first line on standard output is \"listening on PORT\". Each connection gets its own\n"
     "address (board 0xFF, instance 1, 2, ...); messages go between connections and boards by\n"
-    "target address. Messages the emulation cannot answer are logged on standard error by type\n"
-    "and target.\n"
+    "target address. A connection that has not sent its open within 5 seconds is closed, and\n"
+    "connections not yet open never take the last 64 of the 4096 places. Messages the\n"
+    "emulation cannot answer are logged on standard error by type and target.\n"
     "\n"
     "Standard input is a control channel: one command a line, each answered on standard output\n"
     "by one line that starts with \"ok\" or \"error:\". B, T, C are board, trunk and channel.\n"
@@ -89,6 +93,15 @@ int main(int argc, char** argv) {
                 return 2;
             }
             options.port = static_cast<int>(p);
+        } else if (a == "--max-queued") {
+            const char* v = value("a size in MiB");
+            char* end = nullptr;
+            long m = std::strtol(v, &end, 10);
+            if (*v == '\0' || *end != '\0' || m < 1 || m > 1L << 20) {
+                std::cerr << "vx7sim: not a size in MiB: " << v << "\n";
+                return 2;
+            }
+            options.maxQueuedOutput = static_cast<std::size_t>(m) << 20;
         } else if (a == "--bind") {
             options.bindAddress = value("an address");
         } else {

@@ -521,5 +521,71 @@ TEST_F(RelayTest, IdleConnectionsDoNotLockOutAClientThatOpens) {
     EXPECT_EQ(h.type, TKS_FRAME_MESSAGE);
 }
 
+// A counter of the relay's "stats" line.
+unsigned long statsCounter(RelayServer& server, const std::string& name) {
+    std::string s = server.control("stats");
+    std::size_t at = s.find(" " + name + "=");
+    return at == std::string::npos ? 0 : std::stoul(s.substr(at + name.size() + 2));
+}
+
+TEST_F(RelayTest, QueuedOutputOfAllClientsIsCappedByCuttingTheWorstReader) {
+    constexpr unsigned long kMiB = 1u << 20;
+    RelayOptions o = defaults();
+    o.maxQueuedOutput = 6 * kMiB;
+    restart(o);
+
+    std::vector<std::unique_ptr<RawClient>> c;
+    for (int i = 0; i < 3; ++i) {
+        c.push_back(std::make_unique<RawClient>(port, 4096));
+        c.back()->send(c.back()->open());
+        ASSERT_EQ(c.back()->read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES).size(),
+                  TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+    }
+    // Batches of pipelined requests whose answers nobody reads. What the kernel holds varies,
+    // so each client goes on until the relay itself holds its share: 4.5 MiB for the first,
+    // 1 MiB more for the second; the third then passes the cap, but the first is the worst.
+    std::vector<unsigned char> batch;
+    const std::vector<unsigned char> ask =
+        RawClient::request(farm::lconAddress(1, 1), Lcon::MsgGetLineState_t::MsgType);
+    for (int k = 0; k < 1024; ++k) {
+        batch.insert(batch.end(), ask.begin(), ask.end());
+    }
+    unsigned long asked = 0;
+    std::size_t batches[3] = {0, 0, 0};
+    auto pipeline = [&](int i, auto done) {
+        for (int n = 0; n < 400 && !done(); ++n) {
+            c[i]->send(batch);
+            asked += 1024;
+            ++batches[i];
+            for (int w = 0; w < 500 && statsCounter(*server, "requests") < asked; ++w) {
+                std::this_thread::sleep_for(std::chrono::milliseconds(2));
+            }
+        }
+    };
+    pipeline(0, [&] { return statsCounter(*server, "queued") >= 9 * kMiB / 2; });
+    pipeline(1, [&] { return statsCounter(*server, "queued") >= 11 * kMiB / 2; });
+    pipeline(2, [&] { return server->connectionCount() < 3; });
+    ASSERT_TRUE(waitConnections(2));
+    EXPECT_LE(statsCounter(*server, "queued"), 6 * kMiB);
+    EXPECT_NE(logBuf.text().find("most unread"), std::string::npos);
+
+    // The two others get every answer; the first one's stop short.
+    std::vector<unsigned char> head = c[1]->read(TKS_FRAME_HEADER_SIZE);
+    ASSERT_EQ(head.size(), TKS_FRAME_HEADER_SIZE);
+    msg_t h;
+    tksDecodeFrameHeader(head.data(), h);
+    const std::size_t answer = TKS_FRAME_HEADER_SIZE + h.size + h.ex_size;
+    for (int i = 0; i < 3; ++i) {
+        int roomy = 1 << 20;  // reading it all through 4 KiB would take seconds
+        setsockopt(c[i]->fd, SOL_SOCKET, SO_RCVBUF, &roomy, sizeof roomy);
+    }
+    const std::size_t all[3] = {batches[0] * 1024 * answer,
+                                batches[1] * 1024 * answer - TKS_FRAME_HEADER_SIZE,
+                                batches[2] * 1024 * answer};
+    EXPECT_LT(c[0]->read(all[0]).size(), all[0]);
+    EXPECT_EQ(c[1]->read(all[1]).size(), all[1]);
+    EXPECT_EQ(c[2]->read(all[2]).size(), all[2]);
+}
+
 }  // namespace
 }  // namespace sim
