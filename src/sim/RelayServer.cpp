@@ -13,6 +13,7 @@
 #include <algorithm>
 #include <cstring>
 #include <ostream>
+#include <string_view>
 
 #include "platform/tkhost/tkhost_switch.h"
 #include "transport/TKSFrame.h"
@@ -38,6 +39,7 @@ struct RelayServer::Conn {
 namespace {
 
 constexpr std::size_t kReadChunk = 256 * 1024;
+constexpr std::size_t kMaxControlLine = 64 * 1024;
 constexpr std::size_t kBurstSlice = 512;
 // Bursts wait while any client has this much unsent.
 constexpr std::size_t kBurstWatermark = 1u << 20;
@@ -626,21 +628,36 @@ void RelayServer::readControl(int fd, std::ostream* out) {
         if (n <= 0) {
             break;
         }
-        controlPending_.append(buf, static_cast<std::size_t>(n));
-        std::size_t nl;
-        while ((nl = controlPending_.find('\n')) != std::string::npos) {
-            std::string line = controlPending_.substr(0, nl);
-            controlPending_.erase(0, nl + 1);
-            std::string reply = runControl(line);
-            if (!reply.empty() && out) {
-                *out << reply << std::endl;
+        std::string_view chunk(buf, static_cast<std::size_t>(n));
+        while (!chunk.empty()) {
+            std::size_t nl = chunk.find('\n');
+            if (discardingControl_) {
+                // The rest of a refused line is not a command of its own.
+                if (nl == std::string_view::npos) {
+                    break;
+                }
+                discardingControl_ = false;
+                chunk.remove_prefix(nl + 1);
+                continue;
             }
-        }
-        if (controlPending_.size() > 64 * 1024) {
-            controlPending_.clear();
-            if (out) {
-                *out << "error: control line too long" << std::endl;
+            controlPending_.append(chunk.substr(0, nl));
+            if (controlPending_.size() > kMaxControlLine) {
+                controlPending_.clear();
+                discardingControl_ = nl == std::string_view::npos;
+                if (out) {
+                    *out << "error: control line too long" << std::endl;
+                }
+            } else if (nl != std::string_view::npos) {
+                std::string reply = runControl(controlPending_);
+                controlPending_.clear();
+                if (!reply.empty() && out) {
+                    *out << reply << std::endl;
+                }
             }
+            if (nl == std::string_view::npos) {
+                break;
+            }
+            chunk.remove_prefix(nl + 1);
         }
     }
 }

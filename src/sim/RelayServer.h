@@ -107,6 +107,7 @@ class RelayServer {
     std::uint16_t lastInstance_ = 0;
     std::uint64_t serial_ = 0;
     std::string controlPending_;
+    bool discardingControl_ = false;  // until the newline of a line refused as too long
     std::atomic<std::size_t> connectionCount_{0};
 
     std::mutex crossLock_;

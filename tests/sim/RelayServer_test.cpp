@@ -587,5 +587,37 @@ TEST_F(RelayTest, QueuedOutputOfAllClientsIsCappedByCuttingTheWorstReader) {
     EXPECT_EQ(c[2]->read(all[2]).size(), all[2]);
 }
 
+TEST_F(RelayTest, TheTailOfAnOverlongControlLineDoesNotRun) {
+    int p[2];
+    ASSERT_EQ(::pipe(p), 0);
+    LockedLog answers;
+    std::ostream out(&answers);
+    restart(defaults(), p[0], &out);
+
+    std::string input(69632, 'x');
+    input += "stats\nhelp\n";
+    std::thread writer([&] {
+        std::size_t done = 0;
+        while (done < input.size()) {
+            ssize_t n = ::write(p[1], input.data() + done, input.size() - done);
+            if (n <= 0) {
+                break;
+            }
+            done += static_cast<std::size_t>(n);
+        }
+    });
+    writer.join();
+    std::string got;
+    for (int i = 0; i < 500 && got.find("ok commands") == std::string::npos; ++i) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(10));
+        got = answers.text();
+    }
+    EXPECT_EQ(got.substr(0, got.find("ok commands")), "error: control line too long\n");
+    EXPECT_EQ(got.find("ok stats"), std::string::npos);
+    ::close(p[1]);
+    restart(defaults());
+    ::close(p[0]);
+}
+
 }  // namespace
 }  // namespace sim
