@@ -16,6 +16,7 @@
 #include <string_view>
 
 #include "platform/tkhost/tkhost_switch.h"
+#include "sim/Trace.h"
 #include "transport/TKSFrame.h"
 
 namespace sim {
@@ -402,6 +403,9 @@ bool RelayServer::handleFrame(Conn& c, std::uint32_t type, const unsigned char* 
             block->srcComponent = c.addr.component;
             block->srcNode = c.addr.node;
             block->srcInstance = c.addr.instance;
+            if (options_.trace) {
+                log_ << "trace " << traceLine("in", c.serial, block) << std::endl;
+            }
             route(block);
             return true;
         }
@@ -529,6 +533,9 @@ void RelayServer::sendBlock(Conn& c, const TKMsg32Bit* block) {
     if (!tksFrameSizesValid(TKS_MSG_HEADER_BYTES, block->size)) {
         emu_.stats().undeliverable++;
         return;
+    }
+    if (options_.trace) {
+        log_ << "trace " << traceLine("out", c.serial, block) << std::endl;
     }
     unsigned char header[TKS_MSG_HEADER_BYTES];
     tksPackMsgHeader(block, header);

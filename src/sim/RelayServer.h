@@ -34,6 +34,8 @@ struct RelayOptions {
     std::size_t maxPendingOutput = 64u << 20;
     // What all clients together may leave unread; past it the worst reader is cut off first.
     std::size_t maxQueuedOutput = 256u << 20;
+    // Each message routed, one line on the log (see Trace.h).
+    bool trace = false;
 };
 
 class RelayServer {

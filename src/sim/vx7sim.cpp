@@ -15,7 +15,7 @@
 namespace {
 
 const char* kUsage =
-    "usage: vx7sim [--farm FILE] [--port PORT] [--bind ADDRESS] [--max-queued MIB]\n"
+    "usage: vx7sim [--farm FILE] [--port PORT] [--bind ADDRESS] [--max-queued MIB] [--trace]\n"
     "\n"
     "Serves the board emulation of a farm on TCP with the relay protocol of the host\n"
     "transport, so that lineprobe can reach the boards with REMOTE_TKHOST=host:PORT.\n"
@@ -27,6 +27,12 @@ const char* kUsage =
     "  --max-queued MIB answers and events that all clients together may leave unread, in\n"
     "                   MiB, default 256; past it the client with the most unread is cut off\n"
     "                   (each one is also cut off alone at 64 MiB)\n"
+    "  --trace          one line on standard error for each message routed, as it passes:\n"
+    "                   \"trace in|out conn N SOURCE -> TARGET TYPE trans ID BODY\"; in is from\n"
+    "                   connection N, out is to it; addresses read nNODE.bBOARD.pPROCESSOR.\n"
+    "                   cCOMPONENT.iINSTANCE; an event's TYPE is followed by its group's name;\n"
+    "                   BODY is the catalogue's text form of the body (standard output\n"
+    "                   keeps to the control channel's answers)\n"
     "  --help           this text\n"
     "\n"
     "The first line on standard output is \"listening on PORT\". Each connection gets its own\n"
@@ -102,6 +108,8 @@ int main(int argc, char** argv) {
                 return 2;
             }
             options.maxQueuedOutput = static_cast<std::size_t>(m) << 20;
+        } else if (a == "--trace") {
+            options.trace = true;
         } else if (a == "--bind") {
             options.bindAddress = value("an address");
         } else {

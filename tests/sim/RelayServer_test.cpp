@@ -587,6 +587,43 @@ TEST_F(RelayTest, QueuedOutputOfAllClientsIsCappedByCuttingTheWorstReader) {
     EXPECT_EQ(c[2]->read(all[2]).size(), all[2]);
 }
 
+TEST_F(RelayTest, TraceNamesEachRoutedMessageOnOneLine) {
+    RelayOptions o = defaults();
+    o.trace = true;
+    restart(o);
+    RawClient c(port);
+    c.send(c.open());
+    ASSERT_EQ(c.read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES).size(),
+              TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+    c.send(RawClient::request(farm::lconAddress(1, 2), Lcon::MsgGetLineState_t::MsgType));
+    ASSERT_EQ(c.read(TKS_FRAME_HEADER_SIZE).size(), TKS_FRAME_HEADER_SIZE);
+
+    Addressable lcon(cd(farm::lconAddress(1, 2)));
+    lcon.asyncRegisterEvtGroup(0x1600, &Events::take);
+    Std::MsgDetectEvt_t sub;
+    sub.RetAddr = lcon.getMsgQueue()->getHostDesc();
+    sub.EvtType = 0x1600;
+    sub.EvtGroup = 0;
+    lcon.request(0x16, &sub, 0x17, nullptr, lcon.getId());
+    EXPECT_EQ(server->control("alarm 1 2 yellow on"), "ok");
+    ASSERT_TRUE(Events::get().waitFor([](std::uint32_t, const std::vector<std::uint32_t>& w) {
+        return w.size() == 3 && w[1] == 0x1602;
+    }));
+    // The request and its answer, then the subscription's event, each whole on its line.
+    const std::string log = logBuf.text();
+    const std::string exchange =
+        "trace in conn 1 n0.b255.p0.c0.i1 -> n0.b1.p1.c22.i2 MsgGetLineState_t trans 66 {}\n"
+        "trace out conn 1 n0.b1.p1.c22.i2 -> n0.b255.p0.c0.i1 MsgGetLineStateCmplt_t trans 66 "
+        "{LineState 5647 Reason 2}\n";
+    EXPECT_EQ(log.rfind(exchange, 0), 0u) << log;
+    const std::string event =
+        "trace out conn 2 n0.b1.p1.c22.i2 -> n0.b255.p0.c0.i2 MsgEvtDetected_t Evt_0x1600_t trans ";
+    std::size_t at = log.find(event);
+    ASSERT_NE(at, std::string::npos) << log;
+    std::string line = log.substr(at, log.find('\n', at) - at);
+    EXPECT_TRUE(line.ends_with(" {Label 5632 Type 5634 State 1}")) << line;
+}
+
 TEST_F(RelayTest, TheTailOfAnOverlongControlLineDoesNotRun) {
     int p[2];
     ASSERT_EQ(::pipe(p), 0);
