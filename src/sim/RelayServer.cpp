@@ -134,6 +134,9 @@ void RelayServer::run(int controlFd, std::ostream* controlOut) {
         }
     }
     running_ = !stopRequested_.load();
+    scriptNext_ = 0;
+    scriptDue_ = Clock::now();
+    playScript(scriptDue_);
     epoll_event events[256];
     while (running_) {
         int n = epoll_wait(epollFd_, events, 256, timeoutMs());
@@ -175,6 +178,7 @@ void RelayServer::run(int controlFd, std::ostream* controlOut) {
             running_ = false;
         }
         expireUnopened(Clock::now());
+        playScript(Clock::now());
         drainEmulation();
         pumpBursts();
         flushAll();
@@ -190,6 +194,9 @@ int RelayServer::timeoutMs() const {
         return 0;
     }
     auto due = emu_.nextDue();
+    if (scriptNext_ < script_.size() && (!due || scriptDue_ < *due)) {
+        due = scriptDue_;
+    }
     if (!unopened_.empty()) {
         Clock::time_point expiry = unopened_.begin()->second->accepted + options_.openTimeout;
         if (!due || expiry < *due) {
@@ -698,6 +705,18 @@ std::string RelayServer::control(const std::string& line) {
     std::uint64_t one = 1;
     [[maybe_unused]] ssize_t w = ::write(wakeFd_, &one, sizeof one);
     return f.get();
+}
+
+void RelayServer::playScript(Clock::time_point now) {
+    while (running_ && scriptNext_ < script_.size() && scriptDue_ <= now) {
+        const ScriptStep& step = script_[scriptNext_++];
+        if (step.command.empty()) {
+            scriptDue_ = now + std::chrono::milliseconds(step.sleepMs);
+            continue;
+        }
+        log_ << "vx7sim: script line " << step.line << ": " << step.command << ": "
+             << runControl(step.command) << std::endl;
+    }
 }
 
 void RelayServer::runCrossThread() {

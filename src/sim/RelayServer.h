@@ -18,6 +18,7 @@
 
 #include "platform/farm/Farm.h"
 #include "platform/tkhost/tkhost.h"
+#include "sim/Control.h"
 #include "sim/Emulation.h"
 
 namespace sim {
@@ -53,6 +54,10 @@ class RelayServer {
     // answered on controlOut, one line each; end of input there is not a quit.
     void run(int controlFd, std::ostream* controlOut);
 
+    // A scenario played from the start of run(), each command's answer on the log; then the
+    // relay goes on serving. Set before run().
+    void setScript(std::vector<ScriptStep> steps) { script_ = std::move(steps); }
+
     // From any thread: runs one control line in the loop and returns its answer.
     std::string control(const std::string& line);
     // From any thread: ends run().
@@ -85,6 +90,7 @@ class RelayServer {
     void pumpBursts();
     void readControl(int fd, std::ostream* out);
     void runCrossThread();
+    void playScript(Clock::time_point now);
     std::string runControl(const std::string& line);
     bool outputRoom() const;
     int timeoutMs() const;
@@ -109,6 +115,9 @@ class RelayServer {
     std::uint16_t lastInstance_ = 0;
     std::uint64_t serial_ = 0;
     std::string controlPending_;
+    std::vector<ScriptStep> script_;
+    std::size_t scriptNext_ = 0;
+    Clock::time_point scriptDue_;
     bool discardingControl_ = false;  // until the newline of a line refused as too long
     std::atomic<std::size_t> connectionCount_{0};
 

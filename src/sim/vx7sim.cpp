@@ -4,8 +4,11 @@
 #include <csignal>
 #include <cstdlib>
 #include <cstring>
+#include <fstream>
 #include <iostream>
+#include <sstream>
 #include <string>
+#include <vector>
 
 #include "platform/farm/ActiveFarm.h"
 #include "platform/farm/FarmParser.h"
@@ -16,6 +19,7 @@ namespace {
 
 const char* kUsage =
     "usage: vx7sim [--farm FILE] [--port PORT] [--bind ADDRESS] [--max-queued MIB] [--trace]\n"
+    "              [--script FILE]\n"
     "\n"
     "Serves the board emulation of a farm on TCP with the relay protocol of the host\n"
     "transport, so that lineprobe can reach the boards with REMOTE_TKHOST=host:PORT.\n"
@@ -33,6 +37,13 @@ const char* kUsage =
     "                   cCOMPONENT.iINSTANCE; an event's TYPE is followed by its group's name;\n"
     "                   BODY is the catalogue's text form of the body (standard output\n"
     "                   keeps to the control channel's answers)\n"
+    "  --script FILE    play a scenario: control commands as below, one a line, with\n"
+    "                   \"sleep MS\" lines between them, '#' comment lines and blank lines. It\n"
+    "                   starts when vx7sim starts listening; each command's answer goes to\n"
+    "                   standard error as \"vx7sim: script line N: COMMAND: ANSWER\"; at its\n"
+    "                   end vx7sim goes on serving. Every line is checked first: a bad one is\n"
+    "                   reported with its line number and vx7sim exits with status 2, having\n"
+    "                   played nothing. farms/demo.script is an example.\n"
     "  --help           this text\n"
     "\n"
     "The first line on standard output is \"listening on PORT\". Each connection gets its own\n"
@@ -75,6 +86,7 @@ void onSignal(int) {
 
 int main(int argc, char** argv) {
     std::string farmFile;
+    std::string scriptFile;
     sim::RelayOptions options;
     for (int i = 1; i < argc; ++i) {
         std::string a = argv[i];
@@ -108,6 +120,8 @@ int main(int argc, char** argv) {
                 return 2;
             }
             options.maxQueuedOutput = static_cast<std::size_t>(m) << 20;
+        } else if (a == "--script") {
+            scriptFile = value("a file");
         } else if (a == "--trace") {
             options.trace = true;
         } else if (a == "--bind") {
@@ -135,7 +149,26 @@ int main(int argc, char** argv) {
         farm = load.farm;
     }
 
+    std::vector<sim::ScriptStep> script;
+    if (!scriptFile.empty()) {
+        std::ifstream in(scriptFile, std::ios::binary);
+        std::ostringstream text;
+        text << in.rdbuf();
+        if (!in) {
+            std::cerr << "vx7sim: cannot read the script " << scriptFile << std::endl;
+            return 2;
+        }
+        sim::ScriptParse parsed = sim::parseScript(text.str());
+        if (!parsed.ok) {
+            std::cerr << "vx7sim: " << scriptFile << ": " << parsed.error << "; nothing played"
+                      << std::endl;
+            return 2;
+        }
+        script = std::move(parsed.steps);
+    }
+
     sim::RelayServer server(farm, options, std::cerr);
+    server.setScript(std::move(script));
     std::string error;
     if (!server.listen(error)) {
         std::cerr << "vx7sim: " << error << std::endl;
