@@ -223,4 +223,42 @@ const char* controlHelp() {
            "(TYPE and CODE in hex)";
 }
 
+ScriptParse parseScript(std::string_view text) {
+    ScriptParse out;
+    unsigned int number = 0;
+    while (!text.empty()) {
+        std::size_t nl = text.find('\n');
+        std::string_view line = text.substr(0, nl);
+        text.remove_prefix(nl == std::string_view::npos ? text.size() : nl + 1);
+        ++number;
+        std::vector<std::string_view> words = splitWords(line);
+        if (words.empty() || words[0].front() == '#') {
+            continue;
+        }
+        ScriptStep step;
+        step.line = number;
+        if (words[0] == "sleep") {
+            if (words.size() != 2 || !parseNumber(words[1], 10, step.sleepMs) ||
+                step.sleepMs > kMaxSleepMs) {
+                out.error = "line " + std::to_string(number) +
+                            ": sleep takes a number of milliseconds from 0 to " +
+                            std::to_string(kMaxSleepMs);
+                out.steps.clear();
+                return out;
+            }
+        } else {
+            ControlParse p = parseControl(line);
+            if (!p.ok) {
+                out.error = "line " + std::to_string(number) + ": " + p.error;
+                out.steps.clear();
+                return out;
+            }
+            step.command = std::string(line);
+        }
+        out.steps.push_back(std::move(step));
+    }
+    out.ok = true;
+    return out;
+}
+
 }  // namespace sim

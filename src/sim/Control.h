@@ -6,6 +6,7 @@
 #include <cstdint>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace sim {
 
@@ -59,6 +60,24 @@ constexpr std::uint32_t kMaxBurst = 10'000'000;
 constexpr std::uint32_t kMaxDelayMs = 600'000;
 
 const char* controlHelp();
+
+// A scenario: control commands with "sleep MS" between them, '#' comment lines and blank lines.
+struct ScriptStep {
+    unsigned int line = 0;      // in the file, from 1
+    std::uint32_t sleepMs = 0;  // a sleep when command is empty
+    std::string command;
+};
+
+struct ScriptParse {
+    bool ok = false;
+    std::vector<ScriptStep> steps;
+    std::string error;  // "line N: why"
+};
+
+constexpr std::uint32_t kMaxSleepMs = 3'600'000;
+
+// Checks every line before anything is played: one bad line refuses the whole script.
+ScriptParse parseScript(std::string_view text);
 
 }  // namespace sim
 

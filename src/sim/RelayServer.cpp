@@ -13,8 +13,10 @@
 #include <algorithm>
 #include <cstring>
 #include <ostream>
+#include <string_view>
 
 #include "platform/tkhost/tkhost_switch.h"
+#include "sim/Trace.h"
 #include "transport/TKSFrame.h"
 
 namespace sim {
@@ -25,6 +27,7 @@ struct RelayServer::Conn {
     bool opened = false;
     bool dead = false;
     bool wantWrite = false;
+    Clock::time_point accepted;
     TKCompDesc addr{};
     std::vector<unsigned char> in;
     std::size_t inPos = 0;
@@ -37,6 +40,7 @@ struct RelayServer::Conn {
 namespace {
 
 constexpr std::size_t kReadChunk = 256 * 1024;
+constexpr std::size_t kMaxControlLine = 64 * 1024;
 constexpr std::size_t kBurstSlice = 512;
 // Bursts wait while any client has this much unsent.
 constexpr std::size_t kBurstWatermark = 1u << 20;
@@ -130,6 +134,9 @@ void RelayServer::run(int controlFd, std::ostream* controlOut) {
         }
     }
     running_ = !stopRequested_.load();
+    scriptNext_ = 0;
+    scriptDue_ = Clock::now();
+    playScript(scriptDue_);
     epoll_event events[256];
     while (running_) {
         int n = epoll_wait(epollFd_, events, 256, timeoutMs());
@@ -170,6 +177,8 @@ void RelayServer::run(int controlFd, std::ostream* controlOut) {
         if (stopRequested_.load()) {
             running_ = false;
         }
+        expireUnopened(Clock::now());
+        playScript(Clock::now());
         drainEmulation();
         pumpBursts();
         flushAll();
@@ -185,6 +194,15 @@ int RelayServer::timeoutMs() const {
         return 0;
     }
     auto due = emu_.nextDue();
+    if (scriptNext_ < script_.size() && (!due || scriptDue_ < *due)) {
+        due = scriptDue_;
+    }
+    if (!unopened_.empty()) {
+        Clock::time_point expiry = unopened_.begin()->second->accepted + options_.openTimeout;
+        if (!due || expiry < *due) {
+            due = expiry;
+        }
+    }
     if (!due) {
         return emu_.burstsPending() ? 10 : -1;
     }
@@ -225,8 +243,9 @@ void RelayServer::acceptAll() {
             }
             return;
         }
-        if (conns_.size() >= options_.maxConnections) {
-            log_ << "vx7sim: refusing a connection: " << conns_.size() << " already open"
+        makeRoomForNewcomer();
+        if (liveConnections() >= options_.maxConnections) {
+            log_ << "vx7sim: refusing a connection: " << liveConnections() << " already open"
                  << std::endl;
             ::close(fd);
             continue;
@@ -236,6 +255,7 @@ void RelayServer::acceptAll() {
         auto c = std::make_unique<Conn>();
         c->fd = fd;
         c->serial = ++serial_;
+        c->accepted = Clock::now();
         epoll_event ev{};
         ev.events = EPOLLIN;
         ev.data.fd = fd;
@@ -243,8 +263,33 @@ void RelayServer::acceptAll() {
             ::close(fd);
             continue;
         }
+        unopened_[c->serial] = c.get();
         conns_[fd] = std::move(c);
-        connectionCount_.store(conns_.size());
+        connectionCount_.store(liveConnections());
+    }
+}
+
+void RelayServer::makeRoomForNewcomer() {
+    std::size_t unopenedShare = options_.maxConnections > options_.reservedForOpen
+                                    ? options_.maxConnections - options_.reservedForOpen
+                                    : 1;
+    // A newcomer is as likely to open as the oldest idle connection is unlikely to by now.
+    while (!unopened_.empty() &&
+           (unopened_.size() >= unopenedShare || liveConnections() >= options_.maxConnections)) {
+        Conn& oldest = *unopened_.begin()->second;
+        log_ << "vx7sim: connection " << oldest.serial
+             << " has not opened; closing it to make room for a new one" << std::endl;
+        close(oldest, nullptr);
+    }
+}
+
+void RelayServer::expireUnopened(Clock::time_point now) {
+    while (!unopened_.empty() &&
+           now - unopened_.begin()->second->accepted >= options_.openTimeout) {
+        Conn& c = *unopened_.begin()->second;
+        log_ << "vx7sim: connection " << c.serial << " did not open within "
+             << options_.openTimeout.count() << " ms; closing it" << std::endl;
+        close(c, nullptr);
     }
 }
 
@@ -338,6 +383,7 @@ bool RelayServer::handleFrame(Conn& c, std::uint32_t type, const unsigned char* 
             c.addr.board = TK_HOST_BOARD;
             c.addr.instance = inst;
             c.opened = true;
+            unopened_.erase(c.serial);
             byInstance_[inst] = &c;
             unsigned char assigned[TKS_ASSIGNED_BODY_BYTES];
             tksEncodeAssigned(c.addr, assigned);
@@ -364,6 +410,9 @@ bool RelayServer::handleFrame(Conn& c, std::uint32_t type, const unsigned char* 
             block->srcComponent = c.addr.component;
             block->srcNode = c.addr.node;
             block->srcInstance = c.addr.instance;
+            if (options_.trace) {
+                log_ << "trace " << traceLine("in", c.serial, block) << std::endl;
+            }
             route(block);
             return true;
         }
@@ -460,10 +509,30 @@ void RelayServer::sendFrame(Conn& c, std::uint32_t type, const unsigned char* bo
     if (exSize) {
         c.out.insert(c.out.end(), ex, ex + exSize);
     }
+    queued_ += sizeof header + size + exSize;
     if (c.pending() > options_.maxPendingOutput) {
         log_ << "vx7sim: connection " << c.serial << " reads too slowly (" << c.pending()
              << " bytes waiting); closing it" << std::endl;
         close(c, nullptr);
+    }
+    enforceQueuedCap();
+}
+
+void RelayServer::enforceQueuedCap() {
+    while (queued_ > options_.maxQueuedOutput) {
+        Conn* worst = nullptr;
+        for (auto& [fd, c] : conns_) {
+            if (!c->dead && (!worst || c->pending() > worst->pending())) {
+                worst = c.get();
+            }
+        }
+        if (!worst) {
+            return;
+        }
+        log_ << "vx7sim: " << queued_ << " bytes waiting for all clients, over the cap of "
+             << options_.maxQueuedOutput << "; connection " << worst->serial
+             << " has the most unread (" << worst->pending() << "); closing it" << std::endl;
+        close(*worst, nullptr);
     }
 }
 
@@ -471,6 +540,9 @@ void RelayServer::sendBlock(Conn& c, const TKMsg32Bit* block) {
     if (!tksFrameSizesValid(TKS_MSG_HEADER_BYTES, block->size)) {
         emu_.stats().undeliverable++;
         return;
+    }
+    if (options_.trace) {
+        log_ << "trace " << traceLine("out", c.serial, block) << std::endl;
     }
     unsigned char header[TKS_MSG_HEADER_BYTES];
     tksPackMsgHeader(block, header);
@@ -492,6 +564,7 @@ void RelayServer::flush(Conn& c) {
             return;
         }
         c.outPos += static_cast<std::size_t>(n);
+        queued_ -= static_cast<std::size_t>(n);
     }
     if (c.dead) {
         return;
@@ -536,6 +609,10 @@ void RelayServer::close(Conn& c, const char* why) {
     }
     c.dead = true;
     epoll_ctl(epollFd_, EPOLL_CTL_DEL, c.fd, nullptr);
+    unopened_.erase(c.serial);
+    queued_ -= c.pending();
+    c.out.clear();
+    c.outPos = 0;
     if (c.opened) {
         byInstance_.erase(c.addr.instance);
         emu_.forget(c.addr);
@@ -565,21 +642,36 @@ void RelayServer::readControl(int fd, std::ostream* out) {
         if (n <= 0) {
             break;
         }
-        controlPending_.append(buf, static_cast<std::size_t>(n));
-        std::size_t nl;
-        while ((nl = controlPending_.find('\n')) != std::string::npos) {
-            std::string line = controlPending_.substr(0, nl);
-            controlPending_.erase(0, nl + 1);
-            std::string reply = runControl(line);
-            if (!reply.empty() && out) {
-                *out << reply << std::endl;
+        std::string_view chunk(buf, static_cast<std::size_t>(n));
+        while (!chunk.empty()) {
+            std::size_t nl = chunk.find('\n');
+            if (discardingControl_) {
+                // The rest of a refused line is not a command of its own.
+                if (nl == std::string_view::npos) {
+                    break;
+                }
+                discardingControl_ = false;
+                chunk.remove_prefix(nl + 1);
+                continue;
             }
-        }
-        if (controlPending_.size() > 64 * 1024) {
-            controlPending_.clear();
-            if (out) {
-                *out << "error: control line too long" << std::endl;
+            controlPending_.append(chunk.substr(0, nl));
+            if (controlPending_.size() > kMaxControlLine) {
+                controlPending_.clear();
+                discardingControl_ = nl == std::string_view::npos;
+                if (out) {
+                    *out << "error: control line too long" << std::endl;
+                }
+            } else if (nl != std::string_view::npos) {
+                std::string reply = runControl(controlPending_);
+                controlPending_.clear();
+                if (!reply.empty() && out) {
+                    *out << reply << std::endl;
+                }
             }
+            if (nl == std::string_view::npos) {
+                break;
+            }
+            chunk.remove_prefix(nl + 1);
         }
     }
 }
@@ -587,7 +679,7 @@ void RelayServer::readControl(int fd, std::ostream* out) {
 std::string RelayServer::runControl(const std::string& line) {
     ControlOutcome o = emu_.control(line);
     if (o.drop) {
-        std::size_t n = conns_.size();
+        std::size_t n = liveConnections();
         dropAll();
         reap();
         o.reply = "ok dropped " + std::to_string(n);
@@ -596,7 +688,8 @@ std::string RelayServer::runControl(const std::string& line) {
         running_ = false;
     }
     if (o.reply.rfind("ok stats", 0) == 0) {
-        o.reply += " connections=" + std::to_string(conns_.size());
+        o.reply += " connections=" + std::to_string(liveConnections()) +
+                   " queued=" + std::to_string(queued_);
     }
     drainEmulation();
     return o.reply;
@@ -612,6 +705,18 @@ std::string RelayServer::control(const std::string& line) {
     std::uint64_t one = 1;
     [[maybe_unused]] ssize_t w = ::write(wakeFd_, &one, sizeof one);
     return f.get();
+}
+
+void RelayServer::playScript(Clock::time_point now) {
+    while (running_ && scriptNext_ < script_.size() && scriptDue_ <= now) {
+        const ScriptStep& step = script_[scriptNext_++];
+        if (step.command.empty()) {
+            scriptDue_ = now + std::chrono::milliseconds(step.sleepMs);
+            continue;
+        }
+        log_ << "vx7sim: script line " << step.line << ": " << step.command << ": "
+             << runControl(step.command) << std::endl;
+    }
 }
 
 void RelayServer::runCrossThread() {

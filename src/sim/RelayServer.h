@@ -5,6 +5,7 @@
 #define LINEPROBE_SIM_RELAYSERVER_H
 
 #include <atomic>
+#include <chrono>
 #include <cstdint>
 #include <deque>
 #include <future>
@@ -17,6 +18,7 @@
 
 #include "platform/farm/Farm.h"
 #include "platform/tkhost/tkhost.h"
+#include "sim/Control.h"
 #include "sim/Emulation.h"
 
 namespace sim {
@@ -25,8 +27,16 @@ struct RelayOptions {
     int port = 6554;  // 0 picks a free port
     std::string bindAddress = "0.0.0.0";
     std::size_t maxConnections = 4096;
+    // A connection that has not opened within this time is closed. Those not yet open never
+    // hold the last reservedForOpen slots: past that, the oldest of them makes way for a newcomer.
+    std::chrono::milliseconds openTimeout{5000};
+    std::size_t reservedForOpen = 64;
     // A client that lets this much pile up unread is cut off.
     std::size_t maxPendingOutput = 64u << 20;
+    // What all clients together may leave unread; past it the worst reader is cut off first.
+    std::size_t maxQueuedOutput = 256u << 20;
+    // Each message routed, one line on the log (see Trace.h).
+    bool trace = false;
 };
 
 class RelayServer {
@@ -43,6 +53,10 @@ class RelayServer {
     // Serves until "quit" or stop(). Control lines are read from controlFd (-1 for none) and
     // answered on controlOut, one line each; end of input there is not a quit.
     void run(int controlFd, std::ostream* controlOut);
+
+    // A scenario played from the start of run(), each command's answer on the log; then the
+    // relay goes on serving. Set before run().
+    void setScript(std::vector<ScriptStep> steps) { script_ = std::move(steps); }
 
     // From any thread: runs one control line in the loop and returns its answer.
     std::string control(const std::string& line);
@@ -66,12 +80,17 @@ class RelayServer {
     void flush(Conn& c);
     void flushAll();
     void close(Conn& c, const char* why);
+    void expireUnopened(Clock::time_point now);
+    void makeRoomForNewcomer();
+    void enforceQueuedCap();
+    std::size_t liveConnections() const { return conns_.size() - doomed_.size(); }
     void reap();
     void dropAll();
     void drainEmulation();
     void pumpBursts();
     void readControl(int fd, std::ostream* out);
     void runCrossThread();
+    void playScript(Clock::time_point now);
     std::string runControl(const std::string& line);
     bool outputRoom() const;
     int timeoutMs() const;
@@ -90,10 +109,16 @@ class RelayServer {
     bool running_ = false;
     std::map<int, std::unique_ptr<Conn>> conns_;  // by descriptor
     std::map<std::uint16_t, Conn*> byInstance_;   // by assigned address
+    std::map<std::uint64_t, Conn*> unopened_;     // by serial, so the oldest first
+    std::size_t queued_ = 0;                      // unsent bytes of every live connection
     std::vector<int> doomed_;
     std::uint16_t lastInstance_ = 0;
     std::uint64_t serial_ = 0;
     std::string controlPending_;
+    std::vector<ScriptStep> script_;
+    std::size_t scriptNext_ = 0;
+    Clock::time_point scriptDue_;
+    bool discardingControl_ = false;  // until the newline of a line refused as too long
     std::atomic<std::size_t> connectionCount_{0};
 
     std::mutex crossLock_;

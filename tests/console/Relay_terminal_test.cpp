@@ -2,7 +2,11 @@
 // line states, incoming calls, a silent board and a dropped relay connection.
 #include <gtest/gtest.h>
 
+#include <sys/wait.h>
+#include <unistd.h>
+
 #include <chrono>
+#include <cstdio>
 #include <string>
 #include <thread>
 
@@ -14,6 +18,7 @@ namespace lineprobe::testing {
 namespace {
 
 const std::string FARM = LINEPROBE_FARMS_DIR "/default.toml";
+const std::string DEMO = LINEPROBE_FARMS_DIR "/demo.script";
 
 TerminalOptions ThroughRelay(const SimServer& sim) {
     TerminalOptions options;
@@ -128,6 +133,69 @@ TEST_F(RelayTest, SilentBoardAndDroppedRelayLeaveThePromptWorking) {
     const auto errors = session.ReadErrLog();
     ASSERT_TRUE(log && errors);
     EXPECT_NE((*log + *errors).find("Timeout"), std::string::npos);
+}
+
+// The README's demo scenario, played by vx7sim itself: each step shows on the rows before the
+// next one does.
+TEST(RelayScript, DemoScenarioReachesTheRowsInItsOrder) {
+    SimServer sim(FARM, {"--script", DEMO});
+    ASSERT_TRUE(sim.Running());
+    TerminalSession session(ThroughRelay(sim));
+    CommandRunner commands(session);
+    ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
+    ASSERT_TRUE(commands.Run("phone 1 1 2"));
+    ASSERT_TRUE(commands.Run("trunk 1 1"));
+    ASSERT_TRUE(session.WaitForTextAt(TRUNK_ROW0 + 1, WINDOW_COL0 + 8, "InService"))
+        << session.Dump();
+    auto call = [&] { return session.TextAt(PHONE_ROW0 + 1, WINDOW_COL0 + 47, 12); };
+    auto red = [&] { return session.TextAt(TRUNK_ROW0 + 1, WINDOW_COL0 + 54, 1); };
+    auto bpv = [&] { return session.TextAt(TRUNK_ROW0 + 1, WINDOW_COL0 + 85, 2); };
+    // The scenario waits 5 s before its first step; the views are open well before that.
+    ASSERT_EQ(call().rfind("Offered", 0), std::string::npos) << session.Dump();
+    ASSERT_EQ(red(), " ");
+
+    const auto step = std::chrono::milliseconds(15000);
+    ASSERT_TRUE(session.WaitForTextAt(PHONE_ROW0 + 1, WINDOW_COL0 + 47, "Offered", step))
+        << session.Dump();
+    EXPECT_EQ(red(), " ") << session.Dump();
+    ASSERT_TRUE(session.WaitForTextAt(TRUNK_ROW0 + 1, WINDOW_COL0 + 54, "X", step))
+        << session.Dump();
+    EXPECT_EQ(bpv(), "0 ") << session.Dump();
+    ASSERT_TRUE(session.WaitForTextAt(TRUNK_ROW0 + 1, WINDOW_COL0 + 54, " ", step))
+        << session.Dump();
+    ASSERT_TRUE(session.WaitForTextAt(TRUNK_ROW0 + 1, WINDOW_COL0 + 85, "25", step))
+        << session.Dump();
+    EXPECT_EQ(call().rfind("Offered", 0), 0u) << session.Dump();
+    EXPECT_TRUE(session.WaitForTextAt(PHONE_ROW0 + 1, WINDOW_COL0 + 47, "Disconnected", step))
+        << session.Dump();
+    EXPECT_TRUE(session.StillRunning());
+}
+
+TEST(RelayScript, ABadLineIsRefusedWithItsNumberAndNothingPlays) {
+    char path[] = "/tmp/vx7sim_scriptXXXXXX";
+    const int fd = mkstemp(path);
+    ASSERT_GE(fd, 0);
+    const std::string script =
+        "# a good line first\ncall 1 1 2 5550000\nsleep 100\n\n"
+        "alarm 1 1 purple on\nhangup 1 1 2\n";
+    ASSERT_EQ(write(fd, script.data(), script.size()), static_cast<ssize_t>(script.size()));
+    close(fd);
+    const std::string command = std::string(VX7SIM_BINARY) +
+                                " --port 0 --bind 127.0.0.1 --script " + path + " 2>&1 </dev/null";
+    FILE* out = popen(command.c_str(), "r");
+    ASSERT_NE(out, nullptr);
+    std::string text;
+    char buf[512];
+    for (std::size_t n; (n = fread(buf, 1, sizeof buf, out)) > 0;) {
+        text.append(buf, n);
+    }
+    const int status = pclose(out);
+    unlink(path);
+    EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 2) << status;
+    // Neither served nor played: the one line says which line is wrong, and why.
+    EXPECT_EQ(text, std::string("vx7sim: ") + path +
+                        ": line 5: unknown alarm \"purple\" (red, yellow, ais, los, loopback, "
+                        "raicrc, dchan); nothing played\n");
 }
 
 TEST(RelayHelp, EventsDuringThePagerDrawOnlyWhenTheScreenComesBack) {

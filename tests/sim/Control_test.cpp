@@ -111,5 +111,45 @@ INSTANTIATE_TEST_SUITE_P(
         BadCase{"delay 600001", "MS must be a number from 0 to 600000, not \"600001\""},
         BadCase{"stats now", "stats takes 0 arguments, got 1"}));
 
+TEST(ControlScript, StepsKeepTheirLineNumbersAndSleeps) {
+    ScriptParse p = parseScript("# ring\n\ncall 1 1 2 5550100\r\n  sleep 250\nalarm 1 1 red on");
+    ASSERT_TRUE(p.ok) << p.error;
+    ASSERT_EQ(p.steps.size(), 3u);
+    EXPECT_EQ(p.steps[0].line, 3u);
+    EXPECT_EQ(p.steps[0].command, "call 1 1 2 5550100\r");
+    EXPECT_EQ(p.steps[1].line, 4u);
+    EXPECT_EQ(p.steps[1].command, "");
+    EXPECT_EQ(p.steps[1].sleepMs, 250u);
+    EXPECT_EQ(p.steps[2].line, 5u);
+    EXPECT_EQ(p.steps[2].command, "alarm 1 1 red on");
+}
+
+struct BadScript {
+    const char* text;
+    const char* error;
+};
+
+class ControlScriptBad : public testing::TestWithParam<BadScript> {};
+
+TEST_P(ControlScriptBad, OneBadLineRefusesTheWholeScript) {
+    ScriptParse p = parseScript(GetParam().text);
+    EXPECT_FALSE(p.ok);
+    EXPECT_TRUE(p.steps.empty());
+    EXPECT_EQ(p.error, GetParam().error);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Lines, ControlScriptBad,
+    testing::Values(BadScript{"call 1 1 2 5550100\nsleep\n",
+                              "line 2: sleep takes a number of milliseconds "
+                              "from 0 to 3600000"},
+                    BadScript{"sleep 3600001",
+                              "line 1: sleep takes a number of milliseconds from 0 to "
+                              "3600000"},
+                    BadScript{"sleep 10 20",
+                              "line 1: sleep takes a number of milliseconds from 0 to 3600000"},
+                    BadScript{"stats\n\n# fine so far\nhangup 1 1\nstats\n",
+                              "line 4: hangup takes 3 arguments, got 2"}));
+
 }  // namespace
 }  // namespace sim

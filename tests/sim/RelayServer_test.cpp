@@ -94,8 +94,13 @@ struct Events {
 // A plain TCP client for raw frames.
 class RawClient {
   public:
-    explicit RawClient(int port) {
+    // A receive buffer of rcvbuf bytes (0: the system's) keeps what the kernel holds for a
+    // client that does not read small against what the server queues.
+    explicit RawClient(int port, int rcvbuf = 0) {
         fd = ::socket(AF_INET, SOCK_STREAM, 0);
+        if (rcvbuf > 0) {
+            setsockopt(fd, SOL_SOCKET, SO_RCVBUF, &rcvbuf, sizeof rcvbuf);
+        }
         sockaddr_in sa{};
         sa.sin_family = AF_INET;
         sa.sin_port = htons(static_cast<std::uint16_t>(port));
@@ -124,6 +129,22 @@ class RawClient {
         m.size = sizeof body;
         m.body = body;
         return tksEncodeFrame(m);
+    }
+    // A message frame of a request without a body.
+    static std::vector<unsigned char> request(const farm::Address& to, std::uint32_t type) {
+        TKMsg32Bit* block = nullptr;
+        EXPECT_EQ(tkMsgAllocate(0, &block), 0);
+        block->type = type;
+        block->transTag = 0x4200;
+        block->tgtInstance = to.instance;
+        block->tgtBoard = to.board;
+        block->tgtProcessor = to.processor;
+        block->tgtComponent = to.component;
+        block->tgtNode = to.node;
+        std::vector<unsigned char> frame;
+        EXPECT_TRUE(tksEncodeMessageFrame(block, frame));
+        tkMsgFree(block);
+        return frame;
     }
     // Reads n bytes; fewer if the server closed.
     std::vector<unsigned char> read(std::size_t n) {
@@ -182,21 +203,23 @@ class RelayTest : public testing::Test {
         unsetenv("HOST");
         auto load = farm::activeFarm();
         ASSERT_TRUE(load.farm);
-        RelayOptions o;
-        o.port = 0;
-        o.bindAddress = "127.0.0.1";
-        server = std::make_unique<RelayServer>(load.farm, o, log);
-        std::string error;
-        ASSERT_TRUE(server->listen(error)) << error;
-        port = server->port();
-        loop = std::thread([this] { server->run(-1, nullptr); });
-        std::string host = "127.0.0.1:" + std::to_string(port);
-        setenv("REMOTE_TKHOST", host.c_str(), 1);
+        farm_ = load.farm;
+        start(defaults());
     }
     void TearDown() override {
         unsetenv("REMOTE_TKHOST");
-        server->stop();
-        loop.join();
+        halt();
+    }
+    static RelayOptions defaults() {
+        RelayOptions o;
+        o.port = 0;
+        o.bindAddress = "127.0.0.1";
+        return o;
+    }
+    // Replaces the running server by one with these options and control channel.
+    void restart(const RelayOptions& o, int controlFd = -1, std::ostream* controlOut = nullptr) {
+        halt();
+        start(o, controlFd, controlOut);
     }
     bool waitConnections(std::size_t n) {
         for (int i = 0; i < 500; ++i) {
@@ -213,6 +236,25 @@ class RelayTest : public testing::Test {
     std::unique_ptr<RelayServer> server;
     std::thread loop;
     int port = 0;
+
+  private:
+    void start(const RelayOptions& o, int controlFd = -1, std::ostream* controlOut = nullptr) {
+        server = std::make_unique<RelayServer>(farm_, o, log);
+        std::string error;
+        ASSERT_TRUE(server->listen(error)) << error;
+        port = server->port();
+        loop = std::thread([this, controlFd, controlOut] { server->run(controlFd, controlOut); });
+        std::string host = "127.0.0.1:" + std::to_string(port);
+        setenv("REMOTE_TKHOST", host.c_str(), 1);
+    }
+    void halt() {
+        if (loop.joinable()) {
+            server->stop();
+            loop.join();
+        }
+    }
+
+    std::shared_ptr<const farm::Farm> farm_;
 };
 
 TEST_F(RelayTest, ClientsGetTheirOwnAddressesAndAnswers) {
@@ -446,6 +488,172 @@ TEST_F(RelayTest, CloseIsAcknowledged) {
     ::close(c.fd);
     c.fd = -1;
     EXPECT_TRUE(waitConnections(0));
+}
+
+TEST_F(RelayTest, IdleConnectionsDoNotLockOutAClientThatOpens) {
+    RelayOptions o = defaults();
+    o.maxConnections = 8;
+    o.reservedForOpen = 2;
+    o.openTimeout = std::chrono::milliseconds(600);
+    restart(o);
+
+    std::vector<std::unique_ptr<RawClient>> idle;
+    for (int i = 0; i < 8; ++i) {
+        idle.push_back(std::make_unique<RawClient>(port));
+        ASSERT_TRUE(idle.back()->connected);
+    }
+    RawClient late(port);
+    late.send(late.open());
+    ASSERT_EQ(late.read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES).size(),
+              TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+
+    // Every idle one is closed in time (the oldest first, to make room), the open one stays.
+    for (auto& c : idle) {
+        EXPECT_TRUE(c->closedByServer());
+    }
+    EXPECT_TRUE(waitConnections(1));
+    EXPECT_NE(logBuf.text().find("did not open within 600 ms"), std::string::npos);
+    late.send(RawClient::request(farm::lconAddress(1, 1), Lcon::MsgGetLineState_t::MsgType));
+    msg_t h;
+    std::vector<unsigned char> reply = late.read(TKS_FRAME_HEADER_SIZE);
+    ASSERT_EQ(reply.size(), TKS_FRAME_HEADER_SIZE);
+    tksDecodeFrameHeader(reply.data(), h);
+    EXPECT_EQ(h.type, TKS_FRAME_MESSAGE);
+}
+
+// A counter of the relay's "stats" line.
+unsigned long statsCounter(RelayServer& server, const std::string& name) {
+    std::string s = server.control("stats");
+    std::size_t at = s.find(" " + name + "=");
+    return at == std::string::npos ? 0 : std::stoul(s.substr(at + name.size() + 2));
+}
+
+TEST_F(RelayTest, QueuedOutputOfAllClientsIsCappedByCuttingTheWorstReader) {
+    constexpr unsigned long kMiB = 1u << 20;
+    RelayOptions o = defaults();
+    o.maxQueuedOutput = 6 * kMiB;
+    restart(o);
+
+    std::vector<std::unique_ptr<RawClient>> c;
+    for (int i = 0; i < 3; ++i) {
+        c.push_back(std::make_unique<RawClient>(port, 4096));
+        c.back()->send(c.back()->open());
+        ASSERT_EQ(c.back()->read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES).size(),
+                  TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+    }
+    // Batches of pipelined requests whose answers nobody reads. What the kernel holds varies,
+    // so each client goes on until the relay itself holds its share: 4.5 MiB for the first,
+    // 1 MiB more for the second; the third then passes the cap, but the first is the worst.
+    std::vector<unsigned char> batch;
+    const std::vector<unsigned char> ask =
+        RawClient::request(farm::lconAddress(1, 1), Lcon::MsgGetLineState_t::MsgType);
+    for (int k = 0; k < 1024; ++k) {
+        batch.insert(batch.end(), ask.begin(), ask.end());
+    }
+    unsigned long asked = 0;
+    std::size_t batches[3] = {0, 0, 0};
+    auto pipeline = [&](int i, auto done) {
+        for (int n = 0; n < 400 && !done(); ++n) {
+            c[i]->send(batch);
+            asked += 1024;
+            ++batches[i];
+            for (int w = 0; w < 500 && statsCounter(*server, "requests") < asked; ++w) {
+                std::this_thread::sleep_for(std::chrono::milliseconds(2));
+            }
+        }
+    };
+    pipeline(0, [&] { return statsCounter(*server, "queued") >= 9 * kMiB / 2; });
+    pipeline(1, [&] { return statsCounter(*server, "queued") >= 11 * kMiB / 2; });
+    pipeline(2, [&] { return server->connectionCount() < 3; });
+    ASSERT_TRUE(waitConnections(2));
+    EXPECT_LE(statsCounter(*server, "queued"), 6 * kMiB);
+    EXPECT_NE(logBuf.text().find("most unread"), std::string::npos);
+
+    // The two others get every answer; the first one's stop short.
+    std::vector<unsigned char> head = c[1]->read(TKS_FRAME_HEADER_SIZE);
+    ASSERT_EQ(head.size(), TKS_FRAME_HEADER_SIZE);
+    msg_t h;
+    tksDecodeFrameHeader(head.data(), h);
+    const std::size_t answer = TKS_FRAME_HEADER_SIZE + h.size + h.ex_size;
+    for (int i = 0; i < 3; ++i) {
+        int roomy = 1 << 20;  // reading it all through 4 KiB would take seconds
+        setsockopt(c[i]->fd, SOL_SOCKET, SO_RCVBUF, &roomy, sizeof roomy);
+    }
+    const std::size_t all[3] = {batches[0] * 1024 * answer,
+                                batches[1] * 1024 * answer - TKS_FRAME_HEADER_SIZE,
+                                batches[2] * 1024 * answer};
+    EXPECT_LT(c[0]->read(all[0]).size(), all[0]);
+    EXPECT_EQ(c[1]->read(all[1]).size(), all[1]);
+    EXPECT_EQ(c[2]->read(all[2]).size(), all[2]);
+}
+
+TEST_F(RelayTest, TraceNamesEachRoutedMessageOnOneLine) {
+    RelayOptions o = defaults();
+    o.trace = true;
+    restart(o);
+    RawClient c(port);
+    c.send(c.open());
+    ASSERT_EQ(c.read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES).size(),
+              TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+    c.send(RawClient::request(farm::lconAddress(1, 2), Lcon::MsgGetLineState_t::MsgType));
+    ASSERT_EQ(c.read(TKS_FRAME_HEADER_SIZE).size(), TKS_FRAME_HEADER_SIZE);
+
+    Addressable lcon(cd(farm::lconAddress(1, 2)));
+    lcon.asyncRegisterEvtGroup(0x1600, &Events::take);
+    Std::MsgDetectEvt_t sub;
+    sub.RetAddr = lcon.getMsgQueue()->getHostDesc();
+    sub.EvtType = 0x1600;
+    sub.EvtGroup = 0;
+    lcon.request(0x16, &sub, 0x17, nullptr, lcon.getId());
+    EXPECT_EQ(server->control("alarm 1 2 yellow on"), "ok");
+    ASSERT_TRUE(Events::get().waitFor([](std::uint32_t, const std::vector<std::uint32_t>& w) {
+        return w.size() == 3 && w[1] == 0x1602;
+    }));
+    // The request and its answer, then the subscription's event, each whole on its line.
+    const std::string log = logBuf.text();
+    const std::string exchange =
+        "trace in conn 1 n0.b255.p0.c0.i1 -> n0.b1.p1.c22.i2 MsgGetLineState_t trans 66 {}\n"
+        "trace out conn 1 n0.b1.p1.c22.i2 -> n0.b255.p0.c0.i1 MsgGetLineStateCmplt_t trans 66 "
+        "{LineState 5647 Reason 2}\n";
+    EXPECT_EQ(log.rfind(exchange, 0), 0u) << log;
+    const std::string event =
+        "trace out conn 2 n0.b1.p1.c22.i2 -> n0.b255.p0.c0.i2 MsgEvtDetected_t Evt_0x1600_t trans ";
+    std::size_t at = log.find(event);
+    ASSERT_NE(at, std::string::npos) << log;
+    std::string line = log.substr(at, log.find('\n', at) - at);
+    EXPECT_TRUE(line.ends_with(" {Label 5632 Type 5634 State 1}")) << line;
+}
+
+TEST_F(RelayTest, TheTailOfAnOverlongControlLineDoesNotRun) {
+    int p[2];
+    ASSERT_EQ(::pipe(p), 0);
+    LockedLog answers;
+    std::ostream out(&answers);
+    restart(defaults(), p[0], &out);
+
+    std::string input(69632, 'x');
+    input += "stats\nhelp\n";
+    std::thread writer([&] {
+        std::size_t done = 0;
+        while (done < input.size()) {
+            ssize_t n = ::write(p[1], input.data() + done, input.size() - done);
+            if (n <= 0) {
+                break;
+            }
+            done += static_cast<std::size_t>(n);
+        }
+    });
+    writer.join();
+    std::string got;
+    for (int i = 0; i < 500 && got.find("ok commands") == std::string::npos; ++i) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(10));
+        got = answers.text();
+    }
+    EXPECT_EQ(got.substr(0, got.find("ok commands")), "error: control line too long\n");
+    EXPECT_EQ(got.find("ok stats"), std::string::npos);
+    ::close(p[1]);
+    restart(defaults());
+    ::close(p[0]);
 }
 
 }  // namespace

@@ -11,7 +11,15 @@
 
 namespace lineprobe::testing {
 
-SimServer::SimServer(const std::string& farmFile) {
+SimServer::SimServer(const std::string& farmFile, const std::vector<std::string>& extraArgs) {
+    std::vector<std::string> args = {VX7SIM_BINARY, "--farm", farmFile,   "--port",
+                                     "0",           "--bind", "127.0.0.1"};
+    args.insert(args.end(), extraArgs.begin(), extraArgs.end());
+    std::vector<char*> argv;
+    for (std::string& a : args) {
+        argv.push_back(a.data());
+    }
+    argv.push_back(nullptr);
     int in[2];
     int out[2];
     if (pipe2(in, O_CLOEXEC) != 0) {
@@ -30,8 +38,7 @@ SimServer::SimServer(const std::string& farmFile) {
         if (devNull >= 0) {
             dup2(devNull, STDERR_FILENO);
         }
-        execl(VX7SIM_BINARY, VX7SIM_BINARY, "--farm", farmFile.c_str(), "--port", "0", "--bind",
-              "127.0.0.1", static_cast<char*>(nullptr));
+        execv(VX7SIM_BINARY, argv.data());
         _exit(127);
     }
     close(in[0]);

@@ -5,6 +5,7 @@
 #include <chrono>
 #include <cstdio>
 #include <string>
+#include <vector>
 
 namespace lineprobe::testing {
 
@@ -14,7 +15,8 @@ class SimServer {
   public:
     // The farm file is played by the relay; lineprobe must be given the same one in
     // VX7_FARM, since its device map reads the farm itself.
-    explicit SimServer(const std::string& farmFile);
+    // extraArgs are added to vx7sim's command line (--script FILE, --trace).
+    explicit SimServer(const std::string& farmFile, const std::vector<std::string>& extraArgs = {});
     ~SimServer();
 
     SimServer(const SimServer&) = delete;
