@@ -1,5 +1,6 @@
 #include "transport/TKSMsgQueue.h"
 
+#include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <exception>
@@ -25,7 +26,9 @@ const char* chooseHost(const char* remoteHost) {
 
 }  // namespace
 
-TKSMsgQueue::CreationError::CreationError(const char* name) {
+TKSMsgQueue::CreationError::CreationError(const char* name, int port, const char* why)
+    : port(port) {
+    std::snprintf(reason, sizeof reason, "%s", why != nullptr ? why : "");
     hostName[0] = '\0';
     if (name != nullptr) {
         std::strncpy(hostName, name, sizeof hostName - 1);
@@ -44,8 +47,11 @@ TKSMsgQueue::TKSMsgQueue(TKCompDesc addr, unsigned int maxRetMsgSize, unsigned i
         } else {
             transport = new TKSRemoteMsgQueue(addr, maxRetMsgSize, depth, host);
         }
+    } catch (const TKSRemoteOpenError& e) {
+        throw CreationError(host, e.getPort(), e.getReason());
     } catch (TKSResource_CreationError&) {
-        throw CreationError(host);
+        throw CreationError(host, 0,
+                            host == nullptr ? "the host message library refused a queue" : nullptr);
     }
     hostDesc = transport->hostDesc;
     replyGate.lock();

@@ -15,11 +15,17 @@ class TKSMsgQueue : public TKSRunnable {
   public:
     class CreationError : public TKSResource_CreationError {
       public:
-        explicit CreationError(const char* hostName);
+        // hostName as the user gave it (null for the local transport); port 0 when none was
+        // tried; reason in a few words, empty when the transport did not say.
+        explicit CreationError(const char* hostName, int port = 0, const char* reason = nullptr);
         const char* getHostName() const { return hostName; }
+        int getPort() const { return port; }
+        const char* getReason() const { return reason; }
 
       private:
         char hostName[100];
+        int port = 0;
+        char reason[160];
     };
 
     // remoteHost null: "REMOTE_TKHOST" decides; a host whose name begins with "HOST" is this one.

@@ -288,6 +288,71 @@ TEST(RemoteQueue, RelayThatClosesBeforeAnsweringTheOpenIsACreationError) {
     relay.join();
 }
 
+// Answers to the open that stop short, or announce more than an address can be. The relay keeps
+// the connection open well past the open's limit, so only the client's own limit can end the
+// wait; an announced size that no address has is refused without waiting for its bytes.
+struct PartialOpenCase {
+    const char* name;
+    Bytes answer;
+    std::chrono::milliseconds within;
+    const char* reason;
+};
+
+Bytes firstHalfOfTheHeader() {
+    Bytes b = frameHeader(TKS_FRAME_ASSIGNED, TKS_ASSIGNED_BODY_BYTES, 0);
+    b.resize(10);
+    return b;
+}
+
+class RemotePartialOpen : public ::testing::TestWithParam<PartialOpenCase> {};
+
+TEST_P(RemotePartialOpen, FailsWithinTheOpensLimit) {
+    const PartialOpenCase& c = GetParam();
+    std::mutex m;
+    std::condition_variable cv;
+    bool done = false;
+    ScriptedRelay relay([&](sock& conn) {
+        msg_t open;
+        ASSERT_EQ(0, conn.get_msg(open));
+        free_msg(open);
+        ScriptedRelay::sendRaw(conn, c.answer);
+        std::unique_lock<std::mutex> lk(m);
+        cv.wait_for(lk, 9s, [&] { return done; });
+    });
+    auto t0 = Clock::now();
+    std::string reason = "no CreationError";
+    try {
+        delete openQueue(relay);
+    } catch (const TKSMsgQueue::CreationError& e) {
+        reason = e.getReason();
+        EXPECT_EQ(relay.address(), e.getHostName());
+        EXPECT_EQ(std::to_string(e.getPort()), relay.address().substr(10));
+    }
+    auto took = Clock::now() - t0;
+    {
+        std::lock_guard<std::mutex> lk(m);
+        done = true;
+    }
+    cv.notify_all();
+    relay.join();
+    EXPECT_LT(took, c.within) << std::chrono::duration_cast<std::chrono::milliseconds>(took).count()
+                              << " ms";
+    EXPECT_NE(std::string::npos, reason.find(c.reason)) << reason;
+}
+
+// The open's limit is 5 s; a loaded machine gets 1.5 s more.
+INSTANTIATE_TEST_SUITE_P(
+    Answers, RemotePartialOpen,
+    ::testing::Values(PartialOpenCase{"HalfAHeader", firstHalfOfTheHeader(), 6500ms,
+                                      "incomplete answer to the open within 5 s (10 of 40 bytes)"},
+                      PartialOpenCase{"HeaderWithoutItsBody",
+                                      frameHeader(TKS_FRAME_ASSIGNED, TKS_ASSIGNED_BODY_BYTES, 0),
+                                      6500ms,
+                                      "incomplete answer to the open within 5 s (20 of 40 bytes)"},
+                      PartialOpenCase{"AbsurdSize", frameHeader(TKS_FRAME_ASSIGNED, 0xFFFFFFFFu, 0),
+                                      1000ms, "an address of 4294967295 bytes, not 20"}),
+    [](const ::testing::TestParamInfo<PartialOpenCase>& i) { return std::string(i.param.name); });
+
 TEST(RemoteQueue, DestructionWithAPeerThatVanishedDoesNotWait) {
     ScriptedRelay relay([](sock& conn) { ASSERT_TRUE(ScriptedRelay::acceptOpen(conn)); });
     testing::internal::CaptureStderr();
