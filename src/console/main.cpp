@@ -1,4 +1,5 @@
 #include <csignal>
+#include <exception>
 #include <iostream>
 
 #include <cstdlib>
@@ -46,6 +47,8 @@ int main(int argc, char* argv[]) {
         ProcessCmdLineArgs(argc - 1, argv + 1);
         return 0;
     }
+
+    std::set_terminate(ReportUncaughtAndAbort);
 
     if (signal(SIGINT, terminate_app) == SIG_ERR || signal(SIGTERM, terminate_app) == SIG_ERR ||
         signal(SIGUSR1, terminate_app) == SIG_ERR) {
