@@ -1,5 +1,6 @@
 #include "transport/TKSRemoteMsgQueue.h"
 
+#include <algorithm>
 #include <cerrno>
 #include <chrono>
 #include <cstdio>
@@ -77,6 +78,21 @@ std::string answerMissing(long result, long got, long wanted) {
 std::unique_ptr<sock> TKSRemoteMsgQueue::openConnection(TKCompDesc& assigned, std::string& reason) {
     auto s = std::make_unique<sock>(hostName, TKS_DEFAULT_PORT);
     port = s->getPort();
+    struct Opening {
+        TKSRemoteMsgQueue* q;
+        ~Opening() {
+            std::lock_guard<std::mutex> lk(q->sockLock);
+            q->opening = nullptr;
+        }
+    } registered{this};
+    {
+        std::lock_guard<std::mutex> lk(sockLock);
+        opening = s.get();
+        if (closing.load()) {
+            reason = "the queue is closing";
+            return nullptr;
+        }
+    }
     if (s->isFailed()) {
         reason = "cannot resolve the relay's host name";
         return nullptr;
@@ -172,7 +188,12 @@ bool TKSRemoteMsgQueue::sendClose() {
 }
 
 void TKSRemoteMsgQueue::closeExchange() {
-    if (readerGone.load() || socket->isFailed()) {
+    bool gone;
+    {
+        std::lock_guard<std::mutex> lk(sockLock);
+        gone = !up.load() || socket->isFailed();
+    }
+    if (readerGone.load() || gone) {
         closeSent = true;
         return;
     }
@@ -187,7 +208,51 @@ void TKSRemoteMsgQueue::sendLastMessage() {
         closing = true;
     }
     closingCond.notify_all();
+    std::lock_guard<std::mutex> lk(sockLock);
     socket->interrupt();
+    if (opening != nullptr) {
+        opening->interrupt();
+    }
+}
+
+int TKSRemoteMsgQueue::reconnect(const char* why) {
+    up = false;
+    if (connectionChanged) {
+        connectionChanged(false, why);
+    }
+    auto pause = std::chrono::milliseconds(RECONNECT_FIRST_MS);
+    for (;;) {
+        {
+            std::unique_lock<std::mutex> lk(closingLock);
+            if (closingCond.wait_for(lk, pause, [this] { return closing.load(); })) {
+                return 2;
+            }
+        }
+        std::string reason;
+        TKCompDesc assigned{};
+        std::unique_ptr<sock> fresh = openConnection(assigned, reason);
+        if (fresh) {
+            sock* old;
+            {
+                std::lock_guard<std::mutex> w(writeLock);
+                std::lock_guard<std::mutex> lk(sockLock);
+                old = socket;
+                socket = fresh.release();
+                if (closing.load()) {
+                    socket->interrupt();
+                }
+                hostDesc = assigned;
+            }
+            delete old;
+            retries = 10;
+            up = true;
+            if (connectionChanged) {
+                connectionChanged(true, "");
+            }
+            return 2;
+        }
+        pause = std::min(pause * 2, std::chrono::milliseconds(RECONNECT_MAX_MS));
+    }
 }
 
 int TKSRemoteMsgQueue::closedByRelay() {
@@ -199,6 +264,9 @@ int TKSRemoteMsgQueue::closedByRelay() {
 
 int TKSRemoteMsgQueue::msgWrite(TKMsg32Bit* msg) {
     std::lock_guard<std::mutex> lk(writeLock);
+    if (!up.load()) {
+        return 2;
+    }
     if (!tksEncodeMessageFrame(msg, outFrame)) {
         return 2;
     }
@@ -232,11 +300,13 @@ int TKSRemoteMsgQueue::msgRead(TKMsg32Bit** out) {
             return closedByRelay();
         }
         std::cerr << "Error communicating with remote message queue on " << hostName << std::endl;
+        // A broken connection fails every read at once: no use counting those. A frame that
+        // was refused leaves the stream in step; only a run of them gives the connection up.
+        if (socket->isFailed()) {
+            return reconnect("the connection was closed or broke");
+        }
         if (--retries <= 0) {
-            readerGone = true;
-            // A close that is waiting for its acknowledgement gets none from a dead reader.
-            closeSignal.unlock();
-            throw TKSRemoteService_ComFailure(hostName, port);
+            return reconnect("ten frames in a row could not be read");
         }
         return 2;
     }
