@@ -29,6 +29,7 @@
 #include "console/PhoneViewMgr.h"
 #include "console/QuitCmd.h"
 #include "console/Redirect.h"
+#include "console/RelayStatus.h"
 #include "console/ReleaseCallCmd.h"
 #include "console/ResetChanCmd.h"
 #include "console/StartTxRAICmd.h"
@@ -87,6 +88,8 @@ int main(int argc, char* argv[]) {
             std::cerr << "board emulation not started: " << error << std::endl;
         }
     }
+
+    WatchRelayState();
 
     g_sysView = new ConsoleSystemView();
     g_SystemView = new View(g_curDisplay, SYSVIEW_WINDOW_HEIGHT, SYSVIEW_WINDOW_WIDTH,

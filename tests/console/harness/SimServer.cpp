@@ -11,7 +11,15 @@
 
 namespace lineprobe::testing {
 
-SimServer::SimServer(const std::string& farmFile) {
+SimServer::SimServer(const std::string& farmFile) : farm_(farmFile) {
+    Launch("0");
+}
+
+SimServer::~SimServer() {
+    Kill();
+}
+
+void SimServer::Launch(const std::string& port) {
     int in[2];
     int out[2];
     if (pipe2(in, O_CLOEXEC) != 0) {
@@ -30,8 +38,8 @@ SimServer::SimServer(const std::string& farmFile) {
         if (devNull >= 0) {
             dup2(devNull, STDERR_FILENO);
         }
-        execl(VX7SIM_BINARY, VX7SIM_BINARY, "--farm", farmFile.c_str(), "--port", "0", "--bind",
-              "127.0.0.1", static_cast<char*>(nullptr));
+        execl(VX7SIM_BINARY, VX7SIM_BINARY, "--farm", farm_.c_str(), "--port", port.c_str(),
+              "--bind", "127.0.0.1", static_cast<char*>(nullptr));
         _exit(127);
     }
     close(in[0]);
@@ -48,18 +56,30 @@ SimServer::SimServer(const std::string& farmFile) {
     }
 }
 
-SimServer::~SimServer() {
+void SimServer::Kill() {
     if (pid_ > 0) {
-        kill(pid_, SIGTERM);
+        kill(pid_, SIGKILL);
         int status = 0;
         waitpid(pid_, &status, 0);
+        pid_ = -1;
     }
     if (toSim_ >= 0) {
         close(toSim_);
+        toSim_ = -1;
     }
     if (fromSim_ >= 0) {
         close(fromSim_);
+        fromSim_ = -1;
     }
+    pending_.clear();
+}
+
+bool SimServer::Restart() {
+    const int port = port_;
+    Kill();
+    port_ = 0;
+    Launch(std::to_string(port));
+    return port_ == port;
 }
 
 std::string SimServer::Address() const {
