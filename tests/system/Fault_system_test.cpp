@@ -313,15 +313,17 @@ TEST_F(FaultRun, RefusedSilentAndDroppedRelay) {
         }
     }
 
-    // A lineprobe started again gets working views from the relay that dropped it.
+    // A lineprobe started again gets working views from the relay that dropped it. Its phone
+    // is another channel: the commands after the drop worked, and left channel 1.1.1 with a
+    // call and out of service.
     TerminalSession again(ThroughRelay(sim));
     ASSERT_TRUE(again.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << again.Dump();
     TimedRunner commandsAgain(again);
     ASSERT_TRUE(commandsAgain.Run("trunk 1 1", std::chrono::seconds(30)).returned) << again.Dump();
-    ASSERT_TRUE(commandsAgain.Run("phone 1 1 1", std::chrono::seconds(30)).returned)
+    ASSERT_TRUE(commandsAgain.Run("phone 1 1 3", std::chrono::seconds(30)).returned)
         << again.Dump();
     ASSERT_TRUE(again.WaitForTextAt(TRUNK_ROW0 + 1, COL0 + 8, "InService")) << again.Dump();
-    Control("call 1 1 1 5557777");
+    Control("call 1 1 3 5557777");
     EXPECT_TRUE(again.WaitForTextAt(PHONE_ROW0 + 1, COL0 + 47, "Offered")) << again.Dump();
     Control("alarm 1 1 red on");
     EXPECT_TRUE(again.WaitForTextAt(TRUNK_ROW0 + 1, COL0 + 54, "X")) << again.Dump();
