@@ -18,9 +18,8 @@ namespace {
 class Restorer {
   public:
     int Add(RelayRestore::Task task) {
-        std::lock_guard<std::mutex> lk(m);
-        if (!started) {
-            started = true;
+        // Outside `m`: the listener is called under the transport's own lock and takes `m`.
+        std::call_once(started, [this] {
             // Detached, and the restorer never destroyed: the process may end (exit from a
             // signal handler) while a task waits for a board, and that must not hold it up.
             std::thread([this] { Run(); }).detach();
@@ -29,7 +28,8 @@ class Restorer {
                     RunAll();
                 }
             });
-        }
+        });
+        std::lock_guard<std::mutex> lk(m);
         int id = ++lastId;
         tasks.emplace(id, std::move(task));
         return id;
@@ -93,7 +93,7 @@ class Restorer {
     std::map<int, RelayRestore::Task> tasks;
     int lastId = 0;
     bool pending = false;
-    bool started = false;
+    std::once_flag started;
 };
 
 Restorer& TheRestorer() {

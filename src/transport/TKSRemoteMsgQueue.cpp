@@ -77,7 +77,10 @@ std::string answerMissing(long result, long got, long wanted) {
 
 std::unique_ptr<sock> TKSRemoteMsgQueue::openConnection(TKCompDesc& assigned, std::string& reason) {
     auto s = std::make_unique<sock>(hostName, TKS_DEFAULT_PORT);
-    port = s->getPort();
+    // The same on every attempt: set once, before the reader can look at it.
+    if (socket == nullptr) {
+        port = s->getPort();
+    }
     struct Opening {
         TKSRemoteMsgQueue* q;
         ~Opening() {
@@ -270,8 +273,10 @@ int TKSRemoteMsgQueue::msgWrite(TKMsg32Bit* msg) {
     if (!tksEncodeMessageFrame(msg, outFrame)) {
         return 2;
     }
+    // Judged by this write alone: the reader marks the socket failed when the relay closes,
+    // which may come just after the relay has read this very message.
     long r = socket->writeblock(outFrame.data(), static_cast<long>(outFrame.size()));
-    if (r != 0 || socket->isFailed()) {
+    if (r != 0) {
         return 2;
     }
     tkMsgFree(msg);
