@@ -6,7 +6,9 @@
 #include <chrono>
 #include <csignal>
 #include <cstdlib>
+#include <cstring>
 #include <iostream>
+#include <sstream>
 #include <string>
 #include <thread>
 
@@ -14,11 +16,15 @@
 #include "console/DisplayGuard.h"
 #include "console/Pager.h"
 #include "console/PhoneViewMgr.h"
+#include "console/Redirect.h"
 #include "console/ShutdownWatchdog.h"
 #include "console/TrunkViewMgr.h"
 #include "console/Version.h"
 #include "console/View.h"
+#include "framework/Exception.h"
 #include "framework/MsgQueue.h"
+#include "transport/TKSMsgQueue.h"
+#include "transport/TKSRemoteMsgQueue.h"
 
 lineprobe::ConsoleDisplay* g_curDisplay = nullptr;
 lineprobe::ConsoleSystemView* g_sysView = nullptr;
@@ -136,4 +142,73 @@ void terminate_app(int sig) {
         g_curDisplay->Stop();
     }
     std::exit(1);
+}
+
+namespace {
+
+// The relay as HOST:PORT, whether or not the user gave the port.
+std::string RelayName(const char* given, int port) {
+    std::string host = given != nullptr ? given : "";
+    if (port <= 0) {
+        return host;
+    }
+    return host.substr(0, host.find(':')) + ":" + std::to_string(port);
+}
+
+}  // namespace
+
+std::string DescribeUncaught(std::exception_ptr failure) {
+    if (!failure) {
+        return "terminated without an exception";
+    }
+    try {
+        std::rethrow_exception(failure);
+    } catch (const TKSMsgQueue::CreationError& e) {
+        std::string reason = e.getReason();
+        if (reason.empty()) {
+            reason = "the queue could not be opened";
+        }
+        if (e.getHostName()[0] == '\0') {
+            return "cannot open a local message queue: " + reason;
+        }
+        return "cannot reach the relay at " + RelayName(e.getHostName(), e.getPort()) + ": " +
+               reason;
+    } catch (const TKSRemoteService_ComFailure& e) {
+        return "lost the relay connection to " + RelayName(e.getHostName(), e.getPort());
+    } catch (const TKSException&) {
+        return "a transport failure that nothing handled";
+    } catch (const tolk::Exception& e) {
+        std::ostringstream text;
+        text << "uncaught exception: " << e;
+        return text.str();
+    } catch (const std::exception& e) {
+        return std::string("uncaught exception: ") + e.what();
+    } catch (...) {
+        return "uncaught exception of an unknown type";
+    }
+}
+
+void ReportUncaughtAndAbort() {
+    static std::atomic<bool> reporting{false};
+    if (reporting.exchange(true)) {
+        std::abort();
+    }
+    std::string line;
+    try {
+        line = DescribeUncaught(std::current_exception());
+    } catch (...) {
+        line = "uncaught exception";
+    }
+    if (g_curDisplay != nullptr) {
+        lineprobe::DisplayGuard guard{std::chrono::milliseconds(SHUTDOWN_DISPLAY_WAIT_MS)};
+        g_curDisplay->Stop();
+    }
+    // Once redirected, std::cerr is the error log, and the terminal's stream is the buffer
+    // it had before.
+    std::cerr << line << std::endl;
+    if (lineprobe::sbuf_cerr != nullptr) {
+        std::ostream terminal(lineprobe::sbuf_cerr);
+        terminal << "lineprobe: " << line << std::endl;
+    }
+    std::abort();
 }

@@ -1,5 +1,8 @@
 #pragma once
 
+#include <exception>
+#include <string>
+
 namespace lineprobe {
 class ConsoleDisplay;
 class ConsoleSystemView;
@@ -44,3 +47,13 @@ int ProcessCmdLineArgs(int argc, char** argv);
 // operator, stops every view, ends curses and exits with status 1. Returns only to a shutdown it
 // interrupted on the same thread, which then goes on to the end.
 void terminate_app(int sig);
+
+// What an exception that nothing caught says to the operator, in one line: for a relay
+// that cannot be reached, "cannot reach the relay at HOST:PORT: " and why.
+std::string DescribeUncaught(std::exception_ptr failure);
+
+// The terminate handler, installed first thing by start-up. The process still ends by
+// abort, but the terminal is put back first, and what failed goes to the error log (when
+// it is open) and to the real standard error, where the operator reads it on the normal
+// screen.
+[[noreturn]] void ReportUncaughtAndAbort();

@@ -8,6 +8,7 @@
 #include "console/DisplayGuard.h"
 #include "console/View.h"
 #include "model/Phone.h"
+#include "model/RelayRestore.h"
 #include "model/TSCCallState.h"
 #include "model/TSCChanState.h"
 #include "model/VX7EventPublisher.h"
@@ -32,6 +33,9 @@ PhoneView::PhoneView(vx7diag::BoardManager* manager, int board, int line, int ch
 }
 
 PhoneView::~PhoneView() {
+    if (restoreId != 0) {
+        vx7diag::RelayRestore::Remove(restoreId);
+    }
     delete phone;
 }
 
@@ -61,10 +65,23 @@ int PhoneView::Start() {
         DisplayGuard guard;
         view->PrintString(label, row, startingCol);
     }
+    if (restoreId == 0) {
+        restoreId = vx7diag::RelayRestore::Add([this] {
+            std::cout << "PhoneView: relay back, restoring " << board << "." << line << "." << chan
+                      << std::endl;
+            publisher->Resubscribe();
+            GetCurrentPhoneState();
+        });
+    }
     return 0;
 }
 
 int PhoneView::Stop() {
+    // Before the publisher is let go: a restore that has begun finishes first.
+    if (restoreId != 0) {
+        vx7diag::RelayRestore::Remove(restoreId);
+        restoreId = 0;
+    }
     std::cout << "PhoneView::Stop() called: board=" << board << " line=" << line << " chan=" << chan
               << std::endl;
     phone->Stop();

@@ -39,6 +39,9 @@ class PhoneView {
     int GetCurrentPhoneState();
 
   private:
+    // The task that makes the row right again when the relay connection comes back; 0
+    // when none is registered.
+    int restoreId = 0;
     isa::RefPtr<vx7diag::VX7EventPublisher> publisher;
     vx7diag::Phone* phone = nullptr;
     int board;

@@ -8,6 +8,7 @@
 #include "console/DisplayGuard.h"
 #include "console/View.h"
 #include "model/AllAlarms.h"
+#include "model/RelayRestore.h"
 #include "model/Trunk.h"
 #include "model/TrunkState.h"
 #include "model/VX7EventPublisher.h"
@@ -28,6 +29,9 @@ TrunkView::TrunkView(int board, int line, int row, int col)
 }
 
 TrunkView::~TrunkView() {
+    if (restoreId != 0) {
+        vx7diag::RelayRestore::Remove(restoreId);
+    }
     delete trunk;
 }
 
@@ -59,10 +63,22 @@ int TrunkView::Start() {
     }
     std::cout << "TrunkView::STart() - Getttig Currrent Trunk Status" << std::endl;
     GetCurrentTrunkStatus();
+    if (restoreId == 0) {
+        restoreId = vx7diag::RelayRestore::Add([this] {
+            std::cout << "TrunkView: relay back, restoring " << board << "." << line << std::endl;
+            publisher->Resubscribe();
+            GetCurrentTrunkStatus();
+        });
+    }
     return 0;
 }
 
 int TrunkView::Stop() {
+    // Before the publisher is let go: a restore that has begun finishes first.
+    if (restoreId != 0) {
+        vx7diag::RelayRestore::Remove(restoreId);
+        restoreId = 0;
+    }
     std::cout << "Stopping Trunk Viev: board=" << board << " line=" << line << std::endl;
     if (allAlarmsAspect != nullptr) {
         publisher->Detach(observerRef, *allAlarmsAspect);

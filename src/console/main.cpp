@@ -1,4 +1,5 @@
 #include <csignal>
+#include <exception>
 #include <iostream>
 
 #include <cstdlib>
@@ -28,6 +29,7 @@
 #include "console/PhoneViewMgr.h"
 #include "console/QuitCmd.h"
 #include "console/Redirect.h"
+#include "console/RelayStatus.h"
 #include "console/ReleaseCallCmd.h"
 #include "console/ResetChanCmd.h"
 #include "console/StartTxRAICmd.h"
@@ -46,6 +48,8 @@ int main(int argc, char* argv[]) {
         ProcessCmdLineArgs(argc - 1, argv + 1);
         return 0;
     }
+
+    std::set_terminate(ReportUncaughtAndAbort);
 
     // A terminal that hangs up ends the tool as the closed keyboard below does.
     if (signal(SIGINT, terminate_app) == SIG_ERR || signal(SIGTERM, terminate_app) == SIG_ERR ||
@@ -85,6 +89,8 @@ int main(int argc, char* argv[]) {
             std::cerr << "board emulation not started: " << error << std::endl;
         }
     }
+
+    WatchRelayState();
 
     g_sysView = new ConsoleSystemView();
     g_SystemView = new View(g_curDisplay, SYSVIEW_WINDOW_HEIGHT, SYSVIEW_WINDOW_WIDTH,

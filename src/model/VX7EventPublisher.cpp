@@ -217,6 +217,22 @@ bool VX7EventPublisher::Start(Aspect* aspect) {
     return true;
 }
 
+// Tells the component to report the publication's events to this process's address.
+template <class Component>
+bool RequestEvents(Component* object, int kind, VX7EventPublication* publication) {
+    return RunGuarded(std::cout, "VX7EventPublisher::Subscribe - ", [&] {
+        unsigned int group = publication->Group();
+        if (kind == VX7EventPublisher::TSC_COMPONENT) {
+            tolk::staticList<unsigned int> types = publication->EventTypeList();
+            if (types.length() != 0) {
+                object->DetectxEvts(types, group, nullptr);
+                return;
+            }
+        }
+        object->DetectEvt(group, 0, nullptr);
+    });
+}
+
 template <class Component>
 bool SubscribeOn(VX7EventPublisher* publisher, Component*& object, unsigned int& count,
                  tolk::Cluster* cluster, unsigned char type, int kind,
@@ -250,18 +266,7 @@ bool SubscribeOn(VX7EventPublisher* publisher, Component*& object, unsigned int&
         throw;
     }
 
-    bool detected = RunGuarded(std::cout, "VX7EventPublisher::Subscribe - ", [&] {
-        unsigned int group = publication->Group();
-        if (kind == VX7EventPublisher::TSC_COMPONENT) {
-            tolk::staticList<unsigned int> types = publication->EventTypeList();
-            if (types.length() != 0) {
-                object->DetectxEvts(types, group, nullptr);
-                return;
-            }
-        }
-        object->DetectEvt(group, 0, nullptr);
-    });
-    if (!detected) {
+    if (!RequestEvents(object, kind, publication)) {
         RunGuarded(std::cout, "VX7EventPublisher::Subscribe - ", [&] {
             object->asyncCancelEvtGroup(publication->Group(), publication->Handler(), 0);
         });
@@ -294,6 +299,46 @@ bool VX7EventPublisher::Subscribe(VX7EventPublication* publication) {
         default:
             return true;
     }
+}
+
+bool VX7EventPublisher::Resubscribe() {
+    isa::AutoCriticalSection guard(lock);
+    std::vector<VX7EventPublication*> watched;
+    {
+        isa::AutoCriticalSection map(observersLock);
+        for (auto& [aspect, set] : observers) {
+            auto* publication = dynamic_cast<VX7EventPublication*>(aspect);
+            if (!set.empty() && publication != nullptr) {
+                watched.push_back(publication);
+            }
+        }
+    }
+    bool all = true;
+    for (VX7EventPublication* publication : watched) {
+        int kind = publication->Component();
+        bool ok = true;
+        switch (kind) {
+            case CAS_COMPONENT:
+                ok = cas == nullptr || RequestEvents(cas, kind, publication);
+                break;
+            case CHP_COMPONENT:
+                ok = chp == nullptr || RequestEvents(chp, kind, publication);
+                break;
+            case LCON_COMPONENT:
+                ok = lcon == nullptr || RequestEvents(lcon, kind, publication);
+                break;
+            case TSC_COMPONENT:
+                ok = tsc == nullptr || RequestEvents(tsc, kind, publication);
+                break;
+            default:
+                break;
+        }
+        all = all && ok;
+    }
+    std::cout << "VX7EventPublisher::Resubscribe - board=" << board << " trunk=" << trunk
+              << " channel=" << channel
+              << (all ? ": subscribed again" : ": not all subscribed again") << std::endl;
+    return all;
 }
 
 void VX7EventPublisher::Stop(const Aspect& aspect) {

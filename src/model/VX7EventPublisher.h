@@ -54,6 +54,10 @@ class VX7EventPublisher : public Subject {
     virtual void Stop(const Aspect& aspect);
     virtual bool Subscribe(VX7EventPublication* publication);
     virtual void Unsubscribe(VX7EventPublication* publication);
+    // After the relay connection came back: the board knows nothing of the subscriptions made
+    // from the lost connection's address, so every watched aspect asks for its events again.
+    // False when a board refused or did not answer (the reason is in the log).
+    bool Resubscribe();
 
     // Null when the component is not (or no longer) one that a live publisher made.
     static VX7EventPublisher* GetMyPublisher(tolk::Addressable* component);

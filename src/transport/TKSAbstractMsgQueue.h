@@ -2,6 +2,8 @@
 #ifndef LINEPROBE_TRANSPORT_TKSABSTRACTMSGQUEUE_H
 #define LINEPROBE_TRANSPORT_TKSABSTRACTMSGQUEUE_H
 
+#include <functional>
+
 #include "platform/tkhost/tkhost.h"
 
 class TKSAbstractMsgQueue {
@@ -16,6 +18,14 @@ class TKSAbstractMsgQueue {
     virtual void closeExchange() {}
     // At shutdown, after the reader has been told to stop: makes a blocked msgRead return.
     virtual void sendLastMessage() {}
+
+    // False while the transport knows that nothing it is given can arrive: a lost relay
+    // connection that is being restored.
+    virtual bool connected() const { return true; }
+
+    // Set before the reader starts; called on the reader when the connection is lost (false,
+    // with why) and when it is back (true, hostDesc already holding the new address).
+    std::function<void(bool up, const char* why)> connectionChanged;
 
     TKCompDesc hostDesc{};
 };

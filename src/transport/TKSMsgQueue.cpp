@@ -1,9 +1,13 @@
 #include "transport/TKSMsgQueue.h"
 
+#include <chrono>
+#include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <ctime>
 #include <exception>
 #include <iostream>
+#include <vector>
 
 #include "transport/TKSLocalMsgQueue.h"
 #include "transport/TKSRemoteMsgQueue.h"
@@ -23,9 +27,93 @@ const char* chooseHost(const char* remoteHost) {
     return host;
 }
 
+// The relay as the operator knows it; each queue of the process has its own connection to it,
+// but the operator hears of the relay, not of every connection.
+class RelayMonitor {
+  public:
+    void lost(const std::string& relay, const char* why) {
+        std::lock_guard<std::mutex> lk(m);
+        if (down++ != 0) {
+            return;
+        }
+        since = std::chrono::steady_clock::now();
+        const std::string line = "relay connection to " + relay + " lost at " + timeOfDay() + " (" +
+                                 why + "); requests fail at once until it is back";
+        std::cout << line << std::endl;
+        std::cerr << line << std::endl;
+        tell(true, relay);
+    }
+    // `restored` false: the queue went away while cut off, so it no longer waits for the relay.
+    void back(const std::string& relay, bool restored) {
+        std::lock_guard<std::mutex> lk(m);
+        if (down == 0 || --down != 0) {
+            return;
+        }
+        if (restored) {
+            double seconds =
+                std::chrono::duration<double>(std::chrono::steady_clock::now() - since).count();
+            char took[32];
+            std::snprintf(took, sizeof took, "%.1f", seconds);
+            const std::string line = "relay connection to " + relay + " back at " + timeOfDay() +
+                                     ", after " + took + " s";
+            std::cout << line << std::endl;
+            std::cerr << line << std::endl;
+        }
+        tell(false, relay);
+    }
+    void add(TKSMsgQueue::RelayListener listener) {
+        std::lock_guard<std::mutex> lk(m);
+        listeners.push_back(std::move(listener));
+    }
+    bool cutOff() {
+        std::lock_guard<std::mutex> lk(m);
+        return down != 0;
+    }
+
+  private:
+    static std::string timeOfDay() {
+        std::time_t now = std::time(nullptr);
+        std::tm parts{};
+        localtime_r(&now, &parts);
+        char text[16];
+        std::strftime(text, sizeof text, "%H:%M:%S", &parts);
+        return text;
+    }
+    void tell(bool cut, const std::string& relay) {
+        for (const TKSMsgQueue::RelayListener& listener : listeners) {
+            try {
+                listener(cut, relay);
+            } catch (...) {
+                std::cerr << "ERROR: TKSMsgQueue: a relay state listener failed" << std::endl;
+            }
+        }
+    }
+
+    std::mutex m;
+    int down = 0;
+    std::chrono::steady_clock::time_point since;
+    std::vector<TKSMsgQueue::RelayListener> listeners;
+};
+
+// Never destroyed: a reader thread may report while the process exits.
+RelayMonitor& relayMonitor() {
+    static RelayMonitor* monitor = new RelayMonitor;
+    return *monitor;
+}
+
 }  // namespace
 
-TKSMsgQueue::CreationError::CreationError(const char* name) {
+void TKSMsgQueue::addRelayListener(RelayListener listener) {
+    relayMonitor().add(std::move(listener));
+}
+
+bool TKSMsgQueue::relayCutOff() {
+    return relayMonitor().cutOff();
+}
+
+TKSMsgQueue::CreationError::CreationError(const char* name, int port, const char* why)
+    : port(port) {
+    std::snprintf(reason, sizeof reason, "%s", why != nullptr ? why : "");
     hostName[0] = '\0';
     if (name != nullptr) {
         std::strncpy(hostName, name, sizeof hostName - 1);
@@ -44,10 +132,15 @@ TKSMsgQueue::TKSMsgQueue(TKCompDesc addr, unsigned int maxRetMsgSize, unsigned i
         } else {
             transport = new TKSRemoteMsgQueue(addr, maxRetMsgSize, depth, host);
         }
+    } catch (const TKSRemoteOpenError& e) {
+        throw CreationError(host, e.getPort(), e.getReason());
     } catch (TKSResource_CreationError&) {
-        throw CreationError(host);
+        throw CreationError(host, 0,
+                            host == nullptr ? "the host message library refused a queue" : nullptr);
     }
     hostDesc = transport->hostDesc;
+    relayName = host != nullptr ? host : "";
+    transport->connectionChanged = [this](bool up, const char* why) { connectionChanged(up, why); };
     replyGate.lock();
     pickupReady.lock();
     try {
@@ -76,6 +169,9 @@ TKSMsgQueue::~TKSMsgQueue() {
     }
     readerThread.join();
     delete transport;
+    if (cutOff) {
+        relayMonitor().back(relayName, false);
+    }
     std::lock_guard<std::mutex> lk(waitLock);
     tkMsgFree(replySlot);
     tkMsgFree(pickupSlot);
@@ -89,17 +185,39 @@ bool TKSMsgQueue::stopping() {
 TKSMsgRef TKSMsgQueue::request(TKSMsgRef& msg, unsigned int timeoutMs, unsigned int retMsgType,
                                int anySource) {
     TKMsg32Bit* block = msg.getMsgRef();
+    const unsigned int type = block != nullptr ? block->type : 0;
+    // Nothing can arrive while the connection is down: the request fails at once, as a request
+    // without an answer would, rather than making its caller wait for a relay known to be gone.
+    auto notSent = [&](const char* why) {
+        std::cerr << "TKSMsgQueue: request of type 0x" << std::hex << type << std::dec
+                  << " not sent: " << why << std::endl;
+        tkMsgFree(block);
+        return timeoutMs == 0 ? TKSMsgRef(0u) : TKSMsgRef();
+    };
+    const std::string down = "the relay connection to " + relayName + " is lost";
+    TKCompDesc self;
     {
         std::lock_guard<std::mutex> lk(waitLock);
+        if (failed || cutOff) {
+            const bool lost = cutOff;
+            waitTrans = 0;
+            waiting = false;
+            return notSent(lost ? down.c_str() : "the transport has failed");
+        }
         waitRetType = retMsgType;
         waitTrans = msg.getTrans();
         waitTarget = msg.getTgtAddr();
         waitAnySource = anySource;
+        waitLost = false;
+        self = hostDesc;
     }
-    msg.setSrcAddr(hostDesc);
+    msg.setSrcAddr(self);
 
     if (timeoutMs == 0) {
         if (transport->msgWrite(block) != 0) {
+            if (!transport->connected()) {
+                return notSent(down.c_str());
+            }
             tkMsgFree(block);
         }
         return TKSMsgRef(0u);
@@ -111,6 +229,11 @@ TKSMsgRef TKSMsgQueue::request(TKSMsgRef& msg, unsigned int timeoutMs, unsigned 
         waiting = true;
     }
     if (transport->msgWrite(block) != 0) {
+        if (!transport->connected()) {
+            std::lock_guard<std::mutex> lk(waitLock);
+            waiting = false;
+            return notSent(down.c_str());
+        }
         // The transport refused it: the block is still ours, and the wait ends by time-out.
         tkMsgFree(block);
     }
@@ -118,6 +241,11 @@ TKSMsgRef TKSMsgQueue::request(TKSMsgRef& msg, unsigned int timeoutMs, unsigned 
     bool opened = replyGate.tryLock(timeoutMs, 10);
     std::lock_guard<std::mutex> lk(waitLock);
     waiting = false;
+    if (waitLost) {
+        waitLost = false;
+        std::cerr << "TKSMsgQueue: request of type 0x" << std::hex << type << std::dec
+                  << " ended without its answer: " << down << std::endl;
+    }
     // A reply stored at the very moment of the time-out is taken, not left behind.
     TKMsg32Bit* reply = replySlot;
     replySlot = nullptr;
@@ -160,7 +288,32 @@ unsigned int TKSMsgQueue::callbackFailures() const {
 
 bool TKSMsgQueue::transportFailed() const {
     std::lock_guard<std::mutex> lk(waitLock);
-    return failed;
+    return failed || cutOff;
+}
+
+TKCompDesc TKSMsgQueue::getHostDesc() const {
+    std::lock_guard<std::mutex> lk(waitLock);
+    return hostDesc;
+}
+
+void TKSMsgQueue::connectionChanged(bool up, const char* why) {
+    {
+        std::lock_guard<std::mutex> lk(waitLock);
+        if (up) {
+            hostDesc = transport->hostDesc;
+        } else if (waiting) {
+            // Its answer cannot come any more: let the request go now.
+            waiting = false;
+            waitLost = true;
+            replyGate.unlock();
+        }
+        cutOff = !up;
+    }
+    if (up) {
+        relayMonitor().back(relayName, true);
+    } else {
+        relayMonitor().lost(relayName, why);
+    }
 }
 
 void TKSMsgQueue::deliverAsync(TKMsg32Bit* block) {

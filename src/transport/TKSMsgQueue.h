@@ -4,6 +4,7 @@
 #define LINEPROBE_TRANSPORT_TKSMSGQUEUE_H
 
 #include <condition_variable>
+#include <functional>
 #include <mutex>
 #include <string>
 
@@ -15,11 +16,17 @@ class TKSMsgQueue : public TKSRunnable {
   public:
     class CreationError : public TKSResource_CreationError {
       public:
-        explicit CreationError(const char* hostName);
+        // hostName as the user gave it (null for the local transport); port 0 when none was
+        // tried; reason in a few words, empty when the transport did not say.
+        explicit CreationError(const char* hostName, int port = 0, const char* reason = nullptr);
         const char* getHostName() const { return hostName; }
+        int getPort() const { return port; }
+        const char* getReason() const { return reason; }
 
       private:
         char hostName[100];
+        int port = 0;
+        char reason[160];
     };
 
     // remoteHost null: "REMOTE_TKHOST" decides; a host whose name begins with "HOST" is this one.
@@ -39,7 +46,8 @@ class TKSMsgQueue : public TKSRunnable {
     // Registering one kind of callback clears the other, so a block has one owner.
     void registerAsyncCallback(TKSAsyncMsgReceiver* obj, TKSAsyncMethod method);
     void registerAsyncFunction(TKSAsyncFn fn);
-    TKCompDesc getHostDesc() const { return hostDesc; }
+    // The address the transport was given last: a restored relay connection gets a new one.
+    TKCompDesc getHostDesc() const;
 
     // Blocks left for a direct reader while no callback is registered: waits up to timeoutMs,
     // returns an empty handle if none came.
@@ -47,14 +55,24 @@ class TKSMsgQueue : public TKSRunnable {
 
     // Exceptions that left a callback and were reported, for tests and diagnostics.
     unsigned int callbackFailures() const;
-    // True once the transport failed for good and the reader stopped receiving.
+    // True while nothing can be sent or received: the transport failed for good, or its relay
+    // connection is lost and not yet restored. Requests made meanwhile fail at once.
     bool transportFailed() const;
+
+    // Whatever a relay connection of any queue of the process does: cutOff true when the first
+    // one is lost, false when the last lost one is back. Called on a reader thread, in order;
+    // a listener must be quick and must not make requests. Listeners stay for the process.
+    using RelayListener = std::function<void(bool cutOff, const std::string& relay)>;
+    static void addRelayListener(RelayListener listener);
+    // Whether some relay connection of the process is lost right now.
+    static bool relayCutOff();
 
   private:
     void* readNroute(void* control, void* arg);
     void route(TKMsg32Bit* block);
     void deliverAsync(TKMsg32Bit* block);
     void waitForStop();
+    void connectionChanged(bool up, const char* why);
     bool stopping();
 
     TKSThread readerThread;
@@ -77,6 +95,9 @@ class TKSMsgQueue : public TKSRunnable {
     int waitAnySource = 0;
     unsigned int failures = 0;
     bool failed = false;
+    bool cutOff = false;
+    bool waitLost = false;
+    std::string relayName;
 
     std::mutex stopLock;
     std::condition_variable stopCond;

@@ -1,9 +1,13 @@
 #include "transport/TKSRemoteMsgQueue.h"
 
+#include <algorithm>
+#include <cerrno>
 #include <chrono>
+#include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <iostream>
+#include <string>
 #include <vector>
 
 #include "transport/TKSFrame.h"
@@ -30,49 +34,125 @@ TKSRemoteService_ComFailure::TKSRemoteService_ComFailure(const char* name, int p
     }
 }
 
+TKSRemoteOpenError::TKSRemoteOpenError(const char* text, int port) : port(port) {
+    std::snprintf(reason, sizeof reason, "%s", text != nullptr ? text : "");
+}
+
 TKSRemoteMsgQueue::TKSRemoteMsgQueue(TKCompDesc addr, unsigned int maxRetMsgSize,
                                      unsigned int depth, const char* name) {
     hostName = strdup(name != nullptr ? name : "");
-    port = TKS_DEFAULT_PORT;
-    socket = new sock(hostName, TKS_DEFAULT_PORT);
-    port = socket->getPort();
-    auto fail = [this]() {
-        delete socket;
-        socket = nullptr;
+    openRequest.addr = addr;
+    openRequest.maxRetMsgSize = maxRetMsgSize;
+    openRequest.depth = depth;
+    std::string reason;
+    std::unique_ptr<sock> opened = openConnection(hostDesc, reason);
+    if (!opened) {
         std::free(hostName);
         hostName = nullptr;
-        throw TKSResource_CreationError();
-    };
-    if (socket->isFailed() || socket->connect() != 0) {
-        fail();
+        throw TKSRemoteOpenError(reason.c_str(), port);
     }
+    socket = opened.release();
     closeSignal.lock();
+    retries = 10;
+}
 
-    TKSOpenRequest req;
-    req.addr = addr;
-    req.maxRetMsgSize = maxRetMsgSize;
-    req.depth = depth;
+namespace {
+
+// Why part of the open's answer did not come: `got` of `wanted` bytes of it arrived.
+std::string answerMissing(long result, long got, long wanted) {
+    if (result == sock::SOCK_TIMED_OUT) {
+        if (got == 0) {
+            return "no answer to the open within " + std::to_string(OPEN_WAIT_MS / 1000) + " s";
+        }
+        return "incomplete answer to the open within " + std::to_string(OPEN_WAIT_MS / 1000) +
+               " s (" + std::to_string(got) + " of " + std::to_string(wanted) + " bytes)";
+    }
+    if (got == 0) {
+        return "the relay closed the connection without answering the open";
+    }
+    return "the relay closed the connection in the middle of its answer to the open";
+}
+
+}  // namespace
+
+std::unique_ptr<sock> TKSRemoteMsgQueue::openConnection(TKCompDesc& assigned, std::string& reason) {
+    auto s = std::make_unique<sock>(hostName, TKS_DEFAULT_PORT);
+    // The same on every attempt: set once, before the reader can look at it.
+    if (socket == nullptr) {
+        port = s->getPort();
+    }
+    struct Opening {
+        TKSRemoteMsgQueue* q;
+        ~Opening() {
+            std::lock_guard<std::mutex> lk(q->sockLock);
+            q->opening = nullptr;
+        }
+    } registered{this};
+    {
+        std::lock_guard<std::mutex> lk(sockLock);
+        opening = s.get();
+        if (closing.load()) {
+            reason = "the queue is closing";
+            return nullptr;
+        }
+    }
+    if (s->isFailed()) {
+        reason = "cannot resolve the relay's host name";
+        return nullptr;
+    }
+    // A partial answer must not hold the program any longer than no answer at all: one limit
+    // for the whole exchange, connection included.
+    auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(OPEN_WAIT_MS);
+    if (s->connect(static_cast<int>(OPEN_WAIT_MS)) != 0) {
+        reason = errno == ETIMEDOUT
+                     ? "no connection within " + std::to_string(OPEN_WAIT_MS / 1000) + " s"
+                     : std::string(std::strerror(errno));
+        return nullptr;
+    }
+
     unsigned char body[TKS_OPEN_BODY_BYTES];
-    tksEncodeOpen(req, body);
+    tksEncodeOpen(openRequest, body);
     msg_t open;
     open.type = TKS_FRAME_OPEN;
     open.size = TKS_OPEN_BODY_BYTES;
     open.body = body;
-    if (socket->snd_msg(open) != 0) {
-        fail();
+    if (s->snd_msg(open) != 0) {
+        reason = "cannot send the open: the relay closed the connection";
+        return nullptr;
     }
 
-    // A relay that takes the connection but never answers must not hang the program.
-    if (!socket->ready('r', OPEN_WAIT_MS / 1000, 0)) {
-        fail();
+    constexpr long whole = TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES;
+    unsigned char header[TKS_FRAME_HEADER_SIZE];
+    long missing = 0;
+    long r = s->readblock(header, TKS_FRAME_HEADER_SIZE, deadline, &missing);
+    if (r != 0) {
+        reason = answerMissing(r, long(TKS_FRAME_HEADER_SIZE) - missing, whole);
+        return nullptr;
     }
-    msg_t assigned;
-    bool ok = socket->get_msg(assigned) == 0 && tksDecodeAssigned(assigned, hostDesc);
-    free_msg(assigned);
-    if (!ok) {
-        fail();
+    msg_t answer;
+    tksDecodeFrameHeader(header, answer);
+    // Checked before any of the body is read: an announced size that no address has is refused
+    // at once instead of being waited for.
+    if (answer.type != TKS_FRAME_ASSIGNED) {
+        reason = "the relay answered the open with a frame of type " + std::to_string(answer.type) +
+                 ", not " + std::to_string(TKS_FRAME_ASSIGNED);
+        return nullptr;
     }
-    retries = 10;
+    if (answer.size != TKS_ASSIGNED_BODY_BYTES || answer.ex_size != 0) {
+        reason = "the relay answered the open with an address of " +
+                 std::to_string(std::uint64_t(answer.size) + answer.ex_size) + " bytes, not " +
+                 std::to_string(TKS_ASSIGNED_BODY_BYTES);
+        return nullptr;
+    }
+    unsigned char address[TKS_ASSIGNED_BODY_BYTES];
+    r = s->readblock(address, TKS_ASSIGNED_BODY_BYTES, deadline, &missing);
+    if (r != 0) {
+        reason = answerMissing(r, whole - missing, whole);
+        return nullptr;
+    }
+    answer.body = address;
+    tksDecodeAssigned(answer, assigned);
+    return s;
 }
 
 TKSRemoteMsgQueue::~TKSRemoteMsgQueue() {
@@ -111,7 +191,12 @@ bool TKSRemoteMsgQueue::sendClose() {
 }
 
 void TKSRemoteMsgQueue::closeExchange() {
-    if (readerGone.load() || socket->isFailed()) {
+    bool gone;
+    {
+        std::lock_guard<std::mutex> lk(sockLock);
+        gone = !up.load() || socket->isFailed();
+    }
+    if (readerGone.load() || gone) {
         closeSent = true;
         return;
     }
@@ -126,7 +211,51 @@ void TKSRemoteMsgQueue::sendLastMessage() {
         closing = true;
     }
     closingCond.notify_all();
+    std::lock_guard<std::mutex> lk(sockLock);
     socket->interrupt();
+    if (opening != nullptr) {
+        opening->interrupt();
+    }
+}
+
+int TKSRemoteMsgQueue::reconnect(const char* why) {
+    up = false;
+    if (connectionChanged) {
+        connectionChanged(false, why);
+    }
+    auto pause = std::chrono::milliseconds(RECONNECT_FIRST_MS);
+    for (;;) {
+        {
+            std::unique_lock<std::mutex> lk(closingLock);
+            if (closingCond.wait_for(lk, pause, [this] { return closing.load(); })) {
+                return 2;
+            }
+        }
+        std::string reason;
+        TKCompDesc assigned{};
+        std::unique_ptr<sock> fresh = openConnection(assigned, reason);
+        if (fresh) {
+            sock* old;
+            {
+                std::lock_guard<std::mutex> w(writeLock);
+                std::lock_guard<std::mutex> lk(sockLock);
+                old = socket;
+                socket = fresh.release();
+                if (closing.load()) {
+                    socket->interrupt();
+                }
+                hostDesc = assigned;
+            }
+            delete old;
+            retries = 10;
+            up = true;
+            if (connectionChanged) {
+                connectionChanged(true, "");
+            }
+            return 2;
+        }
+        pause = std::min(pause * 2, std::chrono::milliseconds(RECONNECT_MAX_MS));
+    }
 }
 
 int TKSRemoteMsgQueue::closedByRelay() {
@@ -138,11 +267,16 @@ int TKSRemoteMsgQueue::closedByRelay() {
 
 int TKSRemoteMsgQueue::msgWrite(TKMsg32Bit* msg) {
     std::lock_guard<std::mutex> lk(writeLock);
+    if (!up.load()) {
+        return 2;
+    }
     if (!tksEncodeMessageFrame(msg, outFrame)) {
         return 2;
     }
+    // Judged by this write alone: the reader marks the socket failed when the relay closes,
+    // which may come just after the relay has read this very message.
     long r = socket->writeblock(outFrame.data(), static_cast<long>(outFrame.size()));
-    if (r != 0 || socket->isFailed()) {
+    if (r != 0) {
         return 2;
     }
     tkMsgFree(msg);
@@ -171,11 +305,13 @@ int TKSRemoteMsgQueue::msgRead(TKMsg32Bit** out) {
             return closedByRelay();
         }
         std::cerr << "Error communicating with remote message queue on " << hostName << std::endl;
+        // A broken connection fails every read at once: no use counting those. A frame that
+        // was refused leaves the stream in step; only a run of them gives the connection up.
+        if (socket->isFailed()) {
+            return reconnect("the connection was closed or broke");
+        }
         if (--retries <= 0) {
-            readerGone = true;
-            // A close that is waiting for its acknowledgement gets none from a dead reader.
-            closeSignal.unlock();
-            throw TKSRemoteService_ComFailure(hostName, port);
+            return reconnect("ten frames in a row could not be read");
         }
         return 2;
     }

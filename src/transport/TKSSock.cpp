@@ -1,6 +1,7 @@
 #include "transport/TKSSock.h"
 
 #include <arpa/inet.h>
+#include <fcntl.h>
 #include <netdb.h>
 #include <netinet/tcp.h>
 #include <poll.h>
@@ -103,6 +104,8 @@ sock::sock(const char* name, int port) {
         at = next;
     }
     std::string host = copy.substr(0, first);
+    // Known before the name is resolved, so that a failure can name the port it was for.
+    peer.sin_port = htons(static_cast<std::uint16_t>(port));
     char dotted[16] = {0};
     if (is_dn(host.c_str())) {
         dntoip(dotted, host.c_str());
@@ -158,6 +161,61 @@ int sock::connect() {
         return -1;
     }
     // Requests and replies are small and wait on each other: never hold one back.
+    int one = 1;
+    setsockopt(fd, IPPROTO_TCP, TCP_NODELAY, &one, sizeof one);
+    return 0;
+}
+
+int sock::connect(int timeoutMs) {
+    if (fd < 0 || failed.load() != 0) {
+        failed = 1;
+        errno = EBADF;
+        return -1;
+    }
+    int flags = fcntl(fd, F_GETFL, 0);
+    if (flags < 0 || fcntl(fd, F_SETFL, flags | O_NONBLOCK) < 0) {
+        failed = 1;
+        return -1;
+    }
+    int r = ::connect(fd, reinterpret_cast<sockaddr*>(&peer), sizeof peer);
+    int error = r == 0 ? 0 : errno;
+    if (r < 0 && (errno == EINPROGRESS || errno == EINTR)) {
+        auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(timeoutMs);
+        error = ETIMEDOUT;
+        for (;;) {
+            auto left = std::chrono::duration_cast<std::chrono::milliseconds>(
+                            deadline - std::chrono::steady_clock::now())
+                            .count();
+            if (left <= 0 || interrupted.load()) {
+                break;
+            }
+            pollfd p{};
+            p.fd = fd;
+            p.events = POLLOUT;
+            int ready = ::poll(&p, 1, static_cast<int>(left));
+            if (ready < 0 && errno == EINTR) {
+                continue;
+            }
+            if (ready > 0) {
+                socklen_t len = sizeof error;
+                if (getsockopt(fd, SOL_SOCKET, SO_ERROR, &error, &len) != 0) {
+                    error = errno;
+                }
+            }
+            if (ready != 0) {
+                break;
+            }
+        }
+        if (interrupted.load() && error == ETIMEDOUT) {
+            error = EINTR;
+        }
+    }
+    fcntl(fd, F_SETFL, flags);
+    if (error != 0) {
+        failed = 1;
+        errno = error;
+        return -1;
+    }
     int one = 1;
     setsockopt(fd, IPPROTO_TCP, TCP_NODELAY, &one, sizeof one);
     return 0;
@@ -255,12 +313,28 @@ bool sock::ready(char mode, long seconds, long microseconds) {
 }
 
 long sock::readblock(void* dst, long n) {
+    return readUntil(dst, n, false, {}, nullptr);
+}
+
+long sock::readblock(void* dst, long n, std::chrono::steady_clock::time_point deadline,
+                     long* missing) {
+    return readUntil(dst, n, true, deadline, missing);
+}
+
+long sock::readUntil(void* dst, long n, bool limited,
+                     std::chrono::steady_clock::time_point deadline, long* missingOut) {
+    if (missingOut != nullptr) {
+        *missingOut = n < 0 ? 0 : n;
+    }
     if (n < 1) {
         return n;
     }
     auto* out = static_cast<unsigned char*>(dst);
     long missing = n;
     while (missing > 0) {
+        if (missingOut != nullptr) {
+            *missingOut = missing;
+        }
         if (inPos < inLen) {
             std::size_t take = inLen - inPos;
             if (take > static_cast<std::size_t>(missing)) {
@@ -276,7 +350,21 @@ long sock::readblock(void* dst, long n) {
             failed = 1;
             return -1;
         }
-        ready('r', -1, -1);
+        if (limited) {
+            auto left = std::chrono::duration_cast<std::chrono::microseconds>(
+                            deadline - std::chrono::steady_clock::now())
+                            .count();
+            // Rounded up, so that a wait never ends a little before its deadline.
+            if (left <= 0 || !ready('r', 0, left + 999)) {
+                if (std::chrono::steady_clock::now() >= deadline) {
+                    failed = 1;
+                    return SOCK_TIMED_OUT;
+                }
+                continue;
+            }
+        } else {
+            ready('r', -1, -1);
+        }
         ssize_t r = ::recv(fd, inBuf, sizeof inBuf, 0);
         if (r < 0) {
             if (errno == EINTR) {
@@ -291,6 +379,9 @@ long sock::readblock(void* dst, long n) {
         }
         inPos = 0;
         inLen = static_cast<std::size_t>(r);
+    }
+    if (missingOut != nullptr) {
+        *missingOut = 0;
     }
     return 0;
 }

@@ -5,6 +5,7 @@
 #include <netinet/in.h>
 
 #include <atomic>
+#include <chrono>
 #include <cstddef>
 
 #include "transport/TKSFrame.h"
@@ -21,6 +22,9 @@ class sock {
     sock& operator=(const sock&) = delete;
 
     int connect();
+    // As connect(), but gives up after timeoutMs; errno tells why it failed (ETIMEDOUT when the
+    // time ran out).
+    int connect(int timeoutMs);
     int close();
     int shutdown(int how);
 
@@ -37,6 +41,11 @@ class sock {
     // closed. Either failure sets `failed`.
     long readblock(void* dst, long n);
     long writeblock(const void* src, long n);
+    // As readblock, but gives up at `deadline` with SOCK_TIMED_OUT. `*missing`, when given, is
+    // what did not come.
+    static constexpr long SOCK_TIMED_OUT = -2;
+    long readblock(void* dst, long n, std::chrono::steady_clock::time_point deadline,
+                   long* missing = nullptr);
 
     int snd_msg(const msg_t& m);
     int get_msg(msg_t& m);
@@ -55,6 +64,9 @@ class sock {
     friend class SockByteSource;
 
     void makeSocket(unsigned long address, int port);
+    // The loop of both readblocks; no deadline when `limited` is false.
+    long readUntil(void* dst, long n, bool limited, std::chrono::steady_clock::time_point deadline,
+                   long* missing);
 
     int fd = -1;
     std::atomic<int> failed{0};

@@ -7,6 +7,7 @@
 
 #include <chrono>
 #include <cstdio>
+#include <optional>
 #include <string>
 #include <thread>
 
@@ -123,7 +124,6 @@ TEST_F(RelayTest, SilentBoardAndDroppedRelayLeaveThePromptWorking) {
     EXPECT_EQ(commands.Result(), "enabling line loopback completed");
 
     Control("drop");
-    ASSERT_TRUE(commands.Run("trunk_oos 1 1"));
     ASSERT_TRUE(commands.Run("bogus"));
     EXPECT_EQ(commands.Result(), "Unrecgnized Command");
     // The rows keep what they last knew.
@@ -196,6 +196,105 @@ TEST(RelayScript, ABadLineIsRefusedWithItsNumberAndNothingPlays) {
     EXPECT_EQ(text, std::string("vx7sim: ") + path +
                         ": line 5: unknown alarm \"purple\" (red, yellow, ais, los, loopback, "
                         "raicrc, dchan); nothing played\n");
+}
+
+// A relay that drops its connections or dies and comes back on the same port costs the
+// operator only the outage: the rows follow the board again without a command.
+class RelayOutageTest : public RelayTest {
+  protected:
+    void SetUp() override {
+        RelayTest::SetUp();
+        ASSERT_TRUE(commands.Run("phone 1 1 2"));
+        ASSERT_TRUE(commands.Run("trunk 1 1"));
+        ASSERT_TRUE(WaitTrunk(1, 8, "InService")) << session.Dump();
+    }
+
+    std::size_t Count(const std::optional<std::string>& log, const std::string& text) {
+        std::size_t n = 0;
+        for (std::size_t at = log ? log->find(text) : std::string::npos; at != std::string::npos;
+             at = log->find(text, at + 1)) {
+            ++n;
+        }
+        return n;
+    }
+    // Until both logs hold `text` `n` times.
+    bool WaitInBothLogs(const std::string& text, std::size_t n = 1) {
+        const auto deadline = std::chrono::steady_clock::now() + DEFAULT_WAIT;
+        while (Count(session.ReadLog(), text) < n || Count(session.ReadErrLog(), text) < n) {
+            if (std::chrono::steady_clock::now() > deadline) {
+                return false;
+            }
+            std::this_thread::sleep_for(std::chrono::milliseconds(20));
+        }
+        return true;
+    }
+    // Both views subscribed again: from here on the board's events reach them.
+    bool WaitRestored(std::size_t times) {
+        const auto deadline = std::chrono::steady_clock::now() + DEFAULT_WAIT;
+        while (Count(session.ReadLog(), ": subscribed again") < 2 * times) {
+            if (std::chrono::steady_clock::now() > deadline) {
+                return false;
+            }
+            std::this_thread::sleep_for(std::chrono::milliseconds(20));
+        }
+        return true;
+    }
+    void ExpectRowsFollowTheBoard() {
+        Control("alarm 1 1 red on");
+        EXPECT_TRUE(WaitTrunk(1, 54, "X")) << session.Dump();
+        Control("call 1 1 2 5550000");
+        EXPECT_TRUE(session.WaitForTextAt(PHONE_ROW0 + 1, WINDOW_COL0 + 47, "Offered"))
+            << session.Dump();
+        EXPECT_TRUE(session.StillRunning());
+    }
+    // Types the line and waits for the error log to say why it was not sent: the time that
+    // took, or nothing when it never said so.
+    std::optional<std::chrono::milliseconds> FailsAtOnce(const std::string& line) {
+        const std::size_t before = Count(session.ReadErrLog(), " not sent: the relay connection");
+        const auto t0 = std::chrono::steady_clock::now();
+        session.TypeLine(line);
+        while (Count(session.ReadErrLog(), " not sent: the relay connection") == before) {
+            if (std::chrono::steady_clock::now() - t0 > std::chrono::seconds(10)) {
+                return std::nullopt;
+            }
+            std::this_thread::sleep_for(std::chrono::milliseconds(2));
+        }
+        return std::chrono::duration_cast<std::chrono::milliseconds>(
+            std::chrono::steady_clock::now() - t0);
+    }
+};
+
+TEST_F(RelayOutageTest, DroppedConnectionsAreRestored) {
+    Control("drop");
+    ASSERT_TRUE(WaitInBothLogs("relay connection to " + sim.Address() + " lost at "));
+    ASSERT_TRUE(WaitInBothLogs("relay connection to " + sim.Address() + " back at "));
+    ASSERT_TRUE(WaitRestored(1)) << *session.ReadLog();
+    ExpectRowsFollowTheBoard();
+}
+
+TEST_F(RelayOutageTest, RelayKilledAndStartedAgainOnItsPort) {
+    sim.Kill();
+    ASSERT_TRUE(WaitInBothLogs("relay connection to " + sim.Address() + " lost at "));
+    EXPECT_TRUE(session.WaitForText("relay cut off")) << session.Dump();
+
+    // Neither a request's 5 s nor a one-way command's 1 s wait for a relay known to be gone;
+    // what the terminal and the log add to the program's own time is well under either.
+    const auto request = FailsAtOnce("makecall 1 1 2");
+    ASSERT_TRUE(request) << *session.ReadErrLog();
+    EXPECT_LT(request->count(), 500);
+    ASSERT_TRUE(session.WaitForRow(PROMPT_ROW, EMPTY_PROMPT_ROW)) << session.Dump();
+    const auto oneWay = FailsAtOnce("stoprai 1 1");
+    ASSERT_TRUE(oneWay) << *session.ReadErrLog();
+    EXPECT_LT(oneWay->count(), 500);
+    ASSERT_TRUE(session.WaitForRow(PROMPT_ROW, EMPTY_PROMPT_ROW)) << session.Dump();
+    EXPECT_TRUE(session.StillRunning());
+
+    ASSERT_TRUE(sim.Restart());
+    ASSERT_TRUE(WaitInBothLogs("relay connection to " + sim.Address() + " back at "));
+    ASSERT_TRUE(WaitRestored(1)) << *session.ReadLog();
+    EXPECT_FALSE(session.WaitForText("relay cut off", std::chrono::milliseconds(0)))
+        << session.Dump();
+    ExpectRowsFollowTheBoard();
 }
 
 TEST(RelayHelp, EventsDuringThePagerDrawOnlyWhenTheScreenComesBack) {

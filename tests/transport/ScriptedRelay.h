@@ -18,15 +18,23 @@ class ScriptedRelay {
   public:
     using Script = std::function<void(sock& conn)>;
 
+    // Plays one script on each of `connections` connections, one after the other: the index
+    // tells which connection it is.
+    using Scripts = std::function<void(sock& conn, int index)>;
+
     explicit ScriptedRelay(Script script)
+        : ScriptedRelay([script](sock& conn, int) { script(conn); }, 1) {}
+    ScriptedRelay(Scripts scripts, int connections)
         : listener(std::make_unique<sock>(inet_addr("127.0.0.1"), 0)) {
         EXPECT_EQ(0, listener->bind());
         EXPECT_EQ(0, listener->listen(4));
         port = listener->localPort();
-        worker = std::thread([this, script] {
-            std::unique_ptr<sock> conn(listener->accept());
-            if (conn) {
-                script(*conn);
+        worker = std::thread([this, scripts, connections] {
+            for (int i = 0; i < connections; ++i) {
+                std::unique_ptr<sock> conn(listener->accept());
+                if (conn) {
+                    scripts(*conn, i);
+                }
             }
         });
     }
@@ -49,7 +57,8 @@ class ScriptedRelay {
     }
 
     // Reads the open and answers with the assigned address.
-    static bool acceptOpen(sock& conn, Bytes* openBody = nullptr) {
+    static bool acceptOpen(sock& conn, Bytes* openBody = nullptr,
+                           TKCompDesc assigned = assignedAddress()) {
         msg_t m;
         if (conn.get_msg(m) != 0 || m.type != TKS_FRAME_OPEN) {
             free_msg(m);
@@ -60,7 +69,7 @@ class ScriptedRelay {
         }
         free_msg(m);
         unsigned char body[TKS_ASSIGNED_BODY_BYTES];
-        tksEncodeAssigned(assignedAddress(), body);
+        tksEncodeAssigned(assigned, body);
         msg_t a;
         a.type = TKS_FRAME_ASSIGNED;
         a.size = TKS_ASSIGNED_BODY_BYTES;

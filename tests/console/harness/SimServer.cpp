@@ -11,10 +11,19 @@
 
 namespace lineprobe::testing {
 
-SimServer::SimServer(const std::string& farmFile, const std::vector<std::string>& extraArgs) {
-    std::vector<std::string> args = {VX7SIM_BINARY, "--farm", farmFile,   "--port",
-                                     "0",           "--bind", "127.0.0.1"};
-    args.insert(args.end(), extraArgs.begin(), extraArgs.end());
+SimServer::SimServer(const std::string& farmFile, const std::vector<std::string>& extraArgs)
+    : farm_(farmFile), extraArgs_(extraArgs) {
+    Launch("0");
+}
+
+SimServer::~SimServer() {
+    Kill();
+}
+
+void SimServer::Launch(const std::string& port) {
+    std::vector<std::string> args = {VX7SIM_BINARY, "--farm", farm_,      "--port",
+                                     port,          "--bind", "127.0.0.1"};
+    args.insert(args.end(), extraArgs_.begin(), extraArgs_.end());
     std::vector<char*> argv;
     for (std::string& a : args) {
         argv.push_back(a.data());
@@ -55,18 +64,30 @@ SimServer::SimServer(const std::string& farmFile, const std::vector<std::string>
     }
 }
 
-SimServer::~SimServer() {
+void SimServer::Kill() {
     if (pid_ > 0) {
-        kill(pid_, SIGTERM);
+        kill(pid_, SIGKILL);
         int status = 0;
         waitpid(pid_, &status, 0);
+        pid_ = -1;
     }
     if (toSim_ >= 0) {
         close(toSim_);
+        toSim_ = -1;
     }
     if (fromSim_ >= 0) {
         close(fromSim_);
+        fromSim_ = -1;
     }
+    pending_.clear();
+}
+
+bool SimServer::Restart() {
+    const int port = port_;
+    Kill();
+    port_ = 0;
+    Launch(std::to_string(port));
+    return port_ == port;
 }
 
 std::string SimServer::Address() const {

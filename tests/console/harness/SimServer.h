@@ -27,13 +27,22 @@ class SimServer {
     // "127.0.0.1:PORT", for REMOTE_TKHOST.
     std::string Address() const;
 
+    // Ends the relay at once, as a crash would: every connection breaks, and nothing listens
+    // on its port until Restart.
+    void Kill();
+    // A new relay on the port of the last one; true when it listens there.
+    bool Restart();
+
     // Sends one control line and returns its answer, or "" when none came in time.
     std::string Control(const std::string& line,
                         std::chrono::milliseconds timeout = std::chrono::milliseconds(15000));
 
   private:
+    void Launch(const std::string& port);
     std::string ReadLine(std::chrono::milliseconds timeout);
 
+    std::string farm_;
+    std::vector<std::string> extraArgs_;
     pid_t pid_ = -1;
     int toSim_ = -1;
     int fromSim_ = -1;

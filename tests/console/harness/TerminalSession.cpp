@@ -339,6 +339,14 @@ bool TerminalSession::WaitForLogLine(const std::string& file, const std::string&
     });
 }
 
+bool TerminalSession::AlternateScreen() {
+    return PaneFormat("#{alternate_on}") == "1";
+}
+
+std::string TerminalSession::TerminalModes() {
+    return RunCapture({"stty", "-a", "-F", PaneFormat("#{pane_tty}")}, nullptr);
+}
+
 pid_t TerminalSession::Pid() {
     return pid_;
 }

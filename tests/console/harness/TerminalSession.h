@@ -91,6 +91,11 @@ class TerminalSession {
     bool WaitForLogLine(const std::string& file, const std::string& text,
                         std::chrono::milliseconds timeout = DEFAULT_WAIT);
 
+    // Whether the pane shows the alternate screen (a curses program that has not ended
+    // curses), and the modes of its terminal as `stty -a` prints them.
+    bool AlternateScreen();
+    std::string TerminalModes();
+
     pid_t Pid();
     bool IsAlive();
     // Passes when the program is still running; use after each step of a case.
