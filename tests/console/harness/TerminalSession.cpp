@@ -215,6 +215,11 @@ TerminalSession::TerminalSession(TerminalOptions options)
 }
 
 TerminalSession::~TerminalSession() {
+    // A program still running would take the closing terminal for a hang-up and stop its
+    // views, which against a relay already gone means waiting out every request.
+    if (pid_ > 0 && !ExitStatus()) {
+        kill(pid_, SIGKILL);
+    }
     try {
         Tmux({"kill-server"});
     } catch (...) {

@@ -47,7 +47,7 @@ struct TerminalOptions {
 // Runs the real lineprobe in a pseudo-terminal of a private tmux server, in a fresh
 // temporary working directory, and reads its screen and logs. The pane stays open after
 // the program ends, so its last screen can still be read, and its shell records the exit
-// status. The server and the directory go with the session.
+// status. The server, the directory and a program still running go with the session.
 class TerminalSession {
   public:
     explicit TerminalSession(TerminalOptions options = {});
