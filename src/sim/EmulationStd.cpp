@@ -1,5 +1,5 @@
-// The standard operations every component takes: start and stop, parameters, and the
-// subscription commands, which go on to their own unit.
+// The standard operations every component takes: parameters, the one-way and plain
+// acknowledged commands, and the subscription commands, which go on to their own unit.
 #include <algorithm>
 
 #include "catalogue/generated/stdresource_bodies.h"
