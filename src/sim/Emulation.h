@@ -91,20 +91,29 @@ class Emulation {
         int channel = 0;
     };
 
+    // Every unit of a component type takes the request and what its target resolved to.
+    using Handler = void (Emulation::*)(Request&, const farm::Resource&);
+
+    void indexComponents(const farm::Farm& farm);
     void handle(Request& rq);
-    void handleResourceMgr(Request& rq);
-    void handleClusterMgr(Request& rq);
-    void handleCluster(Request& rq);
-    bool handleStd(Request& rq, const farm::Resource& r);
+    void handleBoard(Request& rq, const farm::Resource& r);
+    void handleResourceMgr(Request& rq, const farm::Resource& r);
+    void handleClusterMgr(Request& rq, const farm::Resource& r);
+    void handleCluster(Request& rq, const farm::Resource& r);
+    void handleStd(Request& rq, const farm::Resource& r);
+    void handleSubscription(Request& rq);
     bool parmValue(const farm::Resource& r, std::uint32_t num, std::uint32_t& val) const;
     // The first component of the board in `start` that fits the search, or null.
     const Component* findComponent(const Address& start, const Address* cluster, std::uint8_t type,
                                    tolk::staticList<tolk::CompAttr_t>& attrs,
                                    unsigned int count) const;
-    void handleTsc(Request& rq, Channel& ch);
-    void handleLcon(Request& rq, Line& line);
-    void handleCas(Request& rq);
+    void handleTsc(Request& rq, const farm::Resource& r);
+    void handleLcon(Request& rq, const farm::Resource& r);
+    void handleCas(Request& rq, const farm::Resource& r);
 
+    // Queues one block from `src` to `tgt`, with `body` written behind the header if any.
+    void post(std::uint32_t type, std::uint32_t trans, const Address& src, const Address& tgt,
+              tolk::MsgBody* body);
     void reply(Request& rq, std::uint32_t type, tolk::MsgBody* body);
     void refuse(Request& rq, std::uint32_t code);
     // Answers an operation: the completion `okType` (none if 0) when `code` is 0, else a refusal.

@@ -709,6 +709,24 @@ TEST(EmulationCore, WhatItCannotAnswerIsLoggedByTypeAndTarget) {
         << text;
 }
 
+TEST(EmulationCore, TheBoardItselfAnswersNothingAndMediaTakeOnlyStandardOperations) {
+    std::ostringstream log;
+    Emulation emu(defaultFarm(), log);
+    emu.receive(block(0x02, farm::boardAddress(1), 1, {}));
+    EXPECT_TRUE(drain(emu).empty());
+    EXPECT_NE(log.str().find("the board itself takes no messages"), std::string::npos) << log.str();
+
+    const farm::Address media = farm::mediaAddress(2, 11, farm::Media::SigDet);
+    emu.receive(block(0x02, media, 2, {}));
+    emu.receive(block(0x1415, media, 3, {}));
+    auto out = drain(emu);
+    ASSERT_EQ(out.size(), 2u);
+    EXPECT_EQ(reinterpret_cast<const TKMsg32Bit*>(out[0].data())->type, 0x03u);
+    EXPECT_EQ(reinterpret_cast<const TKMsg32Bit*>(out[1].data())->type, 0u);  // MsgError_t
+    EXPECT_NE(log.str().find("not a message of this component"), std::string::npos) << log.str();
+    EXPECT_EQ(emu.stats().unanswered, 2u);
+}
+
 TEST(EmulationCore, SameRequestsAndControlLinesGiveTheSameBytes) {
     auto run = [] {
         std::ostringstream log;
