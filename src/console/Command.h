@@ -14,6 +14,8 @@ class View;
 class Command {
   public:
     explicit Command(std::string name) : name_(std::move(name)) {}
+    // Whoever owns a command owns it through this base.
+    virtual ~Command() = default;
 
     virtual std::string GetCommandName();
     virtual int Execute();

@@ -19,7 +19,6 @@ using namespace vx7diag;
 
 constexpr unsigned int kClusterFind = 0x800053;
 constexpr unsigned int kDetectxEvts = 0x18;
-constexpr unsigned int kDetectEvt = 0x16;
 constexpr unsigned int kCancelxEvts = 0x1C;
 
 class Publisher : public SimFixture {
