@@ -57,8 +57,12 @@ check_deb() {
   out="$("$lineprobe" -v)" || fail "lineprobe -v ended with $?"
   [ "$out" = "lineprobe version 1.0" ] || fail "lineprobe -v printed: $out"
   out="$("$vx7sim" --help)" || fail "vx7sim --help ended with $?"
-  [ "$(head -n 1 <<<"$out")" = "usage: vx7sim [--farm FILE] [--port PORT] [--bind ADDRESS]" ] ||
+  [[ "$(head -n 1 <<<"$out")" == "usage: vx7sim [--farm FILE] [--port PORT] [--bind ADDRESS]"* ]] ||
     fail "vx7sim --help printed: $(head -n 3 <<<"$out")"
+
+  # The relay decoder goes where Debian's Wireshark loads global Lua plugins by itself.
+  find "$prefix/lib" -path '*/wireshark/plugins/vx7relay.lua' -type f | grep -q . ||
+    fail "no vx7relay.lua under lib/*/wireshark/plugins: $(dpkg-deb -c "$deb")"
 
   local man1="$prefix/share/man/man1"
   check_manpages "$man1/lineprobe.1.gz" "$man1/vx7sim.1.gz"
