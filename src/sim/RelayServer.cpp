@@ -434,11 +434,7 @@ bool RelayServer::handleFrame(Conn& c, std::uint32_t type, const unsigned char* 
 
 void RelayServer::route(TKMsg32Bit* block) {
     TKCompDesc tgt{};
-    tgt.board = block->tgtBoard;
-    tgt.instance = block->tgtInstance;
-    tgt.processor = block->tgtProcessor;
-    tgt.component = block->tgtComponent;
-    tgt.node = block->tgtNode;
+    (void)tkMsgFieldGet(block, TK_FIELD_TGT, &tgt);
     if (isHostAddress(tgt)) {
         auto it = byInstance_.find(tgt.instance);
         if (it != byInstance_.end() && !it->second->dead && tgt.processor == 0 &&

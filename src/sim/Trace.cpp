@@ -100,22 +100,16 @@ void address(std::ostream& os, const TKCompDesc& a) {
 }  // namespace
 
 std::string traceLine(std::string_view direction, std::uint64_t conn, const TKMsg32Bit* block) {
+    // The library's own header access: it reads and never changes the block.
+    TKMsg32Bit* header = const_cast<TKMsg32Bit*>(block);
     TKCompDesc src{};
-    src.node = block->srcNode;
-    src.board = block->srcBoard;
-    src.processor = block->srcProcessor;
-    src.component = block->srcComponent;
-    src.instance = block->srcInstance;
     TKCompDesc tgt{};
-    tgt.node = block->tgtNode;
-    tgt.board = block->tgtBoard;
-    tgt.processor = block->tgtProcessor;
-    tgt.component = block->tgtComponent;
-    tgt.instance = block->tgtInstance;
+    (void)tkMsgFieldGet(header, TK_FIELD_SRC, &src);
+    (void)tkMsgFieldGet(header, TK_FIELD_TGT, &tgt);
     const Table* own = ownTable(tgt.board != TK_HOST_BOARD ? tgt : src);
 
     // A copy, so that reading it cannot disturb the block on its way.
-    TKSMsgRef view(const_cast<TKMsg32Bit*>(block));
+    TKSMsgRef view(header);
     TKSMsgRef copy = view.clone();
     tolk::Msg msg(&copy);
 
@@ -133,7 +127,7 @@ std::string traceLine(std::string_view direction, std::uint64_t conn, const TKMs
         os << "type 0x" << std::hex << block->type << std::dec;
     }
     if (block->type == tolk::MsgEvtDetected_t::Type && block->size >= 4) {
-        const unsigned char* p = tkMsgBody(const_cast<TKMsg32Bit*>(block));
+        const unsigned char* p = tkMsgBody(header);
         unsigned int group = (unsigned{p[0]} << 24) | (unsigned{p[1]} << 16) |
                              (unsigned{p[2]} << 8) | unsigned{p[3]};
         if (const char* name =
