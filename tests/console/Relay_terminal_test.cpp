@@ -135,6 +135,29 @@ TEST_F(RelayTest, SilentBoardAndDroppedRelayLeaveThePromptWorking) {
     EXPECT_NE((*log + *errors).find("Timeout"), std::string::npos);
 }
 
+// A view whose subscription the board refused is still reported as made (that text is fixed),
+// but the error log says which view will not follow its board; a view that subscribed says
+// nothing there.
+TEST_F(RelayTest, ViewWhoseSubscriptionFailedSaysSoInTheErrorLog) {
+    ASSERT_TRUE(commands.Run("phone 1 1 3"));
+    ASSERT_EQ(commands.Result(), "phone view creaed successfully");
+    Control("refuse 18");
+    Control("refuse 16");
+    ASSERT_TRUE(commands.Run("phone 1 1 4"));
+    EXPECT_EQ(commands.Result(), "phone view creaed successfully");
+    ASSERT_TRUE(commands.Run("trunk 1 2"));
+    EXPECT_EQ(commands.Result(), "trunk view creaed successfully");
+    const auto errors = session.ReadErrLog();
+    ASSERT_TRUE(errors);
+    const std::string follow =
+        ": subscription to the board's events failed, the view will not "
+        "follow the board";
+    EXPECT_NE(errors->find("phone view 1.1.4" + follow), std::string::npos) << *errors;
+    EXPECT_NE(errors->find("trunk view 1.2" + follow), std::string::npos) << *errors;
+    EXPECT_EQ(errors->find("1.1.3"), std::string::npos) << *errors;
+    EXPECT_TRUE(session.StillRunning());
+}
+
 // The README's demo scenario, played by vx7sim itself: each step shows on the rows before the
 // next one does.
 TEST(RelayScript, DemoScenarioReachesTheRowsInItsOrder) {
