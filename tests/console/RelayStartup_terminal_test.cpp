@@ -90,6 +90,26 @@ INSTANTIATE_TEST_SUITE_P(
                                       conn.snd_msg(m);
                                       char byte;
                                       conn.readblock(&byte, 1);
+                                  }},
+                      // Half a header, then nothing: the whole answer must come within the
+                      // open's limit, not only its first byte.
+                      BadOpenCase{"WithHalfAHeader",
+                                  [](sock& conn) {
+                                      ReadTheOpen(conn);
+                                      Bytes half = frameHeader(TKS_FRAME_ASSIGNED,
+                                                               TKS_ASSIGNED_BODY_BYTES, 0);
+                                      half.resize(10);
+                                      ScriptedRelay::sendRaw(conn, half);
+                                      char byte;
+                                      conn.readblock(&byte, 1);
+                                  }},
+                      BadOpenCase{"WithAnAbsurdSize",
+                                  [](sock& conn) {
+                                      ReadTheOpen(conn);
+                                      ScriptedRelay::sendRaw(
+                                          conn, frameHeader(TKS_FRAME_ASSIGNED, 0xFFFFFFFFu, 0));
+                                      char byte;
+                                      conn.readblock(&byte, 1);
                                   }}),
     [](const ::testing::TestParamInfo<BadOpenCase>& i) { return std::string(i.param.name); });
 

@@ -57,16 +57,6 @@ TKMsg32Bit* blockFor(TKCompDesc to, unsigned int type, unsigned int trans, unsig
     return b;
 }
 
-Bytes frameHeader(std::uint32_t type, std::uint32_t size, std::uint32_t exSize) {
-    Bytes b;
-    PutU32(b, type);
-    PutU32(b, 0);
-    PutU32(b, size);
-    PutU32(b, exSize);
-    PutU32(b, 0xDEADBEEF);  // the sender's own pointer: ignored
-    return b;
-}
-
 TKSMsgQueue* openQueue(const ScriptedRelay& relay) {
     TKCompDesc want{};
     want.node = 1;
