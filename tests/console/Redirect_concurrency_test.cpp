@@ -1,12 +1,12 @@
 #include <gtest/gtest.h>
 #include <unistd.h>
 
+#include <cstdio>
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <iostream>
 #include <map>
-#include <regex>
 #include <string>
 #include <thread>
 #include <utility>
@@ -35,22 +35,40 @@ class RedirectedLogs : public ::testing::Test {
         std::filesystem::remove_all(dir_);
     }
 
+    // "TAG writer W line I xx...x end", whole, or nothing: W and I go to `writer` and `index`.
+    static bool ParseLine(const std::string& line, const std::string& tag, int& writer,
+                          int& index) {
+        const std::string head = tag + " writer ";
+        if (line.rfind(head, 0) != 0) {
+            return false;
+        }
+        int used = 0;
+        if (std::sscanf(line.c_str() + head.size(), "%5d line %5d %n", &writer, &index, &used) !=
+                2 ||
+            used == 0) {
+            return false;
+        }
+        const std::string tail = line.substr(head.size() + static_cast<std::size_t>(used));
+        const std::size_t xs = tail.find_first_not_of('x');
+        return xs != 0 && xs != std::string::npos && tail.substr(xs) == " end";
+    }
+
     // Every line of the file must be one that a writer wrote, whole, and each exactly once.
     static void ExpectEveryLineOnce(const std::filesystem::path& log, const std::string& tag) {
-        const std::regex whole("(" + tag + ") writer ([0-9]{1,5}) line ([0-9]{1,5}) x+ end");
         std::map<std::pair<int, int>, int> seen;
         std::ifstream file(log);
         std::string line;
         int broken = 0;
         while (std::getline(file, line)) {
-            std::smatch parts;
-            if (!std::regex_match(line, parts, whole)) {
+            int writer = -1;
+            int index = -1;
+            if (!ParseLine(line, tag, writer, index)) {
                 if (++broken <= 3) {
                     ADD_FAILURE() << log.filename() << ": torn line \"" << line << "\"";
                 }
                 continue;
             }
-            ++seen[{std::stoi(parts[2]), std::stoi(parts[3])}];
+            ++seen[{writer, index}];
         }
         EXPECT_EQ(broken, 0) << log.filename();
         int missing = 0;
