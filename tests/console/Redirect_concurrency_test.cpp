@@ -12,6 +12,7 @@
 #include <utility>
 #include <vector>
 
+#include "RedirectFixture.h"
 #include "console/Redirect.h"
 
 namespace lineprobe {
@@ -20,21 +21,8 @@ namespace {
 constexpr int kWriters = 6;
 constexpr int kLinesEach = 4000;
 
-class RedirectedLogs : public ::testing::Test {
+class RedirectedLogs : public testing::RedirectedStreams {
   protected:
-    void SetUp() override {
-        std::string pattern = (std::filesystem::temp_directory_path() / "lp-lines-XXXXXX").string();
-        ASSERT_NE(mkdtemp(pattern.data()), nullptr);
-        dir_ = pattern;
-        savedCout_ = std::cout.rdbuf();
-        savedCerr_ = std::cerr.rdbuf();
-    }
-    void TearDown() override {
-        std::cout.rdbuf(savedCout_);
-        std::cerr.rdbuf(savedCerr_);
-        std::filesystem::remove_all(dir_);
-    }
-
     // "TAG writer W line I xx...x end", whole, or nothing: W and I go to `writer` and `index`.
     static bool ParseLine(const std::string& line, const std::string& tag, int& writer,
                           int& index) {
@@ -87,10 +75,6 @@ class RedirectedLogs : public ::testing::Test {
         EXPECT_EQ(doubled, 0) << log.filename();
         EXPECT_EQ(seen.size(), static_cast<size_t>(kWriters * kLinesEach)) << log.filename();
     }
-
-    std::filesystem::path dir_;
-    std::streambuf* savedCout_ = nullptr;
-    std::streambuf* savedCerr_ = nullptr;
 };
 
 // Threads trace as the reader threads and the main thread do: each line in several pieces,

@@ -1,5 +1,7 @@
 #include "console/Redirect.h"
 
+#include "RedirectFixture.h"
+
 #include <gtest/gtest.h>
 #include <unistd.h>
 
@@ -20,25 +22,7 @@ std::string Slurp(const std::filesystem::path& path) {
     return text.str();
 }
 
-class RedirectTest : public ::testing::Test {
-  protected:
-    void SetUp() override {
-        std::string pattern = (std::filesystem::temp_directory_path() / "lp-redir-XXXXXX").string();
-        ASSERT_NE(mkdtemp(pattern.data()), nullptr);
-        dir_ = pattern;
-        savedCout_ = std::cout.rdbuf();
-        savedCerr_ = std::cerr.rdbuf();
-    }
-    void TearDown() override {
-        std::cout.rdbuf(savedCout_);
-        std::cerr.rdbuf(savedCerr_);
-        std::filesystem::remove_all(dir_);
-    }
-
-    std::filesystem::path dir_;
-    std::streambuf* savedCout_ = nullptr;
-    std::streambuf* savedCerr_ = nullptr;
-};
+using RedirectTest = testing::RedirectedStreams;
 
 TEST_F(RedirectTest, CoutGoesToATruncatedFile) {
     const std::filesystem::path log = dir_ / "lineprobe.log";
