@@ -11,6 +11,8 @@ A schema is line based. '#' starts a comment. Lines:
   evt <group> <Body> <field>...    an event body, known to the class's event lookup
     elem <Elem> <field>...         (indented) element body nested in the body above
     hand <Elem> <Template>         (indented) hand-written element: <Template><Outer>
+  value <Group> <NAME> <number>    a named wire value of the class (state, alarm, reason,
+                                   parameter id, ...), for every layer that must write it
 
 A field is <Label>:<type> with <type> one of
   u8 u16 u32 word32 i32            numbers
@@ -23,7 +25,9 @@ A field is <Label>:<type> with <type> one of
   @Ops(X)                          hand-written field: cat::Ops<Outer>::ops, argument field X
 
 Output (deterministic, no timestamps): <outdir>/catalogue/generated/<name>_bodies.{h,cpp}
-for each class, <outdir>/catalogue/generated/index.{h,cpp} listing every body, and
+for each class, <outdir>/catalogue/generated/index.{h,cpp} listing every body,
+<outdir>/catalogue/generated/values.h with the named values as
+tolk::wire::<Class>::<Group>::<NAME> (header only: layers below the catalogue include it), and
 <outdir>/catalogue/generated/vx7relay.lua, the Wireshark decoder of the relay protocol
 (written by luagen.py from the same tables).
 """
@@ -177,6 +181,31 @@ class Cls:
         self.schema = schema
         self.includes = includes
         self.bodies = []
+        self.values = []  # (group, name, number, where)
+
+
+VALUE_NAME = re.compile(r"[A-Z][A-Z0-9_]*")
+VALUE_GROUP = re.compile(r"[A-Z][A-Za-z0-9]*")
+
+
+def parse_value(cls, tok, where):
+    """value <Group> <NAME> <number>: one named wire value in the class's namespace."""
+    if cls is None:
+        raise SchemaError(f"{where}: value before any class")
+    if len(tok) != 4:
+        raise SchemaError(f"{where}: value takes a group, a name and a number")
+    group, name, text = tok[1], tok[2], tok[3]
+    if not VALUE_GROUP.fullmatch(group) or not VALUE_NAME.fullmatch(name):
+        raise SchemaError(f"{where}: value {group} {name}: group is CamelCase, name CAPITALS")
+    try:
+        number = int(text, 0)
+    except ValueError:
+        raise SchemaError(f"{where}: value {name}: {text} is no number") from None
+    if not 0 <= number <= 0xFFFFFFFF:
+        raise SchemaError(f"{where}: value {name}: {text} does not fit 32 bits")
+    if any(v[0] == group and v[1] == name for v in cls.values):
+        raise SchemaError(f"{where}: value {group} {name} twice in {cls.name}")
+    cls.values.append((group, name, number, where))
 
 
 def parse(path):
@@ -214,6 +243,8 @@ def parse(path):
             last.elems.append(e)
         elif word == "hand" and indented and last is not None:
             last.hands.append((tok[1], tok[2]))
+        elif word == "value" and not indented:
+            parse_value(cls, tok, where)
         else:
             raise SchemaError(f"{where}: cannot read '{line.strip()}'")
     for c in classes:
@@ -501,6 +532,30 @@ def index_files(classes, headers):
     return "\n".join(h), "\n".join(s)
 
 
+def values_header(classes):
+    g = "generated from " + " ".join(sorted({c.schema for c in classes})) + " by catgen.py; do not edit"
+    out = [f"// {g}", "#pragma once", "", "namespace tolk::wire {", ""]
+    for c in classes:
+        if not c.values:
+            continue
+        out.append(f"namespace {c.name} {{")
+        groups = []
+        for v in c.values:
+            if v[0] not in groups:
+                groups.append(v[0])
+        for group in groups:
+            out.append(f"namespace {group} {{")
+            for g_, name, number, _ in c.values:
+                if g_ == group:
+                    text = str(number) if number < 0x100 else f"0x{number:X}"
+                    out.append(f"inline constexpr unsigned int {name} = {text};")
+            out.append(f"}}  // namespace {group}")
+        out.append(f"}}  // namespace {c.name}")
+        out.append("")
+    out += ["}  // namespace tolk::wire", ""]
+    return "\n".join(out)
+
+
 def write_if_changed(path, text):
     if os.path.exists(path) and open(path, encoding="utf-8").read() == text:
         return
@@ -527,6 +582,7 @@ def main(argv):
         headers.append(hname)
         write_if_changed(os.path.join(outdir, hname), header(c))
         write_if_changed(os.path.join(outdir, hname[:-2] + ".cpp"), source(c, hname))
+    write_if_changed(os.path.join(outdir, "values.h"), values_header(classes))
     ih, isrc = index_files(classes, headers)
     write_if_changed(os.path.join(outdir, "index.h"), ih)
     write_if_changed(os.path.join(outdir, "index.cpp"), isrc)
