@@ -8,7 +8,7 @@ namespace vx7diag {
 class AllAlarms : public EventPublication<AllAlarms, tolk::LCON::Evt_0x1600_t> {
   public:
     static constexpr int ComponentKind = VX7EventPublisher::LCON_COMPONENT;
-    static constexpr unsigned int GroupNumber = 0x1600;
+    static constexpr unsigned int GroupNumber = tolk::LCON::Evt_0x1600_t::EvtGroup_;
 
     ~AllAlarms() override;
     void Format(char* text);

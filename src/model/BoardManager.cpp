@@ -5,6 +5,7 @@
 #include <iostream>
 #include <optional>
 
+#include "catalogue/generated/values.h"
 #include "catalogue/lcon/LCON.h"
 #include "model/Guarded.h"
 #include "model/ParmValue.h"
@@ -22,11 +23,11 @@ constexpr unsigned int kVoiceAUsPerGroup = 4;
 constexpr unsigned int kLineAUType = 503;
 constexpr unsigned int kVoiceGroupAUType = 501;
 constexpr unsigned int kVoiceAUType = 502;
-constexpr unsigned int kLconType = 22;
-constexpr unsigned int kParmTrunkType = 0x1601;
-constexpr unsigned int kParmSignalingType = 0x1602;
-constexpr unsigned int kParmRoutingMode = 0x1313;
-constexpr int kAnalogLine = 4;
+constexpr unsigned int kLconType = tolk::wire::LCON::Component::TYPE;
+constexpr unsigned int kParmTrunkType = tolk::wire::LCON::Parm::TRUNK_TYPE;
+constexpr unsigned int kParmSignalingType = tolk::wire::LCON::Parm::SIGNALING_TYPE;
+constexpr unsigned int kParmRoutingMode = tolk::wire::CHP::Parm::ROUTING_MODE;
+constexpr int kAnalogLine = tolk::wire::LCON::TrunkType::ANALOG;
 constexpr int kAnalogChannels = 4;
 constexpr int kCasSignaling = 4;
 
@@ -260,7 +261,8 @@ int BoardManager::GetTocRocParmValue() {
     unsigned int mode = 0;
     // A board that cannot say counts as one without flexible routing.
     RunGuarded(std::cout, "GetTocRocParmValue - ", [&] {
-        tolk::Component chp = Captured([&] { return board->findComp(19, 255); });
+        tolk::Component chp =
+            Captured([&] { return board->findComp(tolk::wire::CHP::Component::TYPE, 255); });
         mode = ParmValue(chp, kParmRoutingMode);
     });
     return static_cast<int>(mode);

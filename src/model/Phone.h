@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "catalogue/cluster/Cluster.h"
+#include "catalogue/generated/values.h"
 #include "catalogue/tsc/TSC.h"
 #include "framework/String.h"
 
@@ -22,9 +23,9 @@ class ROCCluster;
 // the reason written to standard output. A phone keeps no call state.
 class Phone {
   public:
-    static constexpr unsigned int TSINFO_PORT = 0x4201;
-    static constexpr unsigned int TSASSIGN_PORT = 0x8201;
-    static constexpr unsigned char TSC_COMPONENT_TYPE = 18;
+    static constexpr unsigned int TSINFO_PORT = tolk::wire::Cluster::Port::TS_INFO;
+    static constexpr unsigned int TSASSIGN_PORT = tolk::wire::Cluster::Port::TS_ASSIGN;
+    static constexpr unsigned char TSC_COMPONENT_TYPE = tolk::wire::TSC::Component::TYPE;
 
     // Throws std::out_of_range for trunk 65 and above or channel 32 and above, and
     // std::runtime_error for a manager without a board or a board that has no such channel or

@@ -3,6 +3,8 @@
 #include <array>
 #include <utility>
 
+#include "catalogue/generated/values.h"
+
 namespace vx7diag {
 
 namespace {
@@ -49,35 +51,37 @@ constexpr std::array<const char*, 6> kReasons{
     "Normal", "Diagnostic", "Startup", "Maintenance", "Standby", "Alarm",
 };
 
+namespace Alarm = tolk::wire::LCON::Alarm;
+
 constexpr std::array<std::pair<unsigned int, const char*>, 19> kAlarmTypes{{
-    {0x1601, "Red"},
-    {0x1602, "Yellow"},
-    {0x1603, "AIS"},
-    {0x1604, "Loss of Signal (LOS)"},
-    {0x1605, "Loopback"},
-    {0x1606, "RAI CRC"},
-    {0x1607, "TS16 Red"},
-    {0x1608, "TS16 AIS"},
-    {0x1609, "TS16 Yellow"},
-    {0x160A, "D Channel"},
-    {0x160B, "Transmit RAI"},
-    {0x160C, "Transmit AIS"},
-    {0x160D, "Transmit RAI TS16"},
-    {0x160E, "Transmit AIS TS16"},
-    {0x1616, "Bipolar Violation Saturation"},
-    {0x1617, "Frame Error Saturation"},
-    {0x1618, "Errored Seconds Saturation"},
-    {0x1619, "Consecutively Errored Seconds Saturation"},
-    {0x161A, "Out-Of-Frame Saturation"},
+    {Alarm::RED, "Red"},
+    {Alarm::YELLOW, "Yellow"},
+    {Alarm::AIS, "AIS"},
+    {Alarm::LOS, "Loss of Signal (LOS)"},
+    {Alarm::LOOPBACK, "Loopback"},
+    {Alarm::RAI_CRC, "RAI CRC"},
+    {Alarm::TS16_RED, "TS16 Red"},
+    {Alarm::TS16_AIS, "TS16 AIS"},
+    {Alarm::TS16_YELLOW, "TS16 Yellow"},
+    {Alarm::D_CHANNEL, "D Channel"},
+    {Alarm::TRANSMIT_RAI, "Transmit RAI"},
+    {Alarm::TRANSMIT_AIS, "Transmit AIS"},
+    {Alarm::TRANSMIT_RAI_TS16, "Transmit RAI TS16"},
+    {Alarm::TRANSMIT_AIS_TS16, "Transmit AIS TS16"},
+    {Alarm::BPV_SATURATION, "Bipolar Violation Saturation"},
+    {Alarm::FERR_SATURATION, "Frame Error Saturation"},
+    {Alarm::ES_SATURATION, "Errored Seconds Saturation"},
+    {Alarm::CES_SATURATION, "Consecutively Errored Seconds Saturation"},
+    {Alarm::OOF_SATURATION, "Out-Of-Frame Saturation"},
 }};
 
 }  // namespace
 
 const char* CallInfoText(unsigned int infoId) {
     switch (infoId) {
-        case 0x100000C:
+        case tolk::wire::TSC::InfoId::CHARGE:
             return "Charge";
-        case 0x2000007:
+        case tolk::wire::TSC::InfoId::CALLER_ID:
             return "CallerId";
         default:
             return kUnknown;
@@ -94,9 +98,9 @@ const char* CallStateText(unsigned int callState) {
 
 const char* TrunkStateText(unsigned int type) {
     switch (type) {
-        case 0x160F:
+        case tolk::wire::LCON::LineState::IN_SERVICE:
             return "In Service";
-        case 0x1610:
+        case tolk::wire::LCON::LineState::OUT_OF_SERVICE:
             return "Out Of Service";
         default:
             return kUnknown;

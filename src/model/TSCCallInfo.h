@@ -8,7 +8,7 @@ namespace vx7diag {
 class TSCCallInfo : public EventPublication<TSCCallInfo, tolk::TSC::EvtCallInfo_t> {
   public:
     static constexpr int ComponentKind = VX7EventPublisher::TSC_COMPONENT;
-    static constexpr unsigned int GroupNumber = 0x1200;
+    static constexpr unsigned int GroupNumber = tolk::TSC::EvtCallInfo_t::EvtGroup_;
 
     ~TSCCallInfo() override;
     tolk::staticList<unsigned int> EventTypeList() const override;

@@ -8,7 +8,7 @@ namespace vx7diag {
 class TSCCallState : public EventPublication<TSCCallState, tolk::TSC::EvtCallState_t> {
   public:
     static constexpr int ComponentKind = VX7EventPublisher::TSC_COMPONENT;
-    static constexpr unsigned int GroupNumber = 0x1230;
+    static constexpr unsigned int GroupNumber = tolk::TSC::EvtCallState_t::EvtGroup_;
 
     ~TSCCallState() override;
     tolk::staticList<unsigned int> EventTypeList() const override;

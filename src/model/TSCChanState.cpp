@@ -3,16 +3,16 @@
 #include <cstdio>
 #include <iostream>
 
+#include "catalogue/generated/values.h"
 #include "model/PublicationTexts.h"
 
 namespace vx7diag {
 
 namespace {
 
-// 0x1260 to 0x1269, then 0x126C and 0x126D: 0x126A and 0x126B are no channel states.
-constexpr unsigned int g_ChanStateList[] = {
-    0x1260, 0x1261, 0x1262, 0x1263, 0x1264, 0x1265, 0x1266, 0x1267, 0x1268, 0x1269, 0x126C, 0x126D,
-};
+// A channel state event's type is the base plus the state; the board reports states 1 to 10,
+// 13 and 14 (the types of 11 and 12 belong to other events).
+constexpr unsigned int g_ChanStates[] = {1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 13, 14};
 
 }  // namespace
 
@@ -20,9 +20,9 @@ TSCChanState::~TSCChanState() = default;
 
 tolk::staticList<unsigned int> TSCChanState::EventTypeList() const {
     tolk::staticList<unsigned int> list;
-    list.realloc(std::size(g_ChanStateList));
+    list.realloc(std::size(g_ChanStates));
     for (unsigned int i = 0; i < list.length(); ++i) {
-        *list.element(i) = g_ChanStateList[i];
+        *list.element(i) = tolk::wire::TSC::EvtType::CHAN_STATE_BASE + g_ChanStates[i];
     }
     return list;
 }

@@ -8,7 +8,7 @@ namespace vx7diag {
 class TSCChanState : public EventPublication<TSCChanState, tolk::TSC::EvtChanState_t> {
   public:
     static constexpr int ComponentKind = VX7EventPublisher::TSC_COMPONENT;
-    static constexpr unsigned int GroupNumber = 0x1260;
+    static constexpr unsigned int GroupNumber = tolk::TSC::EvtChanState_t::EvtGroup_;
 
     ~TSCChanState() override;
     tolk::staticList<unsigned int> EventTypeList() const override;

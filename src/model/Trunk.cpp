@@ -3,6 +3,7 @@
 #include <iostream>
 #include <string>
 
+#include "catalogue/generated/values.h"
 #include "catalogue/stdresource/StdResource.h"
 #include "framework/Msg.h"
 #include "framework/tolk.h"
@@ -14,9 +15,10 @@ namespace vx7diag {
 
 namespace {
 
-constexpr unsigned char kLconType = 22;
+constexpr unsigned char kLconType = tolk::wire::LCON::Component::TYPE;
 constexpr unsigned int kOutOfServiceReason = 4;
-constexpr unsigned int kAllAlarms = 0x1600;
+namespace Alarm = tolk::wire::LCON::Alarm;
+constexpr unsigned int kAllAlarms = tolk::LCON::Evt_0x1600_t::EvtGroup_;
 
 void Trunk_UnregisteredMsgHandler(tolk::Addressable*, tolk::Msg* msg) {
     delete msg;
@@ -194,10 +196,13 @@ TrunkStatus::TrunkStatus(Trunk* t) : trunk(t) {
     }
     std::map<unsigned int, char> alarms = trunk->GetCurrentAlarms();
     const std::pair<unsigned int, unsigned int TrunkStatus::*> fields[] = {
-        {0x1604, &TrunkStatus::losCFA},      {0x1601, &TrunkStatus::redCFA},
-        {0x1602, &TrunkStatus::yellowCFA},   {0x160A, &TrunkStatus::dChanCFA},
-        {0x1616, &TrunkStatus::bpvsCnt},     {0x1617, &TrunkStatus::ferrCnt},
-        {0x1605, &TrunkStatus::loopBackCFA},
+        {Alarm::LOS, &TrunkStatus::losCFA},
+        {Alarm::RED, &TrunkStatus::redCFA},
+        {Alarm::YELLOW, &TrunkStatus::yellowCFA},
+        {Alarm::D_CHANNEL, &TrunkStatus::dChanCFA},
+        {Alarm::BPV_SATURATION, &TrunkStatus::bpvsCnt},
+        {Alarm::FERR_SATURATION, &TrunkStatus::ferrCnt},
+        {Alarm::LOOPBACK, &TrunkStatus::loopBackCFA},
     };
     for (const auto& [alarmId, field] : fields) {
         auto found = alarms.find(alarmId);

@@ -3,6 +3,7 @@
 #include <map>
 #include <memory>
 
+#include "catalogue/generated/values.h"
 #include "catalogue/lcon/LCON.h"
 #include "model/Subject.h"
 #include "transport/IsaSync.h"
@@ -13,9 +14,10 @@ namespace vx7diag {
 // state and alarms.
 class Trunk : public Subject {
   public:
-    static constexpr unsigned int IN_SERVICE = 0x160F;
-    static constexpr unsigned int OUT_OF_SERVICE = 0x1610;
-    static constexpr unsigned int ERROR_ALREADY_IN_SERVICE = 0x1600;
+    static constexpr unsigned int IN_SERVICE = tolk::wire::LCON::LineState::IN_SERVICE;
+    static constexpr unsigned int OUT_OF_SERVICE = tolk::wire::LCON::LineState::OUT_OF_SERVICE;
+    static constexpr unsigned int ERROR_ALREADY_IN_SERVICE =
+        tolk::wire::LCON::Error::ALREADY_IN_SERVICE;
 
     // Throws BoardFailure (a std::runtime_error with the reason) when the board lacks the line or
     // refuses or ignores the searches for its cluster and LCON.

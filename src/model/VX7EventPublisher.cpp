@@ -8,6 +8,7 @@
 #include "catalogue/cas/CAS.h"
 #include "catalogue/chp/CHP.h"
 #include "catalogue/cluster/Cluster.h"
+#include "catalogue/generated/values.h"
 #include "catalogue/lcon/LCON.h"
 #include "catalogue/tsc/TSC.h"
 #include "framework/MsgQueue.h"
@@ -281,20 +282,20 @@ bool VX7EventPublisher::Subscribe(VX7EventPublication* publication) {
     int kind = publication->Component();
     switch (kind) {
         case CAS_COMPONENT:
-            return SubscribeOn(this, cas, casCount, tscCluster, 20, kind, publication,
-                               &VX7EventPublisher::SetPublisher,
+            return SubscribeOn(this, cas, casCount, tscCluster, tolk::wire::CAS::Component::TYPE,
+                               kind, publication, &VX7EventPublisher::SetPublisher,
                                &VX7EventPublisher::ForgetPublisher);
         case CHP_COMPONENT:
-            return SubscribeOn(this, chp, chpCount, tscCluster, 19, kind, publication,
-                               &VX7EventPublisher::SetPublisher,
+            return SubscribeOn(this, chp, chpCount, tscCluster, tolk::wire::CHP::Component::TYPE,
+                               kind, publication, &VX7EventPublisher::SetPublisher,
                                &VX7EventPublisher::ForgetPublisher);
         case LCON_COMPONENT:
-            return SubscribeOn(this, lcon, lconCount, lconCluster, 22, kind, publication,
-                               &VX7EventPublisher::SetPublisher,
-                               &VX7EventPublisher::ForgetPublisher);
+            return SubscribeOn(
+                this, lcon, lconCount, lconCluster, tolk::wire::LCON::Component::TYPE, kind,
+                publication, &VX7EventPublisher::SetPublisher, &VX7EventPublisher::ForgetPublisher);
         case TSC_COMPONENT:
-            return SubscribeOn(this, tsc, tscCount, tscCluster, 18, kind, publication,
-                               &VX7EventPublisher::SetPublisher,
+            return SubscribeOn(this, tsc, tscCount, tscCluster, tolk::wire::TSC::Component::TYPE,
+                               kind, publication, &VX7EventPublisher::SetPublisher,
                                &VX7EventPublisher::ForgetPublisher);
         default:
             return true;
@@ -432,7 +433,10 @@ void Release(VX7EventPublisher* publisher, Component*& object, unsigned int& cou
     // The board never confirmed the cancellation, so events may still come. Without their
     // registrations they go to the unregistered handler; cancelling also waits for a delivery
     // that is under way on the reader thread, which may be inside our Notify.
-    for (unsigned int group : {0x1200u, 0x1230u, 0x1260u, 0x1600u, 0x1611u}) {
+    for (unsigned int group :
+         {tolk::TSC::EvtCallInfo_t::EvtGroup_, tolk::TSC::EvtCallState_t::EvtGroup_,
+          tolk::TSC::EvtChanState_t::EvtGroup_, tolk::LCON::Evt_0x1600_t::EvtGroup_,
+          tolk::LCON::Evt_0x1611_t::EvtGroup_}) {
         try {
             object->asyncCancelEvtGroup(group);
         } catch (const tolk::Exception&) {

@@ -25,6 +25,7 @@
 #include <cstdint>
 #include <optional>
 
+#include "catalogue/generated/values.h"
 #include "platform/farm/Farm.h"
 
 namespace farm {
@@ -40,13 +41,13 @@ struct Address {
 
 inline constexpr std::uint8_t kBoardProcessor = 1;
 inline constexpr std::uint8_t kServiceComponent = 0;
-inline constexpr std::uint16_t kResourceMgrInstance = 5;
-inline constexpr std::uint16_t kClusterMgrInstance = 8;
+inline constexpr std::uint16_t kResourceMgrInstance = tolk::wire::ResourceMgr::Service::INSTANCE;
+inline constexpr std::uint16_t kClusterMgrInstance = tolk::wire::ClusterMgr::Service::INSTANCE;
 inline constexpr std::uint8_t kClusterComponent = 2;
-inline constexpr std::uint8_t kTSC = 18;
-inline constexpr std::uint8_t kCHP = 19;
-inline constexpr std::uint8_t kCAS = 20;
-inline constexpr std::uint8_t kLCON = 22;
+inline constexpr std::uint8_t kTSC = tolk::wire::TSC::Component::TYPE;
+inline constexpr std::uint8_t kCHP = tolk::wire::CHP::Component::TYPE;
+inline constexpr std::uint8_t kCAS = tolk::wire::CAS::Component::TYPE;
+inline constexpr std::uint8_t kLCON = tolk::wire::LCON::Component::TYPE;
 inline constexpr std::uint16_t kLineClusterBase = 0x1000;
 inline constexpr std::uint16_t kRocClusterBase = 0x2000;
 inline constexpr std::uint16_t kSigBufMfBase = 0x1000;

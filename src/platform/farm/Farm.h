@@ -11,13 +11,15 @@
 #include <string_view>
 #include <vector>
 
+#include "catalogue/generated/values.h"
+
 namespace farm {
 
 inline constexpr unsigned kMaxLogicalId = 32;
 // Trunk numbers stay below 65 and channel numbers below 32 everywhere in the tool.
 inline constexpr int kMaxTrunks = 64;
 inline constexpr int kMaxChannels = 31;
-inline constexpr int kAnalogTrunkType = 4;
+inline constexpr int kAnalogTrunkType = tolk::wire::LCON::TrunkType::ANALOG;
 inline constexpr int kAnalogChannels = 4;
 // The device map's voice walk has room for 256 groups of 4 voice resources.
 inline constexpr int kMaxVoiceChannels = 256 * 4;
