@@ -3,6 +3,7 @@
 #include <charconv>
 #include <vector>
 
+#include "catalogue/generated/values.h"
 #include "sim/ErrorCodes.h"
 
 namespace sim {
@@ -190,12 +191,14 @@ struct Parser {
 }  // namespace
 
 bool alarmByName(std::string_view name, std::uint32_t& alarmId) {
+    namespace Alarm = tolk::wire::LCON::Alarm;
     static constexpr struct {
         std::string_view name;
         std::uint32_t id;
     } kAlarms[] = {
-        {"red", 0x1601},      {"yellow", 0x1602}, {"ais", 0x1603},   {"los", 0x1604},
-        {"loopback", 0x1605}, {"raicrc", 0x1606}, {"dchan", 0x160A},
+        {"red", Alarm::RED},         {"yellow", Alarm::YELLOW},     {"ais", Alarm::AIS},
+        {"los", Alarm::LOS},         {"loopback", Alarm::LOOPBACK}, {"raicrc", Alarm::RAI_CRC},
+        {"dchan", Alarm::D_CHANNEL},
     };
     for (const auto& a : kAlarms) {
         if (a.name == name) {

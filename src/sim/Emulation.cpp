@@ -4,6 +4,7 @@
 
 #include <ostream>
 
+#include "catalogue/generated/stdresource_bodies.h"
 #include "sim/EmulationInternal.h"
 #include "sim/ErrorCodes.h"
 #include "transport/TKSMsgRef.h"
@@ -100,7 +101,8 @@ void Emulation::handle(Request& rq) {
     };
     bool component =
         r->kind == Kind::ChannelComponent || r->kind == Kind::Lcon || r->kind == Kind::Media;
-    if (component && rq.type <= 0x30) {
+    // The standard operations of every resource take the lowest numbers, up to the last of them.
+    if (component && rq.type <= tolk::StdResource_Bodies::MsgSetVParmCmplt_t::MsgType) {
         handleStd(rq, *r);
         return;
     }

@@ -9,27 +9,27 @@ using Cas = tolk::CAS_Bodies;
 
 void Emulation::handleCas(Request& rq, const farm::Resource&) {
     switch (rq.type) {
-        case 0x1407:
-        case 0x1409:
-        case 0x140B:
+        case Cas::MsgDisableSignal_t::MsgType:
+        case Cas::MsgEnableSignal_t::MsgType:
+        case Cas::MsgGenerateSignal_t::MsgType:
             reply(rq, rq.type + 1, nullptr);
             return;
-        case 0x140D:
+        case Cas::MsgStopSignal_t::MsgType:
             return;  // one-way
-        case 0x1415: {
+        case Cas::MsgDial_t::MsgType: {
             Cas::MsgDialCmplt_t res;
             res.Reason = 0;
-            reply(rq, 0x1416, &res);
+            reply(rq, Cas::MsgDialCmplt_t::MsgType, &res);
             return;
         }
-        case 0x1417: {
+        case Cas::MsgMatchCondition_t::MsgType: {
             Cas::MsgMatchCondition_t f;
             (void)f.readMsg(&rq.msg, 0);
             Cas::MsgMatchConditionCmplt_t res;
             res.SignalId = f.SignalId;
             res.Condition = f.Condition;
             res.Match = 0;
-            reply(rq, 0x1418, &res);
+            reply(rq, Cas::MsgMatchConditionCmplt_t::MsgType, &res);
             return;
         }
         default:

@@ -2,6 +2,7 @@
 #include <vector>
 
 #include "catalogue/generated/cluster_bodies.h"
+#include "catalogue/generated/values.h"
 #include "sim/EmulationInternal.h"
 #include "sim/ErrorCodes.h"
 
@@ -11,7 +12,7 @@ using Cl = tolk::Cluster_Bodies;
 
 namespace {
 
-constexpr std::uint32_t kTalkPort = 0x4201;
+constexpr std::uint32_t kTalkPort = tolk::wire::Cluster::Port::TS_INFO;
 constexpr std::uint8_t kSlotEncoding = 1;
 constexpr std::uint8_t kSlotIdle = 0xFF;
 
@@ -20,7 +21,7 @@ constexpr std::uint8_t kSlotIdle = 0xFF;
 void Emulation::handleCluster(Request& rq, const farm::Resource&) {
     Ports* ports = model_.clusterPorts(rq.tgt);
     switch (rq.type) {
-        case 0x800032: {
+        case Cl::ClusterSlotInfo_t::MsgType: {
             Cl::ClusterSlotInfo_t f;
             (void)f.readMsg(&rq.msg, 0);
             if (!ports) {
@@ -44,10 +45,10 @@ void Emulation::handleCluster(Request& rq, const farm::Resource&) {
                 }
             }
             res.width = static_cast<unsigned char>(res.slotIds.length());
-            reply(rq, 0x800033, &res);
+            reply(rq, Cl::ClusterSlotInfoResult_t::MsgType, &res);
             return;
         }
-        case 0x800030: {
+        case Cl::ClusterSlotAssign_t::MsgType: {
             Cl::ClusterSlotAssign_t f;
             (void)f.readMsg(&rq.msg, 0);
             if (!ports) {
@@ -66,12 +67,12 @@ void Emulation::handleCluster(Request& rq, const farm::Resource&) {
             l.slots.assign(f.slotIds.data(), f.slotIds.data() + f.slotIds.length());
             l.encoding = f.encoding;
             l.idlePattern = f.idlePattern;
-            reply(rq, 0x800000, nullptr);
+            reply(rq, Cl::ResultComplete_t::MsgType, nullptr);
             return;
         }
-        case 0x80001B:
-        case 0x800023:
-        case 0x800036: {
+        case Cl::ClusterActivate_t::MsgType:
+        case Cl::ClusterDeactivate_t::MsgType:
+        case Cl::ClusterSlotUnassign_t::MsgType: {
             Cl::ClusterDeactivate_t f;  // the activation starts with the same two fields
             (void)f.readMsg(&rq.msg, 0);
             if (!ports) {
@@ -84,13 +85,13 @@ void Emulation::handleCluster(Request& rq, const farm::Resource&) {
                 return;
             }
             Ports::Listen& l = it->second;
-            if (rq.type == 0x80001B) {
+            if (rq.type == Cl::ClusterActivate_t::MsgType) {
                 if (l.active) {
                     refuse(rq, kErrBadState);
                     return;
                 }
                 l.active = true;
-            } else if (rq.type == 0x800023) {
+            } else if (rq.type == Cl::ClusterDeactivate_t::MsgType) {
                 if (!l.active) {
                     refuse(rq, kErrBadState);
                     return;
@@ -103,10 +104,10 @@ void Emulation::handleCluster(Request& rq, const farm::Resource&) {
                 }
                 ports->listen.erase(it);
             }
-            reply(rq, 0x800000, nullptr);
+            reply(rq, Cl::ResultComplete_t::MsgType, nullptr);
             return;
         }
-        case 0x800027: {
+        case Cl::ClusterCompInfo_t::MsgType: {
             Cl::ClusterCompInfoResult_t res;
             res.ClustDesc = toCD(rq.tgt);
             auto it = components_.find(rq.tgt.board);
@@ -123,23 +124,23 @@ void Emulation::handleCluster(Request& rq, const farm::Resource&) {
                 *res.instances[i] = toCD(found[i]);
             }
             res.count = static_cast<unsigned char>(found.size());
-            reply(rq, 0x800028, &res);
+            reply(rq, Cl::ClusterCompInfoResult_t::MsgType, &res);
             return;
         }
-        case 0x800054:
-        case 0x800055:
-        case 0x800056:
-            reply(rq, 0x800000, nullptr);
+        case Cl::ClusterAttrAdd_t::MsgType:
+        case Cl::ClusterAttrRemove_t::MsgType:
+        case Cl::ClusterLock_t::MsgType:
+            reply(rq, Cl::ResultComplete_t::MsgType, nullptr);
             return;
-        case 0x800057: {
+        case Cl::ClusterUnlock_t::MsgType: {
             Cl::ClusterUnlockCmplt_t res;
             res.unlocked = 1;
             res.count = 0;
-            reply(rq, 0x800058, &res);
+            reply(rq, Cl::ClusterUnlockCmplt_t::MsgType, &res);
             return;
         }
-        case 0x80001F:
-        case 0x800025:
+        case Cl::ClusterConnect_t::MsgType:
+        case Cl::ClusterDisconnect_t::MsgType:
             return;  // one-way
         default:
             unanswerable(rq, "not a cluster message this emulation plays");

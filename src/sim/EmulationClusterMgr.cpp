@@ -9,7 +9,7 @@ using Cm = tolk::ClusterMgr_Bodies;
 
 void Emulation::handleClusterMgr(Request& rq, const farm::Resource&) {
     switch (rq.type) {
-        case 0x800053: {
+        case Cm::ClusterFind_t::MsgType: {
             Cm::ClusterFind_t f;
             (void)f.readMsg(&rq.msg, 0);
             Address start{kAnyInstance, rq.tgt.board, 0, 0, 0};
@@ -20,10 +20,10 @@ void Emulation::handleClusterMgr(Request& rq, const farm::Resource&) {
             }
             Cm::ClusterResult_t res;
             res.desc = toCD(c->cluster);
-            reply(rq, 0x80002C, &res);
+            reply(rq, Cm::ClusterResult_t::MsgType, &res);
             return;
         }
-        case 0x80001E: {
+        case Cm::ClusterCompByAttr_t::MsgType: {
             Cm::ClusterCompByAttr_t f;
             (void)f.readMsg(&rq.msg, 0);
             Address cluster = fromCD(f.ClustDesc);
@@ -35,10 +35,10 @@ void Emulation::handleClusterMgr(Request& rq, const farm::Resource&) {
             }
             Cm::ComponentResult_t res;
             res.desc = toCD(c->addr);
-            reply(rq, 0x800007, &res);
+            reply(rq, Cm::ComponentResult_t::MsgType, &res);
             return;
         }
-        case 0x80001D: {
+        case Cm::ClusterByComp_t::MsgType: {
             Cm::ClusterByComp_t f;
             (void)f.readMsg(&rq.msg, 0);
             Address want = fromCD(f.desc);
@@ -48,7 +48,7 @@ void Emulation::handleClusterMgr(Request& rq, const farm::Resource&) {
                     if (c.addr == want) {
                         Cm::ClusterResult_t res;
                         res.desc = toCD(c.cluster);
-                        reply(rq, 0x80002C, &res);
+                        reply(rq, Cm::ClusterResult_t::MsgType, &res);
                         return;
                     }
                 }
@@ -56,8 +56,8 @@ void Emulation::handleClusterMgr(Request& rq, const farm::Resource&) {
             refuse(rq, kErrNoSuchCluster);
             return;
         }
-        case 0x800024:
-        case 0x800052:
+        case Cm::ClusterDestroy_t::MsgType:
+        case Cm::ClusterFree_t::MsgType:
             return;  // one-way; the farm's clusters stay
         default:
             unanswerable(rq, "not a cluster manager message this emulation plays");

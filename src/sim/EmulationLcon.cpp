@@ -14,26 +14,27 @@ void Emulation::handleLcon(Request& rq, const farm::Resource& r) {
     Line& line = *model_.line(r.board, r.trunk);
     std::vector<Event>& ev = scratch_;
     switch (rq.type) {
-        case 0x1608: {
+        case Lcon::MsgGetLineState_t::MsgType: {
             Lcon::MsgGetLineStateCmplt_t res;
             res.LineState = line.state;
             res.Reason = line.reason;
-            reply(rq, 0x1609, &res);
+            reply(rq, Lcon::MsgGetLineStateCmplt_t::MsgType, &res);
             return;
         }
-        case 0x1610: {
+        case Lcon::MsgSetLineState_t::MsgType: {
             Lcon::MsgSetLineState_t f;
             (void)f.readMsg(&rq.msg, 0);
-            answer(rq, model_.setLineState(line, f.State, f.Reason, ev), 0x1611);
+            answer(rq, model_.setLineState(line, f.State, f.Reason, ev),
+                   Lcon::MsgSetLineStateCmplt_t::MsgType);
             return;
         }
-        case 0x1612: {
+        case Lcon::MsgTSPSetLineState_t::MsgType: {
             Lcon::MsgTSPSetLineState_t f;
             (void)f.readMsg(&rq.msg, 0);
             answer(rq, model_.setLineState(line, f.State, f.Reason, ev), 0);
             return;
         }
-        case 0x1602: {
+        case Lcon::MsgGetAlarms_t::MsgType: {
             Lcon::MsgGetAlarms_t f;
             (void)f.readMsg(&rq.msg, 0);
             std::vector<std::uint32_t> ids;
@@ -54,10 +55,10 @@ void Emulation::handleLcon(Request& rq, const farm::Resource& r) {
                 res.AlarmInfo[i]->State = model_.alarmState(line, ids[i]);
             }
             res.Count = static_cast<unsigned int>(ids.size());
-            reply(rq, 0x1603, &res);
+            reply(rq, Lcon::MsgGetAlarmsCmplt_t::MsgType, &res);
             return;
         }
-        case 0x1606: {
+        case Lcon::MsgGetFaults_t::MsgType: {
             Lcon::MsgGetFaults_t f;
             (void)f.readMsg(&rq.msg, 0);
             Lcon::MsgGetFaultsCmplt_t res;
@@ -68,36 +69,36 @@ void Emulation::handleLcon(Request& rq, const farm::Resource& r) {
                 res.FaultInfo[i]->State = 0;
             }
             res.Count = n;
-            reply(rq, 0x1607, &res);
+            reply(rq, Lcon::MsgGetFaultsCmplt_t::MsgType, &res);
             return;
         }
-        case 0x1604: {
+        case Lcon::MsgGetDiagMode_t::MsgType: {
             Lcon::MsgGetDiagModeCmplt_t res;
             res.DiagnosticMode = line.diagMode;
-            reply(rq, 0x1605, &res);
+            reply(rq, Lcon::MsgGetDiagModeCmplt_t::MsgType, &res);
             return;
         }
-        case 0x160E: {
+        case Lcon::MsgSetDiagMode_t::MsgType: {
             Lcon::MsgSetDiagMode_t f;
             (void)f.readMsg(&rq.msg, 0);
-            answer(rq, model_.setDiagMode(line, f.Mode, ev), 0x160F);
+            answer(rq, model_.setDiagMode(line, f.Mode, ev), Lcon::MsgSetDiagModeCmplt_t::MsgType);
             return;
         }
-        case 0x160C: {
+        case Lcon::MsgSendAlarm_t::MsgType: {
             Lcon::MsgSendAlarm_t f;
             (void)f.readMsg(&rq.msg, 0);
-            answer(rq, model_.sendAlarm(line, f.AlarmId, ev), 0x160D);
+            answer(rq, model_.sendAlarm(line, f.AlarmId, ev), Lcon::MsgSendAlarmCmplt_t::MsgType);
             return;
         }
-        case 0x1613: {
+        case Lcon::MsgStopAlarm_t::MsgType: {
             Lcon::MsgStopAlarm_t f;
             (void)f.readMsg(&rq.msg, 0);
             answer(rq, model_.stopAlarm(line, f.AlarmId, ev), 0);
             return;
         }
-        case 0x1600:
-        case 0x1616:
-        case 0x1618:
+        case Lcon::MsgConfigureLine_t::MsgType:
+        case Lcon::MsgTSPSetProtocol_t::MsgType:
+        case Lcon::MsgReConfigureLine_t::MsgType:
             reply(rq, rq.type + 1, nullptr);
             return;
         default:

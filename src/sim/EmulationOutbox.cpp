@@ -67,7 +67,7 @@ void Emulation::refuse(Request& rq, std::uint32_t code) {
     err.ErrorCode = code;
     // The parameter commands name the refused parameter; everything else carries no data.
     Std::MsgError_t::Data_ErrorMsg_0x12_t parm;
-    if (rq.type == 0x08 || rq.type == 0x12) {
+    if (rq.type == Std::MsgSetParm_t::MsgType || rq.type == Std::MsgGetParm_t::MsgType) {
         std::uint32_t num = 0;
         tolk::Msg& m = rq.msg;
         Std::MsgGetParm_t p;
@@ -77,7 +77,7 @@ void Emulation::refuse(Request& rq, std::uint32_t code) {
         parm.Val = 0;
         err.Data = reinterpret_cast<tolk::cat::ValueWord>(&parm);
     }
-    reply(rq, 0x00, &err);
+    reply(rq, Std::MsgError_t::MsgType, &err);
     err.Data = 0;
 }
 

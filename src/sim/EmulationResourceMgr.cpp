@@ -11,7 +11,7 @@ using Rm = tolk::ResourceMgr_Bodies;
 
 void Emulation::handleResourceMgr(Request& rq, const farm::Resource&) {
     switch (rq.type) {
-        case 0x80003D: {
+        case Rm::CompFind_t::MsgType: {
             Rm::CompFind_t f;
             (void)f.readMsg(&rq.msg, 0);
             Address start = fromCD(f.CompStart);
@@ -24,10 +24,10 @@ void Emulation::handleResourceMgr(Request& rq, const farm::Resource&) {
             }
             Rm::ComponentResult_t res;
             res.desc = toCD(c->addr);
-            reply(rq, 0x800007, &res);
+            reply(rq, Rm::ComponentResult_t::MsgType, &res);
             return;
         }
-        case 0x80003E: {
+        case Rm::CompInstAllocate_t::MsgType: {
             Rm::CompInstAllocate_t f;
             (void)f.readMsg(&rq.msg, 0);
             Address start = fromCD(f.CompStart);
@@ -43,18 +43,19 @@ void Emulation::handleResourceMgr(Request& rq, const farm::Resource&) {
             }
             Rm::ComponentResult_t res;
             res.desc = toCD(c->addr);
-            reply(rq, 0x800007, &res);
+            reply(rq, Rm::ComponentResult_t::MsgType, &res);
             return;
         }
-        case 0x800059:
-        case 0x80005A: {
+        case Rm::CompUse_t::MsgType:
+        case Rm::CompUnuse_t::MsgType: {
             // Every component of the farm exists from the start, so use and unuse only check
             // that what they name is there.
             Rm::CompUnuse_t u;
             (void)u.readMsg(&rq.msg, 0);
-            unsigned int n =
-                rq.type == 0x800059 ? 0 : std::min<unsigned int>(u.Count, u.List.length());
-            if (rq.type == 0x800059) {
+            unsigned int n = rq.type == Rm::CompUse_t::MsgType
+                                 ? 0
+                                 : std::min<unsigned int>(u.Count, u.List.length());
+            if (rq.type == Rm::CompUse_t::MsgType) {
                 Rm::CompUse_t use;
                 (void)use.readMsg(&rq.msg, 0);
                 n = std::min<unsigned int>(use.Count, use.List.length());
@@ -72,10 +73,10 @@ void Emulation::handleResourceMgr(Request& rq, const farm::Resource&) {
                     }
                 }
             }
-            reply(rq, 0x800000, nullptr);
+            reply(rq, Rm::ResultComplete_t::MsgType, nullptr);
             return;
         }
-        case 0x800041:
+        case Rm::CompInstFree_t::MsgType:
             return;  // one-way: the farm's components are never really freed
         default:
             unanswerable(rq, "not a resource manager message this emulation plays");

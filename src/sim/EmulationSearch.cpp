@@ -1,6 +1,7 @@
 // Searches: every component of the farm, by board, with what a search can ask of it.
 #include <algorithm>
 
+#include "catalogue/generated/values.h"
 #include "sim/EmulationInternal.h"
 
 namespace sim {
@@ -64,13 +65,13 @@ const Emulation::Component* Emulation::findComponent(const Address& start, const
                 }
                 type = static_cast<std::uint8_t>(a.value);
                 break;
-            case 0x1200:
+            case tolk::wire::TSC::Attr::TRUNK:
                 trunk = a.value;
                 break;
-            case 0x1201:
+            case tolk::wire::TSC::Attr::CHANNEL:
                 channel = a.value;
                 break;
-            case 0x1600:
+            case tolk::wire::LCON::Attr::LINE:
                 line = a.value;
                 break;
             default:

@@ -32,14 +32,14 @@ bool Emulation::parmValue(const farm::Resource& r, std::uint32_t num, std::uint3
 void Emulation::handleStd(Request& rq, const farm::Resource& r) {
     std::uint64_t key = addressKey(rq.tgt);
     switch (rq.type) {
-        case 0x01:
-        case 0x06:
+        case Std::MsgAck_t::MsgType:
+        case Std::MsgExit_t::MsgType:
             return;  // one-way
-        case 0x02:
-        case 0x04:
+        case Std::MsgComtest_t::MsgType:
+        case Std::MsgInit_t::MsgType:
             reply(rq, rq.type + 1, nullptr);
             return;
-        case 0x08: {
+        case Std::MsgSetParm_t::MsgType: {
             Std::MsgSetParm_t f;
             (void)f.readMsg(&rq.msg, 0);
             std::uint32_t v;
@@ -48,10 +48,10 @@ void Emulation::handleStd(Request& rq, const farm::Resource& r) {
                 return;
             }
             parms_[key][f.Parm] = f.Val;
-            reply(rq, 0x09, nullptr);
+            reply(rq, Std::MsgSetParmCmplt_t::MsgType, nullptr);
             return;
         }
-        case 0x0A: {
+        case Std::MsgSetxParms_t::MsgType: {
             Std::MsgSetxParms_t f;
             (void)f.readMsg(&rq.msg, 0);
             unsigned int n = std::min(f.Count, f.Parms.length());
@@ -65,31 +65,31 @@ void Emulation::handleStd(Request& rq, const farm::Resource& r) {
             for (unsigned int i = 0; i < n; ++i) {
                 parms_[key][f.Parms[i]->Parm] = f.Parms[i]->Val;
             }
-            reply(rq, 0x0B, nullptr);
+            reply(rq, Std::MsgSetxParmsCmplt_t::MsgType, nullptr);
             return;
         }
-        case 0x0C: {
+        case Std::MsgSetParmDef_t::MsgType: {
             Std::MsgSetParmDef_t f;
             (void)f.readMsg(&rq.msg, 0);
             parms_[key].erase(f.Parm);
-            reply(rq, 0x0D, nullptr);
+            reply(rq, Std::MsgSetParmDefCmplt_t::MsgType, nullptr);
             return;
         }
-        case 0x0E: {
+        case Std::MsgSetxParmsDef_t::MsgType: {
             Std::MsgSetxParmsDef_t f;
             (void)f.readMsg(&rq.msg, 0);
             unsigned int n = std::min(f.Count, f.Parms.length());
             for (unsigned int i = 0; i < n; ++i) {
                 parms_[key].erase(f.Parms[i]->Parm);
             }
-            reply(rq, 0x0F, nullptr);
+            reply(rq, Std::MsgSetxParmsDefCmplt_t::MsgType, nullptr);
             return;
         }
-        case 0x10:
+        case Std::MsgSetAllParmsDef_t::MsgType:
             parms_.erase(key);
-            reply(rq, 0x11, nullptr);
+            reply(rq, Std::MsgSetAllParmsDefCmplt_t::MsgType, nullptr);
             return;
-        case 0x12: {
+        case Std::MsgGetParm_t::MsgType: {
             Std::MsgGetParm_t f;
             (void)f.readMsg(&rq.msg, 0);
             std::uint32_t v = 0;
@@ -109,10 +109,10 @@ void Emulation::handleStd(Request& rq, const farm::Resource& r) {
             res.Num = f.Num;
             res.Val = v;
             res.TextSize = 0;
-            reply(rq, 0x13, &res);
+            reply(rq, Std::MsgGetParmCmplt_t::MsgType, &res);
             return;
         }
-        case 0x14: {
+        case Std::MsgGetxParms_t::MsgType: {
             Std::MsgGetxParms_t f;
             (void)f.readMsg(&rq.msg, 0);
             Std::MsgGetxParmsCmplt_t res;
@@ -134,21 +134,21 @@ void Emulation::handleStd(Request& rq, const farm::Resource& r) {
                 res.Parms[i]->Val = v;
             }
             res.Count = n;
-            reply(rq, 0x15, &res);
+            reply(rq, Std::MsgGetxParmsCmplt_t::MsgType, &res);
             return;
         }
-        case 0x16:
-        case 0x18:
-        case 0x1A:
-        case 0x1C:
-        case 0x1E:
+        case Std::MsgDetectEvt_t::MsgType:
+        case Std::MsgDetectxEvts_t::MsgType:
+        case Std::MsgCancelEvt_t::MsgType:
+        case Std::MsgCancelxEvts_t::MsgType:
+        case Std::MsgCancelAllEvts_t::MsgType:
             handleSubscription(rq);
             return;
-        case 0x21:
-        case 0x23:
-        case 0x25:
-        case 0x27:
-        case 0x29:
+        case Std::MsgArmRTC_t::MsgType:
+        case Std::MsgArmxRTCs_t::MsgType:
+        case Std::MsgDisarmRTC_t::MsgType:
+        case Std::MsgDisarmxRTCs_t::MsgType:
+        case Std::MsgDisarmAllRTCs_t::MsgType:
             reply(rq, rq.type + 1, nullptr);
             return;
         default:

@@ -17,7 +17,7 @@ using Lcon = tolk::LCON_Bodies;
 
 namespace {
 
-constexpr std::uint32_t kEvtDetected = 0x20;
+constexpr std::uint32_t kEvtDetected = Std::MsgEvtDetected_t::MsgType;
 
 void setText(tolk::staticList<char>& l, const std::string& s) {
     l.realloc(static_cast<unsigned int>(s.size()) + 1);
@@ -28,7 +28,7 @@ void setText(tolk::staticList<char>& l, const std::string& s) {
 
 void Emulation::handleSubscription(Request& rq) {
     switch (rq.type) {
-        case 0x16: {
+        case Std::MsgDetectEvt_t::MsgType: {
             // A TSC's 0x16 may carry a set behind these fields; the subscription is the same.
             Std::MsgDetectEvt_t f;
             (void)f.readMsg(&rq.msg, 0);
@@ -39,10 +39,10 @@ void Emulation::handleSubscription(Request& rq) {
             s.trans = rq.trans;
             s.owner = rq.src;
             model_.subscribe(rq.tgt, s);
-            reply(rq, 0x17, nullptr);
+            reply(rq, Std::MsgDetectEvtCmplt_t::MsgType, nullptr);
             return;
         }
-        case 0x18: {
+        case Std::MsgDetectxEvts_t::MsgType: {
             Std::MsgDetectxEvts_t f;
             (void)f.readMsg(&rq.msg, 0);
             unsigned int n = std::min(f.Count, f.List.length());
@@ -55,29 +55,30 @@ void Emulation::handleSubscription(Request& rq) {
                 s.owner = rq.src;
                 model_.subscribe(rq.tgt, s);
             }
-            reply(rq, 0x19, nullptr);
+            reply(rq, Std::MsgDetectxEvtsCmplt_t::MsgType, nullptr);
             return;
         }
-        case 0x1A: {
+        case Std::MsgCancelEvt_t::MsgType: {
             Std::MsgCancelEvt_t f;
             (void)f.readMsg(&rq.msg, 0);
             model_.cancel(rq.tgt, rq.src, rq.trans, f.Type);
-            reply(rq, 0x1B, nullptr);
+            reply(rq, Std::MsgCancelEvtCmplt_t::MsgType, nullptr);
             return;
         }
-        case 0x1C: {
+        case Std::MsgCancelxEvts_t::MsgType: {
             Std::MsgCancelxEvts_t f;
             (void)f.readMsg(&rq.msg, 0);
             unsigned int n = std::min(f.Count, f.EvtTypeList.length());
             for (unsigned int i = 0; i < n; ++i) {
                 model_.cancel(rq.tgt, rq.src, rq.trans, *f.EvtTypeList[i]);
             }
-            reply(rq, 0x1D, nullptr);
+            reply(rq, Std::MsgCancelxEvtsCmplt_t::MsgType, nullptr);
             return;
         }
-        case 0x1E:
+        case Std::MsgCancelAllEvts_t::MsgType:
             model_.cancel(rq.tgt, rq.src, rq.trans, std::nullopt);
-            reply(rq, 0x1F, nullptr);
+            // The completion has no body of its own in the catalogue: the command + 1.
+            reply(rq, Std::MsgCancelAllEvts_t::MsgType + 1, nullptr);
             return;
     }
 }

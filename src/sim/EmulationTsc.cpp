@@ -30,7 +30,7 @@ void Emulation::handleTsc(Request& rq, const farm::Resource& r) {
     Channel& ch = *model_.channel(r.board, r.trunk, r.channel);
     std::vector<Event>& ev = scratch_;
     switch (rq.type) {
-        case 0x1214: {
+        case Tsc::MsgMakeCall_t::MsgType: {
             Tsc::MsgMakeCall_t f;
             (void)f.readMsg(&rq.msg, 0);
             std::uint32_t id = 0;
@@ -43,59 +43,59 @@ void Emulation::handleTsc(Request& rq, const farm::Resource& r) {
             }
             Tsc::MsgMakeCallCmplt_t res;
             res.CallId = id;
-            reply(rq, 0x1215, &res);
+            reply(rq, Tsc::MsgMakeCallCmplt_t::MsgType, &res);
             ev.insert(ev.end(), later.begin(), later.end());
             return;
         }
-        case 0x1201: {
+        case Tsc::MsgAnswerCall_t::MsgType: {
             Tsc::MsgAnswerCall_t f;
             (void)f.readMsg(&rq.msg, 0);
             answer(rq, model_.answerCall(ch, f.CallId, ev), 0);
             return;
         }
-        case 0x1200: {
+        case Tsc::MsgAcceptCall_t::MsgType: {
             Tsc::MsgAcceptCall_t f;
             (void)f.readMsg(&rq.msg, 0);
             answer(rq, model_.acceptCall(ch, f.CallId, ev), 0);
             return;
         }
-        case 0x120A: {
+        case Tsc::MsgDropCall_t::MsgType: {
             Tsc::MsgDropCall_t f;
             (void)f.readMsg(&rq.msg, 0);
             answer(rq, model_.dropCall(ch, f.CallId, f.Reason, ev), 0);
             return;
         }
-        case 0x121C: {
+        case Tsc::MsgReleaseCall_t::MsgType: {
             Tsc::MsgReleaseCall_t f;
             (void)f.readMsg(&rq.msg, 0);
             answer(rq, model_.releaseCall(ch, f.CallId, f.Reason, ev), 0);
             return;
         }
-        case 0x121D: {
+        case Tsc::MsgRejectCall_t::MsgType: {
             Tsc::MsgRejectCall_t f;
             (void)f.readMsg(&rq.msg, 0);
             answer(rq, model_.rejectCall(ch, f.CallId, f.Reason, ev), 0);
             return;
         }
-        case 0x1211: {
+        case Tsc::MsgHoldCall_t::MsgType: {
             Tsc::MsgHoldCall_t f;
             (void)f.readMsg(&rq.msg, 0);
             answer(rq, model_.holdCall(ch, f.CallId, ev), 0);
             return;
         }
-        case 0x121E: {
+        case Tsc::MsgRetrieveCall_t::MsgType: {
             Tsc::MsgRetrieveCall_t f;
             (void)f.readMsg(&rq.msg, 0);
             answer(rq, model_.retrieveCall(ch, f.CallId, ev), 0);
             return;
         }
-        case 0x1202: {
+        case Tsc::MsgBlindTransferCall_t::MsgType: {
             Tsc::MsgBlindTransferCall_t f;
             (void)f.readMsg(&rq.msg, 0);
             answer(rq, model_.blindTransfer(ch, f.CallId, ev), 0);
             return;
         }
-        case 0x1212: {
+        case Tsc::MsgInitTransfer_t::MsgType: {
             Tsc::MsgInitTransfer_t f;
             (void)f.readMsg(&rq.msg, 0);
             std::uint32_t id = 0;
@@ -108,23 +108,23 @@ void Emulation::handleTsc(Request& rq, const farm::Resource& r) {
             }
             Tsc::MsgInitTransferCmplt_t res;
             res.CallId = id;
-            reply(rq, 0x1213, &res);
+            reply(rq, Tsc::MsgInitTransferCmplt_t::MsgType, &res);
             ev.insert(ev.end(), later.begin(), later.end());
             return;
         }
-        case 0x1207: {
+        case Tsc::MsgCompleteTransfer_t::MsgType: {
             Tsc::MsgCompleteTransfer_t f;
             (void)f.readMsg(&rq.msg, 0);
             answer(rq, model_.completeTransfer(ch, f.CallId, f.ConCallId, ev), 0);
             return;
         }
-        case 0x1203: {
+        case Tsc::MsgCancelTransfer_t::MsgType: {
             Tsc::MsgCancelTransfer_t f;
             (void)f.readMsg(&rq.msg, 0);
             answer(rq, model_.cancelTransfer(ch, f.CallId, ev), 0);
             return;
         }
-        case 0x122D: {
+        case Tsc::MsgProceedCall_t::MsgType: {
             Tsc::MsgProceedCall_t f;
             (void)f.readMsg(&rq.msg, 0);
             std::uint32_t id = 0, state = 0, why = 0;
@@ -136,7 +136,7 @@ void Emulation::handleTsc(Request& rq, const farm::Resource& r) {
                    0);
             return;
         }
-        case 0x120D: {
+        case Tsc::MsgGetCallState_t::MsgType: {
             Tsc::MsgGetCallState_t f;
             (void)f.readMsg(&rq.msg, 0);
             Tsc::MsgGetCallStateCmplt_t res;
@@ -146,25 +146,25 @@ void Emulation::handleTsc(Request& rq, const farm::Resource& r) {
                 refuse(rq, code);
                 return;
             }
-            reply(rq, 0x120E, &res);
+            reply(rq, Tsc::MsgGetCallStateCmplt_t::MsgType, &res);
             return;
         }
-        case 0x120F: {
+        case Tsc::MsgGetChanState_t::MsgType: {
             Tsc::MsgGetChanStateCmplt_t res;
             res.ChanState = ch.chanState;
-            reply(rq, 0x1210, &res);
+            reply(rq, Tsc::MsgGetChanStateCmplt_t::MsgType, &res);
             return;
         }
-        case 0x121F: {
+        case Tsc::MsgSetChanState_t::MsgType: {
             Tsc::MsgSetChanState_t f;
             (void)f.readMsg(&rq.msg, 0);
-            answer(rq, model_.setChanState(ch, f.State, ev), 0x1220);
+            answer(rq, model_.setChanState(ch, f.State, ev), Tsc::MsgSetChanStateCmplt_t::MsgType);
             return;
         }
-        case 0x1246:
-            answer(rq, model_.reset(ch, ev), 0x1247);
+        case Tsc::MsgResetLineDevice_t::MsgType:
+            answer(rq, model_.reset(ch, ev), Tsc::MsgResetLineDeviceCmplt_t::MsgType);
             return;
-        case 0x1224: {
+        case Tsc::MsgDial_t::MsgType: {
             Tsc::MsgDial_t f;
             (void)f.readMsg(&rq.msg, 0);
             std::uint32_t code = model_.dial(ch, f.CallId);
@@ -174,20 +174,20 @@ void Emulation::handleTsc(Request& rq, const farm::Resource& r) {
             }
             Tsc::MsgDialCmplt_t res;
             res.Reason = 0;
-            reply(rq, 0x1225, &res);
+            reply(rq, Tsc::MsgDialCmplt_t::MsgType, &res);
             return;
         }
-        case 0x1222: {
+        case Tsc::MsgSendISDN_t::MsgType: {
             Tsc::MsgSendISDN_t f;
             (void)f.readMsg(&rq.msg, 0);
             if (ch.line->signaling != static_cast<int>(farm::Signaling::CCS)) {
                 refuse(rq, kErrNotSupported);
                 return;
             }
-            answer(rq, model_.dial(ch, f.CallId), 0x1223);
+            answer(rq, model_.dial(ch, f.CallId), Tsc::MsgSendISDNCmplt_t::MsgType);
             return;
         }
-        case 0x1234: {
+        case Tsc::MsgAttach_t::MsgType: {
             Tsc::MsgAttach_t f;
             (void)f.readMsg(&rq.msg, 0);
             std::vector<std::pair<std::uint32_t, Address>> media;
@@ -200,37 +200,38 @@ void Emulation::handleTsc(Request& rq, const farm::Resource& r) {
                 }
                 media.emplace_back(f.MediaInfo[i]->ComponentType, a);
             }
-            answer(rq, model_.attachMedia(ch, std::move(media), ev), 0x1235);
+            answer(rq, model_.attachMedia(ch, std::move(media), ev),
+                   Tsc::MsgAttachCmplt_t::MsgType);
             return;
         }
-        case 0x1236:
-            answer(rq, model_.detachMedia(ch, ev), 0x1237);
+        case Tsc::MsgDetach_t::MsgType:
+            answer(rq, model_.detachMedia(ch, ev), Tsc::MsgDetachCmplt_t::MsgType);
             return;
-        case 0x1242: {
+        case Tsc::MsgSetAlarmMask_t::MsgType: {
             Tsc::MsgSetAlarmMask_t f;
             (void)f.readMsg(&rq.msg, 0);
             alarmMasks_[addressKey(rq.tgt)] = f.Alarm_mask;
-            reply(rq, 0x1243, nullptr);
+            reply(rq, Tsc::MsgSetAlarmMaskCmplt_t::MsgType, nullptr);
             return;
         }
-        case 0x1244: {
+        case Tsc::MsgGetAlarmMask_t::MsgType: {
             Tsc::MsgGetAlarmMask_t f;
             (void)f.readMsg(&rq.msg, 0);
             Tsc::MsgGetAlarmMaskCmplt_t res;
             res.Linenum = f.Linenum;
             auto it = alarmMasks_.find(addressKey(rq.tgt));
             res.Alarm_mask = it == alarmMasks_.end() ? 0x46 : it->second;
-            reply(rq, 0x1245, &res);
+            reply(rq, Tsc::MsgGetAlarmMaskCmplt_t::MsgType, &res);
             return;
         }
-        case 0x1248:
-            reply(rq, 0x1249, nullptr);
+        case Tsc::MsgGCExtension_t::MsgType:
+            reply(rq, Tsc::MsgGCExtensionCmplt_t::MsgType, nullptr);
             return;
-        case 0x124E: {
+        case Tsc::MsgTxRxSignalingGet_t::MsgType: {
             Tsc::MsgTxRxSignalingGetCmplt_t res;
             // Off hook while a call holds the channel, on hook otherwise.
             res.signalbits = ch.call ? 0x0F : 0x00;
-            reply(rq, 0x124F, &res);
+            reply(rq, Tsc::MsgTxRxSignalingGetCmplt_t::MsgType, &res);
             return;
         }
         default:

@@ -5,6 +5,8 @@
 
 #include <cstdint>
 
+#include "catalogue/generated/values.h"
+
 namespace sim {
 
 enum ErrorCode : std::uint32_t {
@@ -19,7 +21,7 @@ enum ErrorCode : std::uint32_t {
     kErrMalformed = 0x0109,     // the body is shorter than its fields
     kErrRefused = 0x01FF,       // default of the control command "refuse"
     // The line control's own code for a line that is already in service.
-    kErrAlreadyInService = 0x1600,
+    kErrAlreadyInService = tolk::wire::LCON::Error::ALREADY_IN_SERVICE,
 };
 
 }  // namespace sim

@@ -12,6 +12,9 @@
 #include <string>
 #include <vector>
 
+#include "catalogue/generated/lcon_bodies.h"
+#include "catalogue/generated/tsc_bodies.h"
+#include "catalogue/generated/values.h"
 #include "platform/farm/Addresses.h"
 #include "platform/farm/Farm.h"
 
@@ -23,61 +26,70 @@ std::uint64_t addressKey(const Address& a);
 
 // Values the console and the trace show by name; a board sends nothing else.
 namespace call {
+namespace v = tolk::wire::TSC::CallState;
 enum : std::uint32_t {
-    Null = 0,
-    Accepted = 1,
-    Connected = 2,
-    Dialing = 5,
-    Disconnected = 6,
-    Idle = 9,
-    Offered = 11,
-    Hold = 12,
-    HoldPendXfer = 13,
-    Proceeding = 15,
-    Alerting = 17,
+    Null = v::NULL_STATE,
+    Accepted = v::ACCEPTED,
+    Connected = v::CONNECTED,
+    Dialing = v::DIALING,
+    Disconnected = v::DISCONNECTED,
+    Idle = v::IDLE,
+    Offered = v::OFFERED,
+    Hold = v::HOLD,
+    HoldPendXfer = v::HOLD_PEND_XFER,
+    Proceeding = v::PROCEEDING,
+    Alerting = v::ALERTING,
 };
-}
+}  // namespace call
 namespace chan {
-enum : std::uint32_t { Active = 1, OutOfService = 4, MediaDetached = 13 };
-}
-namespace reason {
+namespace v = tolk::wire::TSC::ChanState;
 enum : std::uint32_t {
-    None = 0,
-    Canceled = 3,
-    DestBusy = 5,
-    DestOutOfOrder = 7,
-    IncomingCall = 11,
-    Normal = 14,
-    NetworkAlarm = 15,
-    Transfer = 25,
-    OutOfOrder = 31,
+    Active = v::ACTIVE,
+    OutOfService = v::OUT_OF_SERVICE,
+    MediaDetached = v::MEDIA_DETACHED
 };
-}
+}  // namespace chan
+namespace reason {
+namespace v = tolk::wire::TSC::Reason;
+enum : std::uint32_t {
+    None = v::NONE,
+    Canceled = v::CANCELED,
+    DestBusy = v::DEST_BUSY,
+    DestOutOfOrder = v::DEST_OUT_OF_ORDER,
+    IncomingCall = v::INCOMING_CALL,
+    Normal = v::NORMAL,
+    NetworkAlarm = v::NETWORK_ALARM,
+    Transfer = v::TRANSFER,
+    OutOfOrder = v::OUT_OF_ORDER,
+};
+}  // namespace reason
 
 // Line states and the line control's events.
-constexpr std::uint32_t kInService = 0x160F;
-constexpr std::uint32_t kOutOfService = 0x1610;
-constexpr std::uint32_t kLineReasonStartup = 2;
-constexpr std::uint32_t kAlarmLoopback = 0x1605;
-constexpr std::uint32_t kAlarmBpvSaturation = 0x1616;
-constexpr std::uint32_t kAlarmFerrSaturation = 0x1617;
+constexpr std::uint32_t kInService = tolk::wire::LCON::LineState::IN_SERVICE;
+constexpr std::uint32_t kOutOfService = tolk::wire::LCON::LineState::OUT_OF_SERVICE;
+constexpr std::uint32_t kLineReasonStartup = tolk::wire::LCON::LineReason::STARTUP;
+constexpr std::uint32_t kAlarmLoopback = tolk::wire::LCON::Alarm::LOOPBACK;
+constexpr std::uint32_t kAlarmBpvSaturation = tolk::wire::LCON::Alarm::BPV_SATURATION;
+constexpr std::uint32_t kAlarmFerrSaturation = tolk::wire::LCON::Alarm::FERR_SATURATION;
 
 // Event types as subscriptions name them. A subscription to a group number takes every event of
 // the group; one to a single type takes that type.
-constexpr std::uint32_t kGroupCallInfo = 0x1200;
-constexpr std::uint32_t kEvtCallInfoCallerId = 0x1201;
-constexpr std::uint32_t kGroupCallState = 0x1230;  // type = 0x1230 + call state
-constexpr std::uint32_t kGroupChanState = 0x1260;  // type = 0x125F + channel state
-constexpr std::uint32_t kGroupAlarms = 0x1600;
-constexpr std::uint32_t kGroupLineState = 0x1611;
-constexpr std::uint32_t kInfoIdCallerId = 0x2000007;
+constexpr std::uint32_t kGroupCallInfo = tolk::TSC_Bodies::EvtCallInfo_t::EvtGroup_;
+constexpr std::uint32_t kEvtCallInfoCallerId = tolk::wire::TSC::EvtType::CALL_INFO_CALLER_ID;
+// A call state event's type is its group plus the call state.
+constexpr std::uint32_t kGroupCallState = tolk::TSC_Bodies::EvtCallState_t::EvtGroup_;
+constexpr std::uint32_t kGroupChanState = tolk::TSC_Bodies::EvtChanState_t::EvtGroup_;
+constexpr std::uint32_t kChanStateTypeBase = tolk::wire::TSC::EvtType::CHAN_STATE_BASE;  // + state
+constexpr std::uint32_t kGroupAlarms = tolk::LCON_Bodies::Evt_0x1600_t::EvtGroup_;
+constexpr std::uint32_t kGroupLineState = tolk::LCON_Bodies::Evt_0x1611_t::EvtGroup_;
+constexpr std::uint32_t kInfoIdCallerId = tolk::wire::TSC::InfoId::CALLER_ID;
 
 // Values of the channel state command and of GetParm.
-constexpr std::uint32_t kChanStateInService = 256;
-constexpr std::uint32_t kChanStateOutOfService = 257;
-constexpr std::uint32_t kParmTrunkType = 0x1601;
-constexpr std::uint32_t kParmSignaling = 0x1602;
-constexpr std::uint32_t kParmRouting = 0x1313;
+constexpr std::uint32_t kChanStateInService = tolk::wire::TSC::SetChanState::IN_SERVICE;
+constexpr std::uint32_t kChanStateOutOfService = tolk::wire::TSC::SetChanState::OUT_OF_SERVICE;
+constexpr std::uint32_t kParmTrunkType = tolk::wire::LCON::Parm::TRUNK_TYPE;
+constexpr std::uint32_t kParmSignaling = tolk::wire::LCON::Parm::SIGNALING_TYPE;
+constexpr std::uint32_t kParmRouting = tolk::wire::CHP::Parm::ROUTING_MODE;
 
 struct Event {
     enum class Kind { CallState, ChanState, CallInfo, Alarm, LineState };

@@ -56,7 +56,7 @@ void Model::chanEvent(Channel& ch, std::vector<Event>& ev) {
     e.kind = Event::Kind::ChanState;
     e.source = ch.tsc;
     e.group = kGroupChanState;
-    e.type = kGroupChanState - 1 + ch.chanState;
+    e.type = kChanStateTypeBase + ch.chanState;
     e.a = ch.chanState;
     ev.push_back(std::move(e));
 }

@@ -1,8 +1,11 @@
 // Line control: line state, diagnostic mode, alarms received and transmitted, saturation counts.
+#include "catalogue/generated/values.h"
 #include "sim/ErrorCodes.h"
 #include "sim/Model.h"
 
 namespace sim {
+
+namespace Alarm = tolk::wire::LCON::Alarm;
 
 Event Model::lineEvent(const Line& line, Event::Kind kind, std::uint32_t type, std::uint32_t a,
                        std::uint32_t b) {
@@ -54,7 +57,7 @@ std::uint32_t Model::setDiagMode(Line& line, std::uint32_t mode, std::vector<Eve
 }
 
 std::uint32_t Model::sendAlarm(Line& line, std::uint32_t alarm, std::vector<Event>& ev) {
-    if (alarm < 0x160B || alarm > 0x160E) {
+    if (alarm < Alarm::TRANSMIT_RAI || alarm > Alarm::TRANSMIT_AIS_TS16) {
         return kErrBadParameter;
     }
     if (line.transmitting.insert(alarm).second) {
@@ -80,8 +83,17 @@ std::uint8_t Model::alarmState(const Line& line, std::uint32_t alarm) const {
 }
 
 const std::vector<std::uint32_t>& Model::reportedAlarms() {
-    static const std::vector<std::uint32_t> kAll = {0x1601, 0x1602, 0x1603, 0x1604, 0x1605, 0x1606,
-                                                    0x160A, 0x160B, 0x160C, 0x1616, 0x1617};
+    static const std::vector<std::uint32_t> kAll = {Alarm::RED,
+                                                    Alarm::YELLOW,
+                                                    Alarm::AIS,
+                                                    Alarm::LOS,
+                                                    Alarm::LOOPBACK,
+                                                    Alarm::RAI_CRC,
+                                                    Alarm::D_CHANNEL,
+                                                    Alarm::TRANSMIT_RAI,
+                                                    Alarm::TRANSMIT_AIS,
+                                                    Alarm::BPV_SATURATION,
+                                                    Alarm::FERR_SATURATION};
     return kAll;
 }
 
