@@ -1,5 +1,6 @@
 #include "console/ChanStateInServiceCmd.h"
 
+#include "catalogue/generated/values.h"
 #include "console/PhoneView.h"
 #include "console/PhoneViewMgr.h"
 #include "model/Phone.h"
@@ -16,7 +17,7 @@ int ChanStateInServiceCmd::Execute(int board, int line, int chan) {
                                static_cast<unsigned int>(chan));
     if (phoneView != nullptr) {
         vx7diag::Phone* phone = phoneView->GetPhone();
-        phone->SetChanState(256);
+        phone->SetChanState(tolk::wire::TSC::SetChanState::IN_SERVICE);
     } else {
         Report("ERROR - unable to find phone view");
         RefreshView();

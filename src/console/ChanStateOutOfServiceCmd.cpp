@@ -1,5 +1,6 @@
 #include "console/ChanStateOutOfServiceCmd.h"
 
+#include "catalogue/generated/values.h"
 #include "console/PhoneView.h"
 #include "console/PhoneViewMgr.h"
 #include "model/Phone.h"
@@ -16,7 +17,7 @@ int ChanStateOutOfServiceCmd::Execute(int board, int line, int chan) {
                                static_cast<unsigned int>(chan));
     if (phoneView != nullptr) {
         vx7diag::Phone* phone = phoneView->GetPhone();
-        phone->SetChanState(257);
+        phone->SetChanState(tolk::wire::TSC::SetChanState::OUT_OF_SERVICE);
     } else {
         Report("ERROR - unable to find phone view");
         RefreshView();

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "catalogue/generated/values.h"
 #include "model/Observer.h"
 #include "transport/IsaSync.h"
 
@@ -12,16 +13,16 @@ namespace vx7diag {
 class TrunkStatus;
 
 // Alarm codes of a line's alarm events, and the line state code of a line in service.
-constexpr unsigned int ALARM_RED = 5633;
-constexpr unsigned int ALARM_YELLOW = 5634;
-constexpr unsigned int ALARM_AIS = 5635;
-constexpr unsigned int ALARM_LOS = 5636;
-constexpr unsigned int ALARM_LOOPBACK = 5637;
-constexpr unsigned int ALARM_RAI_CRC = 5638;
-constexpr unsigned int ALARM_DCHAN = 5642;
-constexpr unsigned int ALARM_BPV_SATURATION = 5654;
-constexpr unsigned int ALARM_FERR_SATURATION = 5655;
-constexpr unsigned int LINE_STATE_IN_SERVICE = 5647;
+constexpr unsigned int ALARM_RED = tolk::wire::LCON::Alarm::RED;
+constexpr unsigned int ALARM_YELLOW = tolk::wire::LCON::Alarm::YELLOW;
+constexpr unsigned int ALARM_AIS = tolk::wire::LCON::Alarm::AIS;
+constexpr unsigned int ALARM_LOS = tolk::wire::LCON::Alarm::LOS;
+constexpr unsigned int ALARM_LOOPBACK = tolk::wire::LCON::Alarm::LOOPBACK;
+constexpr unsigned int ALARM_RAI_CRC = tolk::wire::LCON::Alarm::RAI_CRC;
+constexpr unsigned int ALARM_DCHAN = tolk::wire::LCON::Alarm::D_CHANNEL;
+constexpr unsigned int ALARM_BPV_SATURATION = tolk::wire::LCON::Alarm::BPV_SATURATION;
+constexpr unsigned int ALARM_FERR_SATURATION = tolk::wire::LCON::Alarm::FERR_SATURATION;
+constexpr unsigned int LINE_STATE_IN_SERVICE = tolk::wire::LCON::LineState::IN_SERVICE;
 
 // Draws one row of the trunk views window: line state and reason, the alarm columns and
 // the two error counts of one line. Update runs on the reader thread of the line's events;

@@ -1,5 +1,6 @@
 #include "console/ResetChanCmd.h"
 
+#include "catalogue/generated/values.h"
 #include "console/PhoneView.h"
 #include "console/PhoneViewMgr.h"
 #include "model/Phone.h"
@@ -16,7 +17,7 @@ int ResetChanCmd::Execute(int board, int line, int chan) {
                                static_cast<unsigned int>(chan));
     if (phoneView != nullptr) {
         vx7diag::Phone* phone = phoneView->GetPhone();
-        phone->Reset(256);
+        phone->Reset(tolk::wire::TSC::SetChanState::IN_SERVICE);
         Report("channel reset completed");
     } else {
         Report("ERROR - unable to find phone view");

@@ -1,5 +1,6 @@
 #include "console/StartTxRAICmd.h"
 
+#include "catalogue/generated/values.h"
 #include "console/TrunkView.h"
 #include "console/TrunkViewMgr.h"
 #include "model/Trunk.h"
@@ -9,7 +10,7 @@ namespace lineprobe {
 namespace {
 
 // The alarm code of "Transmit RAI".
-constexpr unsigned int TRANSMIT_RAI = 5643;
+constexpr unsigned int TRANSMIT_RAI = tolk::wire::LCON::Alarm::TRANSMIT_RAI;
 
 }  // namespace
 
