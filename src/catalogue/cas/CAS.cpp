@@ -23,7 +23,7 @@ CAS::CAS(const CAS& other) : Instance(other), CAS_Bodies() {
 }
 
 void CAS::registerNullHandlers() {
-    asyncRegisterMsgType(0x1416, static_cast<EvtCallback::MsgFn>(nullptr), 0);
+    asyncRegisterMsgType(MsgDialCmplt_t::MsgType, static_cast<EvtCallback::MsgFn>(nullptr), 0);
 }
 
 CAS::~CAS() {
@@ -45,25 +45,25 @@ MsgBody* CAS::EvtBodyLookup(unsigned int group) {
 }
 
 void CAS::DisableSignal(MsgDisableSignal_t* body, MsgDisableSignalCmplt_t* ret) {
-    request(0x1407, body, 0x1408, ret);
+    request(MsgDisableSignal_t::MsgType, body, MsgDisableSignalCmplt_t::MsgType, ret);
 }
 
 void CAS::DisableSignal(unsigned int SignalId, MsgDisableSignalCmplt_t* ret) {
     MsgDisableSignal_t body(SignalId);
-    request(0x1407, &body, 0x1408, ret);
+    request(MsgDisableSignal_t::MsgType, &body, MsgDisableSignalCmplt_t::MsgType, ret);
 }
 
 void CAS::EnableSignal(MsgEnableSignal_t* body, MsgEnableSignalCmplt_t* ret) {
-    request(0x1409, body, 0x140A, ret);
+    request(MsgEnableSignal_t::MsgType, body, MsgEnableSignalCmplt_t::MsgType, ret);
 }
 
 void CAS::EnableSignal(unsigned int SignalId, MsgEnableSignalCmplt_t* ret) {
     MsgEnableSignal_t body(SignalId);
-    request(0x1409, &body, 0x140A, ret);
+    request(MsgEnableSignal_t::MsgType, &body, MsgEnableSignalCmplt_t::MsgType, ret);
 }
 
 void CAS::GenerateSignal(MsgGenerateSignal_t* body, MsgGenerateSignalCmplt_t* ret) {
-    request(0x140B, body, 0x140C, ret);
+    request(MsgGenerateSignal_t::MsgType, body, MsgGenerateSignalCmplt_t::MsgType, ret);
 }
 
 void CAS::GenerateSignal(unsigned int SignalId, MsgGenerateSignalCmplt_t* ret) {
@@ -85,11 +85,11 @@ void CAS::GenerateSignal(unsigned int SignalId, unsigned short Count, unsigned c
 void CAS::GenerateSignal(unsigned int SignalId, unsigned short Count, unsigned char Format,
                          cat::ValueWord SignalList, MsgGenerateSignalCmplt_t* ret) {
     MsgGenerateSignal_t body(SignalId, Count, Format, SignalList);
-    request(0x140B, &body, 0x140C, ret);
+    request(MsgGenerateSignal_t::MsgType, &body, MsgGenerateSignalCmplt_t::MsgType, ret);
 }
 
 void CAS::StartGenerateSignal(MsgGenerateSignal_t* body) {
-    request(0x140B, body);
+    request(MsgGenerateSignal_t::MsgType, body);
 }
 
 void CAS::StartGenerateSignal(unsigned int SignalId, unsigned short Count, unsigned char Format) {
@@ -100,46 +100,46 @@ void CAS::StartGenerateSignal(unsigned int SignalId, unsigned short Count, unsig
 void CAS::StartGenerateSignal(unsigned int SignalId, unsigned short Count, unsigned char Format,
                               cat::ValueWord SignalList) {
     MsgGenerateSignal_t body(SignalId, Count, Format, SignalList);
-    request(0x140B, &body);
+    request(MsgGenerateSignal_t::MsgType, &body);
 }
 
 void CAS::Dial(MsgDial_t* body, MsgDialCmplt_t* ret) {
-    request(0x1415, body, 0x1416, ret);
+    request(MsgDial_t::MsgType, body, MsgDialCmplt_t::MsgType, ret);
 }
 
 void CAS::Dial(unsigned int SignalId, const staticList<char>& DigitString, MsgDialCmplt_t* ret) {
     staticList<char> digits(DigitString);
     MsgDial_t body(SignalId, digits);
-    request(0x1415, &body, 0x1416, ret);
+    request(MsgDial_t::MsgType, &body, MsgDialCmplt_t::MsgType, ret);
 }
 
 void CAS::StartDial(MsgDial_t* body) {
-    request(0x1415, body);
+    request(MsgDial_t::MsgType, body);
 }
 
 void CAS::StartDial(unsigned int SignalId, const staticList<char>& DigitString) {
     staticList<char> digits(DigitString);
     MsgDial_t body(SignalId, digits);
-    request(0x1415, &body);
+    request(MsgDial_t::MsgType, &body);
 }
 
 void CAS::StopSignal(MsgStopSignal_t* body) {
-    request(0x140D, body);
+    request(MsgStopSignal_t::MsgType, body);
 }
 
 void CAS::StopSignal() {
     MsgStopSignal_t body;
-    request(0x140D, &body);
+    request(MsgStopSignal_t::MsgType, &body);
 }
 
 void CAS::MatchCondition(MsgMatchCondition_t* body, MsgMatchConditionCmplt_t* ret) {
-    request(0x1417, body, 0x1418, ret);
+    request(MsgMatchCondition_t::MsgType, body, MsgMatchConditionCmplt_t::MsgType, ret);
 }
 
 void CAS::MatchCondition(unsigned int SignalId, unsigned char Condition,
                          MsgMatchConditionCmplt_t* ret) {
     MsgMatchCondition_t body(SignalId, Condition);
-    request(0x1417, &body, 0x1418, ret);
+    request(MsgMatchCondition_t::MsgType, &body, MsgMatchConditionCmplt_t::MsgType, ret);
 }
 
 }  // namespace tolk

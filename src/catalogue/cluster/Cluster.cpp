@@ -99,28 +99,28 @@ TmpInstance Cluster::allocateInst(unsigned char type, staticList<CompAttr_t> att
 }
 
 void Cluster::Activate(ClusterActivate_t* body) {
-    request(0x80001B, body, 0x800000, nullptr);
+    request(ClusterActivate_t::MsgType, body, ResultComplete_t::MsgType, nullptr);
 }
 
 void Cluster::Activate(unsigned int portId, Addressable* talker, unsigned char options) {
     CompDesc_t ClustDesc = TgtDesc;
     CompDesc_t talkerDesc = talker != nullptr ? talker->getTgtDesc() : allOnes();
     ClusterActivate_t body(ClustDesc, portId, options, talkerDesc);
-    request(0x80001B, &body, 0x800000, nullptr);
+    request(ClusterActivate_t::MsgType, &body, ResultComplete_t::MsgType, nullptr);
 }
 
 void Cluster::Deactivate(ClusterDeactivate_t* body) {
-    request(0x800023, body, 0x800000, nullptr);
+    request(ClusterDeactivate_t::MsgType, body, ResultComplete_t::MsgType, nullptr);
 }
 
 void Cluster::Deactivate(unsigned int portId) {
     CompDesc_t ClustDesc = TgtDesc;
     ClusterDeactivate_t body(ClustDesc, portId);
-    request(0x800023, &body, 0x800000, nullptr);
+    request(ClusterDeactivate_t::MsgType, &body, ResultComplete_t::MsgType, nullptr);
 }
 
 void Cluster::TSAssign(ClusterSlotAssign_t* body) {
-    request(0x800030, body, 0x800000, nullptr);
+    request(ClusterSlotAssign_t::MsgType, body, ResultComplete_t::MsgType, nullptr);
 }
 
 void Cluster::TSAssign(unsigned int portId, staticList<unsigned short>& slotIds,
@@ -129,21 +129,21 @@ void Cluster::TSAssign(unsigned int portId, staticList<unsigned short>& slotIds,
     unsigned char width = static_cast<unsigned char>(slotIds.length());
     staticList<unsigned short> slots(slotIds);
     ClusterSlotAssign_t body(ClustDesc, portId, width, encoding, idlePattern, slots);
-    request(0x800030, &body, 0x800000, nullptr);
+    request(ClusterSlotAssign_t::MsgType, &body, ResultComplete_t::MsgType, nullptr);
 }
 
 void Cluster::TSUnassign(ClusterSlotUnassign_t* body) {
-    request(0x800036, body, 0x800000, nullptr);
+    request(ClusterSlotUnassign_t::MsgType, body, ResultComplete_t::MsgType, nullptr);
 }
 
 void Cluster::TSUnassign(unsigned int portId) {
     CompDesc_t ClustDesc = TgtDesc;
     ClusterSlotUnassign_t body(ClustDesc, portId);
-    request(0x800036, &body, 0x800000, nullptr);
+    request(ClusterSlotUnassign_t::MsgType, &body, ResultComplete_t::MsgType, nullptr);
 }
 
 void Cluster::TSInfo(ClusterSlotInfo_t* body, ClusterSlotInfoResult_t* ret) {
-    request(0x800032, body, 0x800033, ret);
+    request(ClusterSlotInfo_t::MsgType, body, ClusterSlotInfoResult_t::MsgType, ret);
 }
 
 void Cluster::TSInfo(unsigned int portId, unsigned char* width, unsigned char* encoding,
@@ -151,7 +151,7 @@ void Cluster::TSInfo(unsigned int portId, unsigned char* width, unsigned char* e
     CompDesc_t ClustDesc = TgtDesc;
     ClusterSlotInfo_t body(ClustDesc, portId);
     ClusterSlotInfoResult_t answer;
-    request(0x800032, &body, 0x800033, &answer);
+    request(ClusterSlotInfo_t::MsgType, &body, ClusterSlotInfoResult_t::MsgType, &answer);
     if (width != nullptr) {
         *width = answer.width;
     }
@@ -167,18 +167,18 @@ void Cluster::TSInfo(unsigned int portId, unsigned char* width, unsigned char* e
 }
 
 void Cluster::Connect(ClusterConnect_t* body) {
-    request(0x80001F, body);
+    request(ClusterConnect_t::MsgType, body);
 }
 
 void Cluster::Connect(unsigned int portId1, unsigned int portId2, Addressable* a, Addressable* b) {
     CompDesc_t InstDesc1 = a != nullptr ? a->getTgtDesc() : TgtDesc;
     CompDesc_t InstDesc2 = b != nullptr ? b->getTgtDesc() : TgtDesc;
     ClusterConnect_t body(InstDesc1, portId1, InstDesc2, portId2);
-    request(0x80001F, &body);
+    request(ClusterConnect_t::MsgType, &body);
 }
 
 void Cluster::Disconnect(ClusterDisconnect_t* body) {
-    request(0x800025, body);
+    request(ClusterDisconnect_t::MsgType, body);
 }
 
 void Cluster::Disconnect(unsigned int portId1, unsigned int portId2, Addressable* a,
@@ -186,24 +186,24 @@ void Cluster::Disconnect(unsigned int portId1, unsigned int portId2, Addressable
     CompDesc_t InstDesc1 = a != nullptr ? a->getTgtDesc() : TgtDesc;
     CompDesc_t InstDesc2 = b != nullptr ? b->getTgtDesc() : TgtDesc;
     ClusterDisconnect_t body(InstDesc1, portId1, InstDesc2, portId2);
-    request(0x800025, &body);
+    request(ClusterDisconnect_t::MsgType, &body);
 }
 
 void Cluster::ClusterCompInfo(ClusterCompInfo_t* body, ClusterCompInfoResult_t* ret) {
-    request(0x800027, body, 0x800028, ret, 0, 1);
+    request(ClusterCompInfo_t::MsgType, body, ClusterCompInfoResult_t::MsgType, ret, 0, 1);
 }
 
 void Cluster::ClusterCompInfo(staticList<CompDesc_t>* out, CompDesc_t ClustDesc) {
     ClusterCompInfo_t body(ClustDesc);
     ClusterCompInfoResult_t answer;
-    request(0x800027, &body, 0x800028, &answer, 0, 1);
+    request(ClusterCompInfo_t::MsgType, &body, ClusterCompInfoResult_t::MsgType, &answer, 0, 1);
     if (out != nullptr) {
         *out = answer.instances;
     }
 }
 
 void Cluster::AttrAdd(ClusterAttrAdd_t* body, ResultComplete_t* ret) {
-    request(0x800054, body, 0x800000, ret);
+    request(ClusterAttrAdd_t::MsgType, body, ResultComplete_t::MsgType, ret);
 }
 
 void Cluster::AttrAdd(staticList<CompAttr_t>& Attrs, ResultComplete_t* ret) {
@@ -212,11 +212,11 @@ void Cluster::AttrAdd(staticList<CompAttr_t>& Attrs, ResultComplete_t* ret) {
 
 void Cluster::AttrAdd(staticList<CompAttr_t>& Attrs, unsigned char Count, ResultComplete_t* ret) {
     ClusterAttrAdd_t body(Count, Attrs);
-    request(0x800054, &body, 0x800000, ret);
+    request(ClusterAttrAdd_t::MsgType, &body, ResultComplete_t::MsgType, ret);
 }
 
 void Cluster::AttrRemove(ClusterAttrRemove_t* body, ResultComplete_t* ret) {
-    request(0x800055, body, 0x800000, ret);
+    request(ClusterAttrRemove_t::MsgType, body, ResultComplete_t::MsgType, ret);
 }
 
 void Cluster::AttrRemove(staticList<CompAttr_t>& Attrs, ResultComplete_t* ret) {
@@ -226,25 +226,25 @@ void Cluster::AttrRemove(staticList<CompAttr_t>& Attrs, ResultComplete_t* ret) {
 void Cluster::AttrRemove(staticList<CompAttr_t>& Attrs, unsigned char Count,
                          ResultComplete_t* ret) {
     ClusterAttrRemove_t body(Count, Attrs);
-    request(0x800055, &body, 0x800000, ret);
+    request(ClusterAttrRemove_t::MsgType, &body, ResultComplete_t::MsgType, ret);
 }
 
 void Cluster::Lock(ClusterLock_t* body, ResultComplete_t* ret) {
-    request(0x800056, body, 0x800000, ret);
+    request(ClusterLock_t::MsgType, body, ResultComplete_t::MsgType, ret);
 }
 
 void Cluster::Lock(ResultComplete_t* ret) {
     ClusterLock_t body;
-    request(0x800056, &body, 0x800000, ret);
+    request(ClusterLock_t::MsgType, &body, ResultComplete_t::MsgType, ret);
 }
 
 void Cluster::Unlock(ClusterUnlock_t* body, ClusterUnlockCmplt_t* ret) {
-    request(0x800057, body, 0x800058, ret);
+    request(ClusterUnlock_t::MsgType, body, ClusterUnlockCmplt_t::MsgType, ret);
 }
 
 void Cluster::Unlock(ClusterUnlockCmplt_t* ret) {
     ClusterUnlock_t body;
-    request(0x800057, &body, 0x800058, ret);
+    request(ClusterUnlock_t::MsgType, &body, ClusterUnlockCmplt_t::MsgType, ret);
 }
 
 }  // namespace tolk

@@ -1,5 +1,7 @@
 #include "catalogue/cluster/ClusterMgr.h"
 
+#include "catalogue/generated/values.h"
+
 namespace tolk {
 
 namespace {
@@ -31,7 +33,7 @@ Cluster ClusterMgr::find(staticList<CompAttr_t> attrs) {
     unsigned char count = 0xFF;
     ClusterFind_t body(CompStart, count, attrs);
     ClusterResult_t answer;
-    request(0x800053, &body, 0x80002C, &answer, 0, 1);
+    request(ClusterFind_t::MsgType, &body, ClusterResult_t::MsgType, &answer, 0, 1);
     Addressable found(answer.desc, queue);
     return Cluster(found);
 }
@@ -43,8 +45,8 @@ Cluster ClusterMgr::findByTSC(unsigned int trunk, unsigned int channel) {
 Cluster ClusterMgr::findByTSC(unsigned int trunk, unsigned int channel,
                               staticList<CompAttr_t> attrs) {
     append(attrs, 0, 18);
-    append(attrs, 0x1200, trunk);
-    append(attrs, 0x1201, channel);
+    append(attrs, wire::TSC::Attr::TRUNK, trunk);
+    append(attrs, wire::TSC::Attr::CHANNEL, channel);
     return find(attrs);
 }
 
@@ -54,12 +56,12 @@ Cluster ClusterMgr::findByLCON(unsigned int line) {
 
 Cluster ClusterMgr::findByLCON(unsigned int line, staticList<CompAttr_t> attrs) {
     append(attrs, 0, 22);
-    append(attrs, 0x1600, line);
+    append(attrs, wire::LCON::Attr::LINE, line);
     return find(attrs);
 }
 
 void ClusterMgr::ClusterFindInst(ClusterCompByAttr_t* body, ComponentResult_t* ret) {
-    request(0x80001E, body, 0x800007, ret, 0, 1);
+    request(ClusterCompByAttr_t::MsgType, body, ComponentResult_t::MsgType, ret, 0, 1);
 }
 
 void ClusterMgr::ClusterFindInst(CompDesc_t& ClustDesc, unsigned char& CompType,
@@ -71,43 +73,43 @@ void ClusterMgr::ClusterFindInst(CompDesc_t& ClustDesc, unsigned char& CompType,
                                  staticList<CompAttr_t>& Attrs, unsigned char Count,
                                  ComponentResult_t* ret) {
     ClusterCompByAttr_t body(ClustDesc, CompType, Count, Attrs);
-    request(0x80001E, &body, 0x800007, ret, 0, 1);
+    request(ClusterCompByAttr_t::MsgType, &body, ComponentResult_t::MsgType, ret, 0, 1);
 }
 
 void ClusterMgr::ClusterCreate(ClusterCreate_t* body, ClusterResult_t* ret) {
-    request(0x800020, body, 0x80002C, ret);
+    request(ClusterCreate_t::MsgType, body, ClusterResult_t::MsgType, ret);
 }
 
 void ClusterMgr::ClusterCreate(ClusterResult_t* ret) {
     ClusterCreate_t body;
-    request(0x800020, &body, 0x80002C, ret);
+    request(ClusterCreate_t::MsgType, &body, ClusterResult_t::MsgType, ret);
 }
 
 void ClusterMgr::ClusterDestroy(ClusterDestroy_t* body) {
-    request(0x800024, body);
+    request(ClusterDestroy_t::MsgType, body);
 }
 
 void ClusterMgr::ClusterDestroy(CompDesc_t& ClustDesc) {
     ClusterDestroy_t body(ClustDesc);
-    request(0x800024, &body);
+    request(ClusterDestroy_t::MsgType, &body);
 }
 
 void ClusterMgr::ClusterFree(ClusterFree_t* body) {
-    request(0x800052, body);
+    request(ClusterFree_t::MsgType, body);
 }
 
 void ClusterMgr::ClusterFree(CompDesc_t& ClustDesc) {
     ClusterFree_t body(ClustDesc);
-    request(0x800052, &body);
+    request(ClusterFree_t::MsgType, &body);
 }
 
 void ClusterMgr::ClusterFindByComp(ClusterByComp_t* body, ClusterResult_t* ret) {
-    request(0x80001D, body, 0x80002C, ret);
+    request(ClusterByComp_t::MsgType, body, ClusterResult_t::MsgType, ret);
 }
 
 void ClusterMgr::ClusterFindByComp(CompDesc_t& desc, ClusterResult_t* ret) {
     ClusterByComp_t body(desc);
-    request(0x80001D, &body, 0x80002C, ret);
+    request(ClusterByComp_t::MsgType, &body, ClusterResult_t::MsgType, ret);
 }
 
 }  // namespace tolk

@@ -21,7 +21,8 @@ LCON::LCON(const LCON& other) : Instance(other), LCON_Bodies() {
 }
 
 void LCON::registerNullHandlers() {
-    asyncRegisterMsgType(0x1611, static_cast<EvtCallback::MsgFn>(nullptr), 0);
+    asyncRegisterMsgType(MsgSetLineStateCmplt_t::MsgType, static_cast<EvtCallback::MsgFn>(nullptr),
+                         0);
 }
 
 LCON::~LCON() {
@@ -43,16 +44,16 @@ MsgBody* LCON::EvtBodyLookup(unsigned int group) {
 }
 
 void LCON::ConfigureLine(MsgConfigureLine_t* body, MsgConfigureLineCmplt_t* ret) {
-    request(0x1600, body, 0x1601, ret);
+    request(MsgConfigureLine_t::MsgType, body, MsgConfigureLineCmplt_t::MsgType, ret);
 }
 
 void LCON::ConfigureLine(MsgConfigureLineCmplt_t* ret) {
     MsgConfigureLine_t body;
-    request(0x1600, &body, 0x1601, ret);
+    request(MsgConfigureLine_t::MsgType, &body, MsgConfigureLineCmplt_t::MsgType, ret);
 }
 
 void LCON::GetAlarms(MsgGetAlarms_t* body, MsgGetAlarmsCmplt_t* ret) {
-    request(0x1602, body, 0x1603, ret);
+    request(MsgGetAlarms_t::MsgType, body, MsgGetAlarmsCmplt_t::MsgType, ret);
 }
 
 void LCON::GetAlarms(staticList<unsigned int>& Alarms, MsgGetAlarmsCmplt_t* ret) {
@@ -62,20 +63,20 @@ void LCON::GetAlarms(staticList<unsigned int>& Alarms, MsgGetAlarmsCmplt_t* ret)
 void LCON::GetAlarms(staticList<unsigned int>& Alarms, unsigned int Count,
                      MsgGetAlarmsCmplt_t* ret) {
     MsgGetAlarms_t body(Count, Alarms);
-    request(0x1602, &body, 0x1603, ret);
+    request(MsgGetAlarms_t::MsgType, &body, MsgGetAlarmsCmplt_t::MsgType, ret);
 }
 
 void LCON::GetDiagMode(MsgGetDiagMode_t* body, MsgGetDiagModeCmplt_t* ret) {
-    request(0x1604, body, 0x1605, ret);
+    request(MsgGetDiagMode_t::MsgType, body, MsgGetDiagModeCmplt_t::MsgType, ret);
 }
 
 void LCON::GetDiagMode(MsgGetDiagModeCmplt_t* ret) {
     MsgGetDiagMode_t body;
-    request(0x1604, &body, 0x1605, ret);
+    request(MsgGetDiagMode_t::MsgType, &body, MsgGetDiagModeCmplt_t::MsgType, ret);
 }
 
 void LCON::GetFaults(MsgGetFaults_t* body, MsgGetFaultsCmplt_t* ret) {
-    request(0x1606, body, 0x1607, ret);
+    request(MsgGetFaults_t::MsgType, body, MsgGetFaultsCmplt_t::MsgType, ret);
 }
 
 void LCON::GetFaults(staticList<unsigned int>& Faults, MsgGetFaultsCmplt_t* ret) {
@@ -85,38 +86,38 @@ void LCON::GetFaults(staticList<unsigned int>& Faults, MsgGetFaultsCmplt_t* ret)
 void LCON::GetFaults(staticList<unsigned int>& Faults, unsigned int Count,
                      MsgGetFaultsCmplt_t* ret) {
     MsgGetFaults_t body(Count, Faults);
-    request(0x1606, &body, 0x1607, ret);
+    request(MsgGetFaults_t::MsgType, &body, MsgGetFaultsCmplt_t::MsgType, ret);
 }
 
 void LCON::GetLineState(MsgGetLineState_t* body, MsgGetLineStateCmplt_t* ret) {
-    request(0x1608, body, 0x1609, ret);
+    request(MsgGetLineState_t::MsgType, body, MsgGetLineStateCmplt_t::MsgType, ret);
 }
 
 void LCON::GetLineState(MsgGetLineStateCmplt_t* ret) {
     MsgGetLineState_t body;
-    request(0x1608, &body, 0x1609, ret);
+    request(MsgGetLineState_t::MsgType, &body, MsgGetLineStateCmplt_t::MsgType, ret);
 }
 
 void LCON::SendAlarm(MsgSendAlarm_t* body, MsgSendAlarmCmplt_t* ret) {
-    request(0x160C, body, 0x160D, ret);
+    request(MsgSendAlarm_t::MsgType, body, MsgSendAlarmCmplt_t::MsgType, ret);
 }
 
 void LCON::SendAlarm(unsigned int AlarmId, MsgSendAlarmCmplt_t* ret) {
     MsgSendAlarm_t body(AlarmId);
-    request(0x160C, &body, 0x160D, ret);
+    request(MsgSendAlarm_t::MsgType, &body, MsgSendAlarmCmplt_t::MsgType, ret);
 }
 
 void LCON::SetDiagMode(MsgSetDiagMode_t* body, MsgSetDiagModeCmplt_t* ret) {
-    request(0x160E, body, 0x160F, ret);
+    request(MsgSetDiagMode_t::MsgType, body, MsgSetDiagModeCmplt_t::MsgType, ret);
 }
 
 void LCON::SetDiagMode(unsigned char Mode, MsgSetDiagModeCmplt_t* ret) {
     MsgSetDiagMode_t body(Mode);
-    request(0x160E, &body, 0x160F, ret);
+    request(MsgSetDiagMode_t::MsgType, &body, MsgSetDiagModeCmplt_t::MsgType, ret);
 }
 
 void LCON::SetLineState(MsgSetLineState_t* body, MsgSetLineStateCmplt_t* ret) {
-    request(0x1610, body, 0x1611, ret);
+    request(MsgSetLineState_t::MsgType, body, MsgSetLineStateCmplt_t::MsgType, ret);
 }
 
 void LCON::SetLineState(unsigned int State, MsgSetLineStateCmplt_t* ret) {
@@ -130,38 +131,38 @@ void LCON::SetLineState(unsigned int State, unsigned int Reason, MsgSetLineState
 void LCON::SetLineState(unsigned int State, unsigned int Reason, unsigned int Priority,
                         MsgSetLineStateCmplt_t* ret) {
     MsgSetLineState_t body(State, Reason, Priority);
-    request(0x1610, &body, 0x1611, ret);
+    request(MsgSetLineState_t::MsgType, &body, MsgSetLineStateCmplt_t::MsgType, ret);
 }
 
 void LCON::StartSetLineState(MsgSetLineState_t* body) {
-    request(0x1610, body);
+    request(MsgSetLineState_t::MsgType, body);
 }
 
 void LCON::StartSetLineState(unsigned int State, unsigned int Reason, unsigned int Priority) {
     MsgSetLineState_t body(State, Reason, Priority);
-    request(0x1610, &body);
+    request(MsgSetLineState_t::MsgType, &body);
 }
 
 void LCON::TSPSetLineState(MsgTSPSetLineState_t* body) {
-    request(0x1612, body);
+    request(MsgTSPSetLineState_t::MsgType, body);
 }
 
 void LCON::TSPSetLineState(unsigned int State, unsigned int Reason) {
     MsgTSPSetLineState_t body(State, Reason);
-    request(0x1612, &body);
+    request(MsgTSPSetLineState_t::MsgType, &body);
 }
 
 void LCON::StopAlarm(MsgStopAlarm_t* body) {
-    request(0x1613, body);
+    request(MsgStopAlarm_t::MsgType, body);
 }
 
 void LCON::StopAlarm(unsigned int AlarmId) {
     MsgStopAlarm_t body(AlarmId);
-    request(0x1613, &body);
+    request(MsgStopAlarm_t::MsgType, &body);
 }
 
 void LCON::GetMetrics(MsgGetMetrics_t* body, MsgGetMetricsCmplt_t* ret) {
-    request(0x160A, body, 0x160B, ret);
+    request(MsgGetMetrics_t::MsgType, body, MsgGetMetricsCmplt_t::MsgType, ret);
 }
 
 void LCON::GetMetrics(unsigned int MetricsId, MsgGetMetricsCmplt_t* ret) {
@@ -170,11 +171,11 @@ void LCON::GetMetrics(unsigned int MetricsId, MsgGetMetricsCmplt_t* ret) {
 
 void LCON::GetMetrics(unsigned int MetricsId, unsigned char Mode, MsgGetMetricsCmplt_t* ret) {
     MsgGetMetrics_t body(MetricsId, Mode);
-    request(0x160A, &body, 0x160B, ret);
+    request(MsgGetMetrics_t::MsgType, &body, MsgGetMetricsCmplt_t::MsgType, ret);
 }
 
 void LCON::SetVParm(Std_MsgSetVParm_t* body, Std_MsgSetVParmCmplt_t* ret) {
-    request(0x2F, body, 0x30, ret);
+    request(Std_MsgSetVParm_t::MsgType, body, Std_MsgSetVParmCmplt_t::MsgType, ret);
 }
 
 void LCON::SetVParm(staticList<Std_MsgSetVParm_t::Parms_t>& Parms, Std_MsgSetVParmCmplt_t* ret) {
@@ -184,11 +185,11 @@ void LCON::SetVParm(staticList<Std_MsgSetVParm_t::Parms_t>& Parms, Std_MsgSetVPa
 void LCON::SetVParm(staticList<Std_MsgSetVParm_t::Parms_t>& Parms, unsigned short Count,
                     Std_MsgSetVParmCmplt_t* ret) {
     Std_MsgSetVParm_t body(Count, Parms);
-    request(0x2F, &body, 0x30, ret);
+    request(Std_MsgSetVParm_t::MsgType, &body, Std_MsgSetVParmCmplt_t::MsgType, ret);
 }
 
 void LCON::GetVParm(Std_MsgGetVParm_t* body, Std_MsgGetVParmCmplt_t* ret) {
-    request(0x2D, body, 0x2E, ret);
+    request(Std_MsgGetVParm_t::MsgType, body, Std_MsgGetVParmCmplt_t::MsgType, ret);
 }
 
 void LCON::GetVParm(staticList<Std_MsgGetVParm_t::Parms_t>& Parms, Std_MsgGetVParmCmplt_t* ret) {
@@ -198,11 +199,11 @@ void LCON::GetVParm(staticList<Std_MsgGetVParm_t::Parms_t>& Parms, Std_MsgGetVPa
 void LCON::GetVParm(staticList<Std_MsgGetVParm_t::Parms_t>& Parms, unsigned short Count,
                     Std_MsgGetVParmCmplt_t* ret) {
     Std_MsgGetVParm_t body(Count, Parms);
-    request(0x2D, &body, 0x2E, ret);
+    request(Std_MsgGetVParm_t::MsgType, &body, Std_MsgGetVParmCmplt_t::MsgType, ret);
 }
 
 void LCON::SetProtocol(MsgTSPSetProtocol_t* body, MsgTSPSetProtocolCmplt_t* ret) {
-    request(0x1616, body, 0x1617, ret);
+    request(MsgTSPSetProtocol_t::MsgType, body, MsgTSPSetProtocolCmplt_t::MsgType, ret);
 }
 
 void LCON::SetProtocol(const staticList<char>& String, MsgTSPSetProtocolCmplt_t* ret) {
@@ -211,11 +212,11 @@ void LCON::SetProtocol(const staticList<char>& String, MsgTSPSetProtocolCmplt_t*
         text.realloc(kSetProtocolLength);
     }
     MsgTSPSetProtocol_t body(text);
-    request(0x1616, &body, 0x1617, ret);
+    request(MsgTSPSetProtocol_t::MsgType, &body, MsgTSPSetProtocolCmplt_t::MsgType, ret);
 }
 
 void LCON::ReconfigureLine(MsgReConfigureLine_t* body, MsgReConfigureLineCmplt_t* ret) {
-    request(0x1618, body, 0x1619, ret);
+    request(MsgReConfigureLine_t::MsgType, body, MsgReConfigureLineCmplt_t::MsgType, ret);
 }
 
 void LCON::ReconfigureLine(staticList<MsgReConfigureLine_t::Parms_t>& Parms,
@@ -226,7 +227,7 @@ void LCON::ReconfigureLine(staticList<MsgReConfigureLine_t::Parms_t>& Parms,
 void LCON::ReconfigureLine(staticList<MsgReConfigureLine_t::Parms_t>& Parms, unsigned int Count,
                            MsgReConfigureLineCmplt_t* ret) {
     MsgReConfigureLine_t body(Count, Parms);
-    request(0x1618, &body, 0x1619, ret);
+    request(MsgReConfigureLine_t::MsgType, &body, MsgReConfigureLineCmplt_t::MsgType, ret);
 }
 
 }  // namespace tolk

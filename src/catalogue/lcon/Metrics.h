@@ -6,10 +6,11 @@
 #include <ostream>
 
 #include "catalogue/CatBody.h"
+#include "catalogue/generated/values.h"
 
 namespace tolk::cat {
 
-inline constexpr unsigned int kIntervalMetrics = 0x1616;
+inline constexpr unsigned int kIntervalMetrics = wire::LCON::MetricsType::INTERVAL;
 
 template <class Outer>
 struct MetricsInterval {

@@ -5,9 +5,15 @@
 
 #include "catalogue/CatBody.h"
 
+namespace tolk {
+struct StdResource_Bodies;
+}
+
 namespace tolk::cat {
 
-template <class Outer>
+// Std names the message types; it is a parameter so that they are looked up where the bodies
+// that include this header are complete.
+template <class Outer, class Std = StdResource_Bodies>
 struct ErrorData {
     using Words = staticList<unsigned int>;
 
@@ -15,19 +21,21 @@ struct ErrorData {
         return *static_cast<const unsigned int*>(refs[d.fields[idx].ref]);
     }
     static bool isRecord(unsigned int e) {
-        return e == 0x08 || e == 0x0A || e == 0x12 || e == 0x14 || e == 0x2D || e == 0x2F;
+        return e == Std::MsgSetParm_t::MsgType || e == Std::MsgSetxParms_t::MsgType ||
+               e == Std::MsgGetParm_t::MsgType || e == Std::MsgGetxParms_t::MsgType ||
+               e == Std::MsgGetVParm_t::MsgType || e == Std::MsgSetVParm_t::MsgType;
     }
     static MsgBody* newRecord(unsigned int e) {
         switch (e) {
-            case 0x08:
+            case Std::MsgSetParm_t::MsgType:
                 return new typename Outer::Data_ErrorMsg_0x8_t();
-            case 0x0A:
+            case Std::MsgSetxParms_t::MsgType:
                 return new typename Outer::Data_ErrorMsg_0xa_t();
-            case 0x12:
+            case Std::MsgGetParm_t::MsgType:
                 return new typename Outer::Data_ErrorMsg_0x12_t();
-            case 0x14:
+            case Std::MsgGetxParms_t::MsgType:
                 return new typename Outer::Data_ErrorMsg_0x14_t();
-            case 0x2D:
+            case Std::MsgGetVParm_t::MsgType:
                 return new typename Outer::Data_ErrorMsg_0x2d_t();
             default:
                 return new typename Outer::Data_ErrorMsg_0x2f_t();
@@ -39,15 +47,15 @@ struct ErrorData {
     }
     static MsgBody* cloneRecord(unsigned int e, MsgBody* src) {
         switch (e) {
-            case 0x08:
+            case Std::MsgSetParm_t::MsgType:
                 return cloneAs<typename Outer::Data_ErrorMsg_0x8_t>(src);
-            case 0x0A:
+            case Std::MsgSetxParms_t::MsgType:
                 return cloneAs<typename Outer::Data_ErrorMsg_0xa_t>(src);
-            case 0x12:
+            case Std::MsgGetParm_t::MsgType:
                 return cloneAs<typename Outer::Data_ErrorMsg_0x12_t>(src);
-            case 0x14:
+            case Std::MsgGetxParms_t::MsgType:
                 return cloneAs<typename Outer::Data_ErrorMsg_0x14_t>(src);
-            case 0x2D:
+            case Std::MsgGetVParm_t::MsgType:
                 return cloneAs<typename Outer::Data_ErrorMsg_0x2d_t>(src);
             default:
                 return cloneAs<typename Outer::Data_ErrorMsg_0x2f_t>(src);

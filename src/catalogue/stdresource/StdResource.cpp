@@ -108,16 +108,16 @@ CompDesc_t StdResource::eventRetAddr(const Addressable* target) const {
 }
 
 void StdResource::GetParm(MsgGetParm_t* body, MsgGetParmCmplt_t* ret) {
-    request(0x12, body, 0x13, ret);
+    request(MsgGetParm_t::MsgType, body, MsgGetParmCmplt_t::MsgType, ret);
 }
 
 void StdResource::GetParm(unsigned int Num, MsgGetParmCmplt_t* ret) {
     MsgGetParm_t body(Num);
-    request(0x12, &body, 0x13, ret);
+    request(MsgGetParm_t::MsgType, &body, MsgGetParmCmplt_t::MsgType, ret);
 }
 
 void StdResource::ArmRTC(MsgArmRTC_t* body) {
-    request(0x21, body, 0x22, nullptr, getId());
+    request(MsgArmRTC_t::MsgType, body, MsgArmRTCCmplt_t::MsgType, nullptr, getId());
 }
 
 void StdResource::ArmRTC(unsigned int EvtGroup, unsigned int Action) {
@@ -126,7 +126,7 @@ void StdResource::ArmRTC(unsigned int EvtGroup, unsigned int Action) {
 }
 
 void StdResource::ArmxRTCs(MsgArmxRTCs_t* body) {
-    request(0x23, body, 0x24, nullptr, getId());
+    request(MsgArmxRTCs_t::MsgType, body, MsgArmxRTCsCmplt_t::MsgType, nullptr, getId());
 }
 
 void StdResource::ArmxRTCs(staticList<MsgArmxRTCs_t::EventGroupList_t>& EventGroupList) {
@@ -136,7 +136,7 @@ void StdResource::ArmxRTCs(staticList<MsgArmxRTCs_t::EventGroupList_t>& EventGro
 }
 
 void StdResource::DisArmRTC(MsgDisarmRTC_t* body) {
-    request(0x25, body, 0x26, nullptr, getId());
+    request(MsgDisarmRTC_t::MsgType, body, MsgDisarmRTCCmplt_t::MsgType, nullptr, getId());
 }
 
 void StdResource::DisArmRTC(unsigned int EvtGroup) {
@@ -145,7 +145,7 @@ void StdResource::DisArmRTC(unsigned int EvtGroup) {
 }
 
 void StdResource::DisarmxRTCs(MsgDisarmxRTCs_t* body) {
-    request(0x27, body, 0x28, nullptr, getId());
+    request(MsgDisarmxRTCs_t::MsgType, body, MsgDisarmxRTCsCmplt_t::MsgType, nullptr, getId());
 }
 
 void StdResource::DisarmxRTCs(staticList<unsigned int>& EventGroupList) {
@@ -155,7 +155,7 @@ void StdResource::DisarmxRTCs(staticList<unsigned int>& EventGroupList) {
 }
 
 void StdResource::DisarmAllRTCs(MsgDisarmAllRTCs_t* body) {
-    request(0x29, body, 0x2A, nullptr, getId());
+    request(MsgDisarmAllRTCs_t::MsgType, body, MsgDisarmAllRTCsCmplt_t::MsgType, nullptr, getId());
 }
 
 void StdResource::DisarmAllRTCs() {
@@ -164,25 +164,26 @@ void StdResource::DisarmAllRTCs() {
 }
 
 void StdResource::DetectEvt(MsgDetectEvt_t* body) {
-    request(0x16, body, 0x17, nullptr, getId());
+    request(MsgDetectEvt_t::MsgType, body, MsgDetectEvtCmplt_t::MsgType, nullptr, getId());
 }
 
 void StdResource::DetectEvt(unsigned int EvtType, unsigned int EvtGroup, Addressable* target) {
     CompDesc_t RetAddr = eventRetAddr(target);
     unsigned int group = EvtGroup != 0 ? EvtGroup : EvtType;
     MsgDetectEvt_t body(RetAddr, EvtType, group);
-    request(0x16, &body, 0x17, nullptr, eventId(target));
+    request(MsgDetectEvt_t::MsgType, &body, MsgDetectEvtCmplt_t::MsgType, nullptr, eventId(target));
 }
 
 void StdResource::DetectxEvts(MsgDetectxEvts_t* body) {
-    request(0x18, body, 0x19, nullptr, getId());
+    request(MsgDetectxEvts_t::MsgType, body, MsgDetectxEvtsCmplt_t::MsgType, nullptr, getId());
 }
 
 void StdResource::DetectxEvts(staticList<MsgDetectxEvts_t::List_t>& List, Addressable* target) {
     CompDesc_t RetAddr = eventRetAddr(target);
     unsigned int Count = 0xFFFFFFFF;
     MsgDetectxEvts_t body(RetAddr, Count, List);
-    request(0x18, &body, 0x19, nullptr, eventId(target));
+    request(MsgDetectxEvts_t::MsgType, &body, MsgDetectxEvtsCmplt_t::MsgType, nullptr,
+            eventId(target));
 }
 
 void StdResource::DetectxEvts(staticList<unsigned int>& types, unsigned int EvtGroup,
@@ -198,58 +199,59 @@ void StdResource::DetectxEvts(staticList<unsigned int>& types, unsigned int EvtG
 }
 
 void StdResource::CancelEvt(MsgCancelEvt_t* body) {
-    request(0x1A, body, 0x1B, nullptr, getId());
+    request(MsgCancelEvt_t::MsgType, body, MsgCancelEvtCmplt_t::MsgType, nullptr, getId());
 }
 
 void StdResource::CancelEvt(unsigned int Type, Addressable* target) {
     MsgCancelEvt_t body(Type);
-    request(0x1A, &body, 0x1B, nullptr, eventId(target));
+    request(MsgCancelEvt_t::MsgType, &body, MsgCancelEvtCmplt_t::MsgType, nullptr, eventId(target));
 }
 
 void StdResource::CancelxEvts(MsgCancelxEvts_t* body) {
-    request(0x1C, body, 0x1D, nullptr, getId());
+    request(MsgCancelxEvts_t::MsgType, body, MsgCancelxEvtsCmplt_t::MsgType, nullptr, getId());
 }
 
 void StdResource::CancelxEvts(staticList<unsigned int>& EvtTypeList, Addressable* target) {
     unsigned int Count = 0xFFFFFFFF;
     MsgCancelxEvts_t body(Count, EvtTypeList);
-    request(0x1C, &body, 0x1D, nullptr, eventId(target));
+    request(MsgCancelxEvts_t::MsgType, &body, MsgCancelxEvtsCmplt_t::MsgType, nullptr,
+            eventId(target));
 }
 
 void StdResource::CancelAllEvts(Addressable* target) {
     MsgCancelAllEvts_t body;
-    request(0x1E, &body, 0x1F, nullptr, eventId(target));
+    request(MsgCancelAllEvts_t::MsgType, &body, 0x1F, nullptr, eventId(target));
 }
 
 void StdResource::Error(MsgError_t* body) {
-    request(0x00, body);
+    request(MsgError_t::MsgType, body);
 }
 
 void StdResource::Error(unsigned int ErrorMsg, unsigned int ErrorCode, cat::ValueWord Data) {
     MsgError_t body(ErrorMsg, ErrorCode, Data);
-    request(0x00, &body);
+    request(MsgError_t::MsgType, &body);
 }
 
 void StdResource::ComTest(MsgComtest_t* body, MsgComtestCmplt_t* ret) {
-    request(0x02, body, 0x03, ret);
+    request(MsgComtest_t::MsgType, body, MsgComtestCmplt_t::MsgType, ret);
 }
 
 void StdResource::ComTest(MsgComtestCmplt_t* ret) {
     MsgComtest_t body;
-    request(0x02, &body, 0x03, ret);
+    request(MsgComtest_t::MsgType, &body, MsgComtestCmplt_t::MsgType, ret);
 }
 
 void StdResource::SetParm(MsgSetParm_t* body, MsgSetParmCmplt_t* ret) {
-    request(0x08, body, 0x09, ret);
+    request(MsgSetParm_t::MsgType, body, MsgSetParmCmplt_t::MsgType, ret);
 }
 
 void StdResource::SetParm(unsigned int Parm, unsigned int Val, MsgSetParmCmplt_t* ret) {
     MsgSetParm_t body(Parm, Val);
-    request(0x08, &body, 0x09, ret);
+    request(MsgSetParm_t::MsgType, &body, MsgSetParmCmplt_t::MsgType, ret);
 }
 
 void StdResource::SetxParms(MsgSetxParms_t* body, MsgSetxParmsCmplt_t* ret) {
-    request(0x0A, body, 0x0B, ret);
+    request(MsgSetxParms_t::MsgType, body, MsgSetxParmsCmplt_t::MsgType, ret);
 }
 
 void StdResource::SetxParms(staticList<MsgSetxParms_t::Parms_t>& Parms, MsgSetxParmsCmplt_t* ret) {
@@ -259,11 +261,11 @@ void StdResource::SetxParms(staticList<MsgSetxParms_t::Parms_t>& Parms, MsgSetxP
 void StdResource::SetxParms(staticList<MsgSetxParms_t::Parms_t>& Parms, unsigned int Count,
                             MsgSetxParmsCmplt_t* ret) {
     MsgSetxParms_t body(Count, Parms);
-    request(0x0A, &body, 0x0B, ret);
+    request(MsgSetxParms_t::MsgType, &body, MsgSetxParmsCmplt_t::MsgType, ret);
 }
 
 void StdResource::GetxParms(MsgGetxParms_t* body, MsgGetxParmsCmplt_t* ret) {
-    request(0x14, body, 0x15, ret);
+    request(MsgGetxParms_t::MsgType, body, MsgGetxParmsCmplt_t::MsgType, ret);
 }
 
 void StdResource::GetxParms(staticList<MsgGetxParms_t::Parms_t>& Parms, MsgGetxParmsCmplt_t* ret) {
@@ -273,11 +275,11 @@ void StdResource::GetxParms(staticList<MsgGetxParms_t::Parms_t>& Parms, MsgGetxP
 void StdResource::GetxParms(staticList<MsgGetxParms_t::Parms_t>& Parms, unsigned int Count,
                             MsgGetxParmsCmplt_t* ret) {
     MsgGetxParms_t body(Count, Parms);
-    request(0x14, &body, 0x15, ret);
+    request(MsgGetxParms_t::MsgType, &body, MsgGetxParmsCmplt_t::MsgType, ret);
 }
 
 void StdResource::SetVParm(MsgSetVParm_t* body, MsgSetVParmCmplt_t* ret) {
-    request(0x2F, body, 0x30, ret);
+    request(MsgSetVParm_t::MsgType, body, MsgSetVParmCmplt_t::MsgType, ret);
 }
 
 void StdResource::SetVParm(staticList<MsgSetVParm_t::Parms_t>& Parms, MsgSetVParmCmplt_t* ret) {
@@ -287,11 +289,11 @@ void StdResource::SetVParm(staticList<MsgSetVParm_t::Parms_t>& Parms, MsgSetVPar
 void StdResource::SetVParm(staticList<MsgSetVParm_t::Parms_t>& Parms, unsigned short Count,
                            MsgSetVParmCmplt_t* ret) {
     MsgSetVParm_t body(Count, Parms);
-    request(0x2F, &body, 0x30, ret);
+    request(MsgSetVParm_t::MsgType, &body, MsgSetVParmCmplt_t::MsgType, ret);
 }
 
 void StdResource::GetVParm(MsgGetVParm_t* body, MsgGetVParmCmplt_t* ret) {
-    request(0x2D, body, 0x2E, ret);
+    request(MsgGetVParm_t::MsgType, body, MsgGetVParmCmplt_t::MsgType, ret);
 }
 
 void StdResource::GetVParm(staticList<MsgGetVParm_t::Parms_t>& Parms, MsgGetVParmCmplt_t* ret) {
@@ -301,47 +303,47 @@ void StdResource::GetVParm(staticList<MsgGetVParm_t::Parms_t>& Parms, MsgGetVPar
 void StdResource::GetVParm(staticList<MsgGetVParm_t::Parms_t>& Parms, unsigned short Count,
                            MsgGetVParmCmplt_t* ret) {
     MsgGetVParm_t body(Count, Parms);
-    request(0x2D, &body, 0x2E, ret);
+    request(MsgGetVParm_t::MsgType, &body, MsgGetVParmCmplt_t::MsgType, ret);
 }
 
 void StdResource::Init(MsgInit_t* body, MsgInitCmplt_t* ret) {
-    request(0x04, body, 0x05, ret);
+    request(MsgInit_t::MsgType, body, MsgInitCmplt_t::MsgType, ret);
 }
 
 void StdResource::Init(MsgInitCmplt_t* ret) {
     MsgInit_t body;
-    request(0x04, &body, 0x05, ret);
+    request(MsgInit_t::MsgType, &body, MsgInitCmplt_t::MsgType, ret);
 }
 
 void StdResource::Ack(MsgAck_t* body) {
-    request(0x01, body);
+    request(MsgAck_t::MsgType, body);
 }
 
 void StdResource::Ack() {
     MsgAck_t body;
-    request(0x01, &body);
+    request(MsgAck_t::MsgType, &body);
 }
 
 void StdResource::Exit(MsgExit_t* body) {
-    request(0x06, body);
+    request(MsgExit_t::MsgType, body);
 }
 
 void StdResource::Exit() {
     MsgExit_t body;
-    request(0x06, &body);
+    request(MsgExit_t::MsgType, &body);
 }
 
 void StdResource::SetParmDef(MsgSetParmDef_t* body, MsgSetParmDefCmplt_t* ret) {
-    request(0x0C, body, 0x0D, ret);
+    request(MsgSetParmDef_t::MsgType, body, MsgSetParmDefCmplt_t::MsgType, ret);
 }
 
 void StdResource::SetParmDef(unsigned int Parm, MsgSetParmDefCmplt_t* ret) {
     MsgSetParmDef_t body(Parm);
-    request(0x0C, &body, 0x0D, ret);
+    request(MsgSetParmDef_t::MsgType, &body, MsgSetParmDefCmplt_t::MsgType, ret);
 }
 
 void StdResource::SetxParmsDef(MsgSetxParmsDef_t* body, MsgSetxParmsDefCmplt_t* ret) {
-    request(0x0E, body, 0x0F, ret);
+    request(MsgSetxParmsDef_t::MsgType, body, MsgSetxParmsDefCmplt_t::MsgType, ret);
 }
 
 void StdResource::SetxParmsDef(staticList<MsgSetxParmsDef_t::Parms_t>& Parms,
@@ -352,16 +354,16 @@ void StdResource::SetxParmsDef(staticList<MsgSetxParmsDef_t::Parms_t>& Parms,
 void StdResource::SetxParmsDef(staticList<MsgSetxParmsDef_t::Parms_t>& Parms, unsigned int Count,
                                MsgSetxParmsDefCmplt_t* ret) {
     MsgSetxParmsDef_t body(Count, Parms);
-    request(0x0E, &body, 0x0F, ret);
+    request(MsgSetxParmsDef_t::MsgType, &body, MsgSetxParmsDefCmplt_t::MsgType, ret);
 }
 
 void StdResource::SetAllParmsDef(MsgSetAllParmsDef_t* body, MsgSetAllParmsDefCmplt_t* ret) {
-    request(0x10, body, 0x11, ret);
+    request(MsgSetAllParmsDef_t::MsgType, body, MsgSetAllParmsDefCmplt_t::MsgType, ret);
 }
 
 void StdResource::SetAllParmsDef(MsgSetAllParmsDefCmplt_t* ret) {
     MsgSetAllParmsDef_t body;
-    request(0x10, &body, 0x11, ret);
+    request(MsgSetAllParmsDef_t::MsgType, &body, MsgSetAllParmsDefCmplt_t::MsgType, ret);
 }
 
 }  // namespace tolk

@@ -4,11 +4,12 @@
 // one number held in the word itself.
 
 #include "catalogue/CatBody.h"
+#include "catalogue/generated/values.h"
 
 namespace tolk::cat {
 
 inline bool isTextCallInfoType(unsigned int type) {
-    switch (type - 0x1201u) {
+    switch (type - wire::TSC::EvtType::CALL_INFO_CALLER_ID) {
         case 0:
         case 3:
         case 5:

@@ -7,6 +7,7 @@
 
 #include "catalogue/CatBody.h"
 #include "catalogue/DescValue.h"
+#include "catalogue/generated/values.h"
 #include "catalogue/tsc/CallInfo.h"
 
 namespace tolk::cat {
@@ -81,7 +82,7 @@ class KVSetRecord : public MsgBody {
     unsigned int writeMsg(Msg* m, unsigned int off) override {
         off = putFirst(m, off, 0x380000, &Key);
         off = putField(m, off, 0x380000, &ByteLength);
-        if (Key == 0x1203) {
+        if (Key == wire::TSC::KVKey::RECORDS) {
             // A missing list is an empty one: the receiver still needs the terminator to
             // know where the list ends.
             bool closed = false;
@@ -101,7 +102,7 @@ class KVSetRecord : public MsgBody {
         if (Key == 0 || Value == 0) {
             return off;
         }
-        if (Key == 0x1202) {
+        if (Key == wire::TSC::KVKey::CALL_INFO) {
             return reinterpret_cast<Value_Key_0x1202_t*>(Value)->writeMsg(m, off);
         }
         return putList<unsigned char>(m, off, 4, *reinterpret_cast<Bytes*>(Value), false);
@@ -111,12 +112,12 @@ class KVSetRecord : public MsgBody {
         off = getFirst(m, off, 0x380000, &Key);
         off = getField(m, off, 0x380000, &ByteLength);
         owned_.release(&Value);
-        if (Key == 0x1202) {
+        if (Key == wire::TSC::KVKey::CALL_INFO) {
             auto* v = new Value_Key_0x1202_t();
             adopt(v);
             return v->readMsg(m, off);
         }
-        if (Key == 0x1203) {
+        if (Key == wire::TSC::KVKey::RECORDS) {
             auto* l = new Records();
             adopt(l);
             // Sized to what the bytes left could hold, then cut behind the terminator.
@@ -143,7 +144,7 @@ class KVSetRecord : public MsgBody {
     }
 
     unsigned int GetByteSize() override {
-        if (Key == 0x1203) {
+        if (Key == wire::TSC::KVKey::RECORDS) {
             unsigned int n = 8;
             for (unsigned int i = 0; Value != 0 && i < records().length(); ++i) {
                 n += records()[i]->GetByteSize();
@@ -156,7 +157,7 @@ class KVSetRecord : public MsgBody {
         if (Key == 0 || Value == 0) {
             return 8;
         }
-        if (Key == 0x1202) {
+        if (Key == wire::TSC::KVKey::CALL_INFO) {
             return 8 + reinterpret_cast<Value_Key_0x1202_t*>(Value)->GetByteSize();
         }
         return 8 + reinterpret_cast<Bytes*>(Value)->length();
@@ -166,9 +167,9 @@ class KVSetRecord : public MsgBody {
         *os << "{Key " << Key << " ByteLength " << ByteLength << " Value ";
         if (Value == 0) {
             *os << "NULL";
-        } else if (Key == 0x1202) {
+        } else if (Key == wire::TSC::KVKey::CALL_INFO) {
             reinterpret_cast<const Value_Key_0x1202_t*>(Value)->toStream(os);
-        } else if (Key == 0x1203) {
+        } else if (Key == wire::TSC::KVKey::RECORDS) {
             reinterpret_cast<const Records*>(Value)->toStream(os);
         } else {
             reinterpret_cast<const Bytes*>(Value)->toStream(os);
@@ -194,9 +195,9 @@ class KVSetRecord : public MsgBody {
         if (o.Value == 0) {
             return;
         }
-        if (Key == 0x1202) {
+        if (Key == wire::TSC::KVKey::CALL_INFO) {
             adopt(new Value_Key_0x1202_t(*reinterpret_cast<const Value_Key_0x1202_t*>(o.Value)));
-        } else if (Key == 0x1203) {
+        } else if (Key == wire::TSC::KVKey::RECORDS) {
             adopt(new Records(*reinterpret_cast<const Records*>(o.Value)));
         } else {
             adopt(new Bytes(*reinterpret_cast<const Bytes*>(o.Value)));

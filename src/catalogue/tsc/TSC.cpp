@@ -1,5 +1,7 @@
 #include "catalogue/tsc/TSC.h"
 
+#include "catalogue/generated/values.h"
+
 namespace tolk {
 
 TSC::TSC(const CompDesc_t& target, isa::RefPtr<MsgQueue>& q) : Instance(target, q) {
@@ -15,7 +17,8 @@ TSC::TSC(const TSC& other) : Instance(other), TSC_Bodies() {
 }
 
 void TSC::registerNullHandlers() {
-    asyncRegisterMsgType(0x1220, static_cast<EvtCallback::MsgFn>(nullptr), 0);
+    asyncRegisterMsgType(MsgSetChanStateCmplt_t::MsgType, static_cast<EvtCallback::MsgFn>(nullptr),
+                         0);
 }
 
 TSC::~TSC() {
@@ -37,16 +40,16 @@ MsgBody* TSC::EvtBodyLookup(unsigned int group) {
 }
 
 void TSC::AcceptCall(MsgAcceptCall_t* body) {
-    request(0x1200, body);
+    request(MsgAcceptCall_t::MsgType, body);
 }
 
 void TSC::AcceptCall(unsigned int CallId) {
     MsgAcceptCall_t body(CallId);
-    request(0x1200, &body);
+    request(MsgAcceptCall_t::MsgType, &body);
 }
 
 void TSC::AnswerCall(MsgAnswerCall_t* body) {
-    request(0x1201, body);
+    request(MsgAnswerCall_t::MsgType, body);
 }
 
 void TSC::AnswerCall(unsigned int CallId, unsigned int NumRings) {
@@ -57,11 +60,11 @@ void TSC::AnswerCall(unsigned int CallId, unsigned int NumRings) {
 void TSC::AnswerCall(unsigned int CallId, unsigned int NumRings,
                      staticList<MsgAnswerCall_t::KVSet_t>& KVSet) {
     MsgAnswerCall_t body(CallId, NumRings, KVSet);
-    request(0x1201, &body);
+    request(MsgAnswerCall_t::MsgType, &body);
 }
 
 void TSC::BlindTransferCall(MsgBlindTransferCall_t* body) {
-    request(0x1202, body);
+    request(MsgBlindTransferCall_t::MsgType, body);
 }
 
 void TSC::BlindTransferCall(unsigned int CallId, const Text& DestAddr, const Text& OrigAddr,
@@ -69,29 +72,29 @@ void TSC::BlindTransferCall(unsigned int CallId, const Text& DestAddr, const Tex
     Text dest(DestAddr);
     Text orig(OrigAddr);
     MsgBlindTransferCall_t body(CallId, dest, orig, CallProgress);
-    request(0x1202, &body);
+    request(MsgBlindTransferCall_t::MsgType, &body);
 }
 
 void TSC::CancelTransfer(MsgCancelTransfer_t* body) {
-    request(0x1203, body);
+    request(MsgCancelTransfer_t::MsgType, body);
 }
 
 void TSC::CancelTransfer(unsigned int CallId) {
     MsgCancelTransfer_t body(CallId);
-    request(0x1203, &body);
+    request(MsgCancelTransfer_t::MsgType, &body);
 }
 
 void TSC::CancelComplete(MsgCancelComplete_t* body) {
-    request(0x1204, body);
+    request(MsgCancelComplete_t::MsgType, body);
 }
 
 void TSC::CancelComplete(unsigned int CmpltId) {
     MsgCancelComplete_t body(CmpltId);
-    request(0x1204, &body);
+    request(MsgCancelComplete_t::MsgType, &body);
 }
 
 void TSC::CompleteCall(MsgCompleteCall_t* body, MsgCompleteCallCmplt_t* ret) {
-    request(0x1205, body, 0x1206, ret);
+    request(MsgCompleteCall_t::MsgType, body, MsgCompleteCallCmplt_t::MsgType, ret);
 }
 
 void TSC::CompleteCall(unsigned int Mode, MsgCompleteCallCmplt_t* ret) {
@@ -100,20 +103,20 @@ void TSC::CompleteCall(unsigned int Mode, MsgCompleteCallCmplt_t* ret) {
 
 void TSC::CompleteCall(unsigned int Mode, unsigned int CallId, MsgCompleteCallCmplt_t* ret) {
     MsgCompleteCall_t body(CallId, Mode);
-    request(0x1205, &body, 0x1206, ret);
+    request(MsgCompleteCall_t::MsgType, &body, MsgCompleteCallCmplt_t::MsgType, ret);
 }
 
 void TSC::CompleteTransfer(MsgCompleteTransfer_t* body) {
-    request(0x1207, body);
+    request(MsgCompleteTransfer_t::MsgType, body);
 }
 
 void TSC::CompleteTransfer(unsigned int ConCallId, unsigned int CallId) {
     MsgCompleteTransfer_t body(CallId, ConCallId);
-    request(0x1207, &body);
+    request(MsgCompleteTransfer_t::MsgType, &body);
 }
 
 void TSC::DropCall(MsgDropCall_t* body) {
-    request(0x120A, body);
+    request(MsgDropCall_t::MsgType, body);
 }
 
 void TSC::DropCall(unsigned int CallId, unsigned int Reason) {
@@ -124,11 +127,11 @@ void TSC::DropCall(unsigned int CallId, unsigned int Reason) {
 void TSC::DropCall(unsigned int CallId, unsigned int Reason,
                    staticList<MsgDropCall_t::KVSet_t>& KVSet) {
     MsgDropCall_t body(CallId, Reason, KVSet);
-    request(0x120A, &body);
+    request(MsgDropCall_t::MsgType, &body);
 }
 
 void TSC::GetCallState(MsgGetCallState_t* body, MsgGetCallStateCmplt_t* ret) {
-    request(0x120D, body, 0x120E, ret);
+    request(MsgGetCallState_t::MsgType, body, MsgGetCallStateCmplt_t::MsgType, ret);
 }
 
 void TSC::GetCallState(MsgGetCallStateCmplt_t* ret) {
@@ -137,29 +140,29 @@ void TSC::GetCallState(MsgGetCallStateCmplt_t* ret) {
 
 void TSC::GetCallState(unsigned int CallId, MsgGetCallStateCmplt_t* ret) {
     MsgGetCallState_t body(CallId);
-    request(0x120D, &body, 0x120E, ret);
+    request(MsgGetCallState_t::MsgType, &body, MsgGetCallStateCmplt_t::MsgType, ret);
 }
 
 void TSC::GetChanState(MsgGetChanState_t* body, MsgGetChanStateCmplt_t* ret) {
-    request(0x120F, body, 0x1210, ret);
+    request(MsgGetChanState_t::MsgType, body, MsgGetChanStateCmplt_t::MsgType, ret);
 }
 
 void TSC::GetChanState(MsgGetChanStateCmplt_t* ret) {
     MsgGetChanState_t body;
-    request(0x120F, &body, 0x1210, ret);
+    request(MsgGetChanState_t::MsgType, &body, MsgGetChanStateCmplt_t::MsgType, ret);
 }
 
 void TSC::HoldCall(MsgHoldCall_t* body) {
-    request(0x1211, body);
+    request(MsgHoldCall_t::MsgType, body);
 }
 
 void TSC::HoldCall(unsigned int CallId) {
     MsgHoldCall_t body(CallId);
-    request(0x1211, &body);
+    request(MsgHoldCall_t::MsgType, &body);
 }
 
 void TSC::InitTransfer(MsgInitTransfer_t* body, MsgInitTransferCmplt_t* ret) {
-    request(0x1212, body, 0x1213, ret);
+    request(MsgInitTransfer_t::MsgType, body, MsgInitTransferCmplt_t::MsgType, ret);
 }
 
 void TSC::InitTransfer(MsgInitTransferCmplt_t* ret) {
@@ -184,11 +187,11 @@ void TSC::InitTransfer(unsigned int CallId, const Text& DestAddr, const Text& Or
     Text dest(DestAddr);
     Text orig(OrigAddr);
     MsgInitTransfer_t body(CallId, dest, orig, CallProgress);
-    request(0x1212, &body, 0x1213, ret);
+    request(MsgInitTransfer_t::MsgType, &body, MsgInitTransferCmplt_t::MsgType, ret);
 }
 
 void TSC::MakeCall(MsgMakeCall_t* body, MsgMakeCallCmplt_t* ret) {
-    request(0x1214, body, 0x1215, ret);
+    request(MsgMakeCall_t::MsgType, body, MsgMakeCallCmplt_t::MsgType, ret);
 }
 
 void TSC::MakeCall(MsgMakeCallCmplt_t* ret) {
@@ -214,11 +217,11 @@ void TSC::MakeCall(const Text& DestAddr, const Text& OrigAddr, unsigned char Cal
     Text dest(DestAddr);
     Text orig(OrigAddr);
     MsgMakeCall_t body(dest, orig, CallProgress, KVSet);
-    request(0x1214, &body, 0x1215, ret);
+    request(MsgMakeCall_t::MsgType, &body, MsgMakeCallCmplt_t::MsgType, ret);
 }
 
 void TSC::ParkCall(MsgParkCall_t* body, MsgParkCallCmplt_t* ret) {
-    request(0x1216, body, 0x1217, ret);
+    request(MsgParkCall_t::MsgType, body, MsgParkCallCmplt_t::MsgType, ret);
 }
 
 void TSC::ParkCall(MsgParkCallCmplt_t* ret) {
@@ -232,49 +235,49 @@ void TSC::ParkCall(unsigned int CallId, MsgParkCallCmplt_t* ret) {
 void TSC::ParkCall(unsigned int CallId, const Text& ParkAddr, MsgParkCallCmplt_t* ret) {
     Text park(ParkAddr);
     MsgParkCall_t body(CallId, park);
-    request(0x1216, &body, 0x1217, ret);
+    request(MsgParkCall_t::MsgType, &body, MsgParkCallCmplt_t::MsgType, ret);
 }
 
 void TSC::PickupCall(MsgPickupCall_t* body, MsgPickupCallCmplt_t* ret) {
-    request(0x1218, body, 0x1219, ret);
+    request(MsgPickupCall_t::MsgType, body, MsgPickupCallCmplt_t::MsgType, ret);
 }
 
 void TSC::PickupCall(unsigned int ParkId, const Text& ParkAddr, MsgPickupCallCmplt_t* ret) {
     Text park(ParkAddr);
     MsgPickupCall_t body(ParkId, park);
-    request(0x1218, &body, 0x1219, ret);
+    request(MsgPickupCall_t::MsgType, &body, MsgPickupCallCmplt_t::MsgType, ret);
 }
 
 void TSC::ReconnectCall(MsgReconnectCall_t* body) {
-    request(0x121A, body);
+    request(MsgReconnectCall_t::MsgType, body);
 }
 
 void TSC::ReconnectCall(unsigned int CallId) {
     MsgReconnectCall_t body(CallId);
-    request(0x121A, &body);
+    request(MsgReconnectCall_t::MsgType, &body);
 }
 
 void TSC::RedirectCall(MsgRedirectCall_t* body) {
-    request(0x121B, body);
+    request(MsgRedirectCall_t::MsgType, body);
 }
 
 void TSC::RedirectCall(unsigned int CallId, const Text& DestAddr) {
     Text dest(DestAddr);
     MsgRedirectCall_t body(CallId, dest);
-    request(0x121B, &body);
+    request(MsgRedirectCall_t::MsgType, &body);
 }
 
 void TSC::ReleaseCall(MsgReleaseCall_t* body) {
-    request(0x121C, body);
+    request(MsgReleaseCall_t::MsgType, body);
 }
 
 void TSC::ReleaseCall(unsigned int CallId, unsigned int Reason) {
     MsgReleaseCall_t body(CallId, Reason);
-    request(0x121C, &body);
+    request(MsgReleaseCall_t::MsgType, &body);
 }
 
 void TSC::RejectCall(MsgRejectCall_t* body) {
-    request(0x121D, body);
+    request(MsgRejectCall_t::MsgType, body);
 }
 
 void TSC::RejectCall(unsigned int CallId, unsigned int Reason) {
@@ -285,38 +288,38 @@ void TSC::RejectCall(unsigned int CallId, unsigned int Reason) {
 void TSC::RejectCall(unsigned int CallId, unsigned int Reason,
                      staticList<MsgRejectCall_t::KVSet_t>& KVSet) {
     MsgRejectCall_t body(CallId, Reason, KVSet);
-    request(0x121D, &body);
+    request(MsgRejectCall_t::MsgType, &body);
 }
 
 void TSC::RetrieveCall(MsgRetrieveCall_t* body) {
-    request(0x121E, body);
+    request(MsgRetrieveCall_t::MsgType, body);
 }
 
 void TSC::RetrieveCall(unsigned int CallId) {
     MsgRetrieveCall_t body(CallId);
-    request(0x121E, &body);
+    request(MsgRetrieveCall_t::MsgType, &body);
 }
 
 void TSC::SetChanState(MsgSetChanState_t* body, MsgSetChanStateCmplt_t* ret) {
-    request(0x121F, body, 0x1220, ret);
+    request(MsgSetChanState_t::MsgType, body, MsgSetChanStateCmplt_t::MsgType, ret);
 }
 
 void TSC::SetChanState(unsigned int State, MsgSetChanStateCmplt_t* ret) {
     MsgSetChanState_t body(State);
-    request(0x121F, &body, 0x1220, ret);
+    request(MsgSetChanState_t::MsgType, &body, MsgSetChanStateCmplt_t::MsgType, ret);
 }
 
 void TSC::StartSetChanState(MsgSetChanState_t* body) {
-    request(0x121F, body);
+    request(MsgSetChanState_t::MsgType, body);
 }
 
 void TSC::StartSetChanState(unsigned int State) {
     MsgSetChanState_t body(State);
-    request(0x121F, &body);
+    request(MsgSetChanState_t::MsgType, &body);
 }
 
 void TSC::GetCallInfo(MsgGetCallInfo_t* body, MsgGetCallInfoCmplt_t* ret) {
-    request(0x120B, body, 0x120C, ret);
+    request(MsgGetCallInfo_t::MsgType, body, MsgGetCallInfoCmplt_t::MsgType, ret);
 }
 
 void TSC::GetCallInfo(staticList<unsigned int>& InfoIds, MsgGetCallInfoCmplt_t* ret) {
@@ -331,11 +334,11 @@ void TSC::GetCallInfo(staticList<unsigned int>& InfoIds, unsigned int CallId,
 void TSC::GetCallInfo(staticList<unsigned int>& InfoIds, unsigned int CallId, unsigned int Count,
                       MsgGetCallInfoCmplt_t* ret) {
     MsgGetCallInfo_t body(CallId, Count, InfoIds);
-    request(0x120B, &body, 0x120C, ret);
+    request(MsgGetCallInfo_t::MsgType, &body, MsgGetCallInfoCmplt_t::MsgType, ret);
 }
 
 void TSC::SendISDN(MsgSendISDN_t* body, MsgSendISDNCmplt_t* ret) {
-    request(0x1222, body, 0x1223, ret);
+    request(MsgSendISDN_t::MsgType, body, MsgSendISDNCmplt_t::MsgType, ret);
 }
 
 void TSC::SendISDN(unsigned int MessageType, staticList<unsigned char>& Data,
@@ -351,11 +354,11 @@ void TSC::SendISDN(unsigned int MessageType, staticList<unsigned char>& Data, un
 void TSC::SendISDN(unsigned int MessageType, staticList<unsigned char>& Data, unsigned int CallId,
                    unsigned int DataLength, MsgSendISDNCmplt_t* ret) {
     MsgSendISDN_t body(CallId, MessageType, DataLength, Data);
-    request(0x1222, &body, 0x1223, ret);
+    request(MsgSendISDN_t::MsgType, &body, MsgSendISDNCmplt_t::MsgType, ret);
 }
 
 void TSC::Dial(MsgDial_t* body, MsgDialCmplt_t* ret) {
-    request(0x1224, body, 0x1225, ret);
+    request(MsgDial_t::MsgType, body, MsgDialCmplt_t::MsgType, ret);
 }
 
 void TSC::Dial(const Text& DigitString, MsgDialCmplt_t* ret) {
@@ -382,11 +385,11 @@ void TSC::Dial(const Text& DigitString, unsigned int CallId, unsigned char CallP
                MsgDialCmplt_t* ret) {
     Text digits(DigitString);
     MsgDial_t body(CallId, digits, CallProgress, EndOfDigits, KVSet);
-    request(0x1224, &body, 0x1225, ret);
+    request(MsgDial_t::MsgType, &body, MsgDialCmplt_t::MsgType, ret);
 }
 
 void TSC::ProceedCall(MsgProceedCall_t* body) {
-    request(0x122D, body);
+    request(MsgProceedCall_t::MsgType, body);
 }
 
 void TSC::ProceedCall(unsigned int CallId) {
@@ -396,11 +399,11 @@ void TSC::ProceedCall(unsigned int CallId) {
 
 void TSC::ProceedCall(unsigned int CallId, staticList<MsgProceedCall_t::KVSet_t>& KVSet) {
     MsgProceedCall_t body(CallId, KVSet);
-    request(0x122D, &body);
+    request(MsgProceedCall_t::MsgType, &body);
 }
 
 void TSC::Attach(MsgAttach_t* body, MsgAttachCmplt_t* ret) {
-    request(0x1234, body, 0x1235, ret);
+    request(MsgAttach_t::MsgType, body, MsgAttachCmplt_t::MsgType, ret);
 }
 
 void TSC::Attach(staticList<MsgAttach_t::MediaInfo_t>& MediaInfo, MsgAttachCmplt_t* ret) {
@@ -410,20 +413,20 @@ void TSC::Attach(staticList<MsgAttach_t::MediaInfo_t>& MediaInfo, MsgAttachCmplt
 void TSC::Attach(staticList<MsgAttach_t::MediaInfo_t>& MediaInfo, unsigned char Count,
                  MsgAttachCmplt_t* ret) {
     MsgAttach_t body(Count, MediaInfo);
-    request(0x1234, &body, 0x1235, ret);
+    request(MsgAttach_t::MsgType, &body, MsgAttachCmplt_t::MsgType, ret);
 }
 
 void TSC::Detach(MsgDetach_t* body, MsgDetachCmplt_t* ret) {
-    request(0x1236, body, 0x1237, ret);
+    request(MsgDetach_t::MsgType, body, MsgDetachCmplt_t::MsgType, ret);
 }
 
 void TSC::Detach(MsgDetachCmplt_t* ret) {
     MsgDetach_t body;
-    request(0x1236, &body, 0x1237, ret);
+    request(MsgDetach_t::MsgType, &body, MsgDetachCmplt_t::MsgType, ret);
 }
 
 void TSC::SetAlarmMask(MsgSetAlarmMask_t* body, MsgSetAlarmMaskCmplt_t* ret) {
-    request(0x1242, body, 0x1243, ret);
+    request(MsgSetAlarmMask_t::MsgType, body, MsgSetAlarmMaskCmplt_t::MsgType, ret);
 }
 
 void TSC::SetAlarmMask(unsigned char Linenum, MsgSetAlarmMaskCmplt_t* ret) {
@@ -433,20 +436,20 @@ void TSC::SetAlarmMask(unsigned char Linenum, MsgSetAlarmMaskCmplt_t* ret) {
 void TSC::SetAlarmMask(unsigned char Linenum, unsigned int Alarm_mask,
                        MsgSetAlarmMaskCmplt_t* ret) {
     MsgSetAlarmMask_t body(Linenum, Alarm_mask);
-    request(0x1242, &body, 0x1243, ret);
+    request(MsgSetAlarmMask_t::MsgType, &body, MsgSetAlarmMaskCmplt_t::MsgType, ret);
 }
 
 void TSC::GetAlarmMask(MsgGetAlarmMask_t* body, MsgGetAlarmMaskCmplt_t* ret) {
-    request(0x1244, body, 0x1245, ret);
+    request(MsgGetAlarmMask_t::MsgType, body, MsgGetAlarmMaskCmplt_t::MsgType, ret);
 }
 
 void TSC::GetAlarmMask(unsigned char Linenum, MsgGetAlarmMaskCmplt_t* ret) {
     MsgGetAlarmMask_t body(Linenum);
-    request(0x1244, &body, 0x1245, ret);
+    request(MsgGetAlarmMask_t::MsgType, &body, MsgGetAlarmMaskCmplt_t::MsgType, ret);
 }
 
 void TSC::GCExtension(MsgGCExtension_t* body, MsgGCExtensionCmplt_t* ret) {
-    request(0x1248, body, 0x1249, ret);
+    request(MsgGCExtension_t::MsgType, body, MsgGCExtensionCmplt_t::MsgType, ret);
 }
 
 void TSC::GCExtension(MsgGCExtensionCmplt_t* ret) {
@@ -476,29 +479,29 @@ void TSC::GCExtension(unsigned int Int1Val, unsigned int Int2Val, unsigned int I
     Text str1(Str1Val);
     Text str2(Str2Val);
     MsgGCExtension_t body(Int1Val, Int2Val, Int3Val, str1, str2);
-    request(0x1248, &body, 0x1249, ret);
+    request(MsgGCExtension_t::MsgType, &body, MsgGCExtensionCmplt_t::MsgType, ret);
 }
 
 void TSC::ResetLineDevice(MsgResetLineDevice_t* body, MsgResetLineDeviceCmplt_t* ret) {
-    request(0x1246, body, 0x1247, ret);
+    request(MsgResetLineDevice_t::MsgType, body, MsgResetLineDeviceCmplt_t::MsgType, ret);
 }
 
 void TSC::ResetLineDevice(MsgResetLineDeviceCmplt_t* ret) {
-    ResetLineDevice(0x100u, ret);
+    ResetLineDevice(wire::TSC::SetChanState::IN_SERVICE, ret);
 }
 
 void TSC::ResetLineDevice(unsigned int state, MsgResetLineDeviceCmplt_t* ret) {
     MsgResetLineDevice_t body(state);
-    request(0x1246, &body, 0x1247, ret);
+    request(MsgResetLineDevice_t::MsgType, &body, MsgResetLineDeviceCmplt_t::MsgType, ret);
 }
 
 void TSC::GetSignalBits(MsgTxRxSignalingGet_t* body, MsgTxRxSignalingGetCmplt_t* ret) {
-    request(0x124E, body, 0x124F, ret);
+    request(MsgTxRxSignalingGet_t::MsgType, body, MsgTxRxSignalingGetCmplt_t::MsgType, ret);
 }
 
 void TSC::GetSignalBits(MsgTxRxSignalingGetCmplt_t* ret) {
     MsgTxRxSignalingGet_t body;
-    request(0x124E, &body, 0x124F, ret);
+    request(MsgTxRxSignalingGet_t::MsgType, &body, MsgTxRxSignalingGetCmplt_t::MsgType, ret);
 }
 
 void TSC::DetectEvtSet(unsigned int EvtType, staticList<unsigned int>& Set, unsigned int EvtGroup,
@@ -507,7 +510,8 @@ void TSC::DetectEvtSet(unsigned int EvtType, staticList<unsigned int>& Set, unsi
     unsigned int group = EvtGroup != 0 ? EvtGroup : EvtType;
     unsigned int Count = 0xFFFFFFFF;
     MsgDetectEvtSet_t body(RetAddr, EvtType, group, Count, Set);
-    request(0x16, &body, 0x17, nullptr, eventId(target));
+    request(MsgDetectEvtSet_t::MsgType, &body, StdResource_Bodies::MsgDetectEvtCmplt_t::MsgType,
+            nullptr, eventId(target));
 }
 
 }  // namespace tolk
