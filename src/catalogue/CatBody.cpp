@@ -40,7 +40,7 @@ unsigned int bytesLeft(Msg* m, unsigned int off) {
 namespace {
 
 unsigned int readNumber(const Field& f, const void* p) {
-    switch (codeWidth(f.typeCode)) {
+    switch (wire::width(f.typeCode)) {
         case 1:
             return *static_cast<const unsigned char*>(p);
         case 2:
@@ -51,7 +51,7 @@ unsigned int readNumber(const Field& f, const void* p) {
 }
 
 void storeNumber(const Field& f, void* p, unsigned int v) {
-    switch (codeWidth(f.typeCode)) {
+    switch (wire::width(f.typeCode)) {
         case 1:
             *static_cast<unsigned char*>(p) = static_cast<unsigned char>(v);
             break;
@@ -65,13 +65,13 @@ void storeNumber(const Field& f, void* p, unsigned int v) {
 }
 
 unsigned int fixedDesc(const Field& f) {
-    return (static_cast<unsigned int>(f.typeCode) << 19) | ((f.fixedLen - 1u) << 11);
+    return wire::pack(f.typeCode, f.fixedLen);
 }
 
 // Fixed runs are char or unsigned char lists; both are one byte wide.
 template <class F>
 void withFixed(const Field& f, void* p, F&& fn) {
-    if (f.typeCode == 10 || f.typeCode == 0) {
+    if (f.typeCode == wire::CHAR || f.typeCode == wire::I8) {
         fn(*static_cast<staticList<char>*>(p));
     } else {
         fn(*static_cast<staticList<unsigned char>*>(p));
@@ -94,7 +94,7 @@ unsigned int writeBody(const BodyDesc& d, void* const* refs, Msg* m, unsigned in
         void* p = refs[i];
         switch (f.kind) {
             case Kind::Scalar: {
-                unsigned int desc = static_cast<unsigned int>(f.typeCode) << 19;
+                unsigned int desc = wire::pack(f.typeCode);
                 off = first ? putFirst(m, off, desc, p) : putField(m, off, desc, p);
                 break;
             }
@@ -137,7 +137,7 @@ unsigned int readBody(const BodyDesc& d, void* const* refs, Owned* owned, Msg* m
         void* p = refs[i];
         switch (f.kind) {
             case Kind::Scalar: {
-                unsigned int desc = static_cast<unsigned int>(f.typeCode) << 19;
+                unsigned int desc = wire::pack(f.typeCode);
                 off = first ? getFirst(m, off, desc, p) : getField(m, off, desc, p);
                 break;
             }
@@ -183,7 +183,7 @@ unsigned int sizeBody(const BodyDesc& d, void* const* refs) {
         void* p = refs[i];
         switch (f.kind) {
             case Kind::Scalar:
-                n += codeWidth(f.typeCode);
+                n += wire::width(f.typeCode);
                 break;
             case Kind::Contained:
                 n += 6;
@@ -217,7 +217,7 @@ void printBody(const BodyDesc& d, void* const* refs, std::ostream* os) {
         *os << f.label << " ";
         switch (f.kind) {
             case Kind::Scalar:
-                if (f.typeCode == 3) {
+                if (f.typeCode == wire::I32) {
                     *os << *static_cast<const int*>(p);
                 } else {
                     *os << readNumber(f, p);
@@ -250,7 +250,7 @@ void copyBody(const BodyDesc& d, void* const* dst, void* const* src, Owned* owne
         const Field& f = d.fields[i];
         switch (f.kind) {
             case Kind::Scalar:
-                if (codeWidth(f.typeCode) == 4) {
+                if (wire::width(f.typeCode) == 4) {
                     *static_cast<unsigned int*>(dst[i]) = *static_cast<const unsigned int*>(src[i]);
                 } else {
                     storeNumber(f, dst[i], readNumber(f, src[i]));

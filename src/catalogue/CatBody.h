@@ -6,6 +6,7 @@
 #include <cstdint>
 #include <ostream>
 
+#include "catalogue/generated/wire.h"
 #include "framework/CompAttr_t.h"
 #include "framework/CompDesc_t.h"
 #include "framework/Marshal.h"
@@ -67,7 +68,7 @@ struct FieldOps {
 struct Field {
     const char* label;
     Kind kind;
-    std::uint8_t typeCode;  // element type code for numbers, fixed runs and scalar lists
+    wire::TypeCode typeCode;  // element type for numbers, fixed runs and scalar lists
     std::uint16_t fixedLen;
     std::int8_t ref;  // count field, descriptor field or the custom field's argument; -1 if none
     const ListOps* list;
@@ -113,11 +114,6 @@ class Owned {
 void printBody(const BodyDesc& d, void* const* refs, std::ostream* os);
 void copyBody(const BodyDesc& d, void* const* dst, void* const* src, Owned* owned);
 
-// Width in bytes of an element of a type code, as bodies work it out.
-constexpr unsigned int codeWidth(unsigned int t) {
-    return (t == 0 || t == 4 || t == 10) ? 1 : (t == 1 || t == 5) ? 2 : 4;
-}
-
 // Bytes left in the message behind `off`; 0 when `off` is at or beyond the end.
 unsigned int bytesLeft(Msg* m, unsigned int off);
 
@@ -146,16 +142,16 @@ struct ScalarList {
         return getList<T>(m, off, Code, *static_cast<L*>(l), n, first);
     }
     static unsigned int readToEnd(void* l, Msg* m, unsigned int off, bool first) {
-        unsigned int n = bytesLeft(m, off) / codeWidth(Code);
+        unsigned int n = bytesLeft(m, off) / wire::width(Code);
         return getList<T>(m, off, Code, *static_cast<L*>(l), n, first);
     }
     static unsigned int byteSize(const void* l) {
-        return static_cast<const L*>(l)->length() * codeWidth(Code);
+        return static_cast<const L*>(l)->length() * wire::width(Code);
     }
     static void assign(void* d, const void* s) { *static_cast<L*>(d) = *static_cast<const L*>(s); }
     static void print(const void* l, std::ostream* os) { static_cast<const L*>(l)->toStream(os); }
-    static constexpr ListOps ops{length, resize, write,           read, readToEnd, byteSize,
-                                 assign, print,  codeWidth(Code), true};
+    static constexpr ListOps ops{
+        length, resize, write, read, readToEnd, byteSize, assign, print, wire::width(Code), true};
 };
 
 template <class T>

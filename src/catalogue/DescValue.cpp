@@ -7,33 +7,6 @@ namespace tolk::cat::dcv {
 
 namespace {
 
-// Element types that a descriptor's type code reads into.
-template <class F>
-void withElement(unsigned int t, F&& f) {
-    switch (t) {
-        case 0:
-        case 10:
-            f(static_cast<char*>(nullptr));
-            break;
-        case 1:
-            f(static_cast<short*>(nullptr));
-            break;
-        case 2:
-        case 3:
-            f(static_cast<int*>(nullptr));
-            break;
-        case 4:
-            f(static_cast<unsigned char*>(nullptr));
-            break;
-        case 5:
-            f(static_cast<unsigned short*>(nullptr));
-            break;
-        default:
-            f(static_cast<unsigned int*>(nullptr));
-            break;
-    }
-}
-
 template <class T>
 void printList(const staticList<T>* l, std::ostream* os) {
     l->toStream(os);
@@ -46,12 +19,12 @@ unsigned int putRun(Msg* m, unsigned int off, unsigned int t, const void* base, 
         return off;
     }
     const unsigned char* p = static_cast<const unsigned char*>(base);
-    unsigned int w = codeWidth(t);
-    unsigned int chunk = n % 255 == 0 ? 255 : n % 255;
-    off = putField(m, off, (t << 19) | ((chunk - 1) << 11), p);
+    unsigned int w = wire::width(t);
+    unsigned int chunk = n % MaxChunk == 0 ? MaxChunk : n % MaxChunk;
+    off = putField(m, off, wire::pack(t, chunk), p);
     p += chunk * w;
-    for (unsigned int done = chunk; done < n; done += 255, p += 255 * w) {
-        off = putField(m, off, (t << 19) + 0x7F000, p);
+    for (unsigned int done = chunk; done < n; done += MaxChunk, p += MaxChunk * w) {
+        off = putField(m, off, wire::pack(t, MaxChunk), p);
     }
     return off;
 }
@@ -61,12 +34,12 @@ unsigned int getRun(Msg* m, unsigned int off, unsigned int t, void* base, unsign
         return off;
     }
     unsigned char* p = static_cast<unsigned char*>(base);
-    unsigned int w = codeWidth(t);
-    unsigned int chunk = n % 255 == 0 ? 255 : n % 255;
-    off = getField(m, off, (t << 19) | ((chunk - 1) << 11), p);
+    unsigned int w = wire::width(t);
+    unsigned int chunk = n % MaxChunk == 0 ? MaxChunk : n % MaxChunk;
+    off = getField(m, off, wire::pack(t, chunk), p);
     p += chunk * w;
-    for (unsigned int done = chunk; done < n; done += 255, p += 255 * w) {
-        off = getField(m, off, (t << 19) + 0x7F000, p);
+    for (unsigned int done = chunk; done < n; done += MaxChunk, p += MaxChunk * w) {
+        off = getField(m, off, wire::pack(t, MaxChunk), p);
     }
     return off;
 }
@@ -75,17 +48,17 @@ unsigned int write(unsigned int desc, ValueWord word, Msg* m, unsigned int off) 
     unsigned int t = typeOf(desc);
     unsigned int n = countOf(desc);
     if (n == 1) {
-        unsigned int w = codeWidth(t);
+        unsigned int w = wire::width(t);
         unsigned char b = static_cast<unsigned char>(word);
         unsigned short h = static_cast<unsigned short>(word);
         unsigned int v = static_cast<unsigned int>(word);
         const void* p = w == 1   ? static_cast<const void*>(&b)
                         : w == 2 ? static_cast<const void*>(&h)
                                  : static_cast<const void*>(&v);
-        return putField(m, off, t << 19, p);
+        return putField(m, off, wire::pack(t), p);
     }
     unsigned int result = off;
-    withElement(t, [&](auto* tag) {
+    wire::withCType(t, [&](auto* tag) {
         using E = std::remove_pointer_t<decltype(tag)>;
         auto* l = reinterpret_cast<staticList<E>*>(word);
         if (l == nullptr) {
@@ -107,18 +80,18 @@ unsigned int read(unsigned int desc, ValueWord* word, Owned& owned, Msg* m, unsi
     unsigned int t = typeOf(desc);
     unsigned int n = countOf(desc);
     if (n == 1) {
-        unsigned int w = codeWidth(t);
+        unsigned int w = wire::width(t);
         unsigned char b = 0;
         unsigned short h = 0;
         unsigned int v = 0;
         void* p = w == 1   ? static_cast<void*>(&b)
                   : w == 2 ? static_cast<void*>(&h)
                            : static_cast<void*>(&v);
-        off = getField(m, off, t << 19, p);
+        off = getField(m, off, wire::pack(t), p);
         *word = w == 1 ? b : w == 2 ? h : v;
         return off;
     }
-    withElement(t, [&](auto* tag) {
+    wire::withCType(t, [&](auto* tag) {
         using E = std::remove_pointer_t<decltype(tag)>;
         auto* l = new staticList<E>();
         owned.adopt(word, l);
@@ -138,7 +111,7 @@ void print(unsigned int desc, ValueWord word, std::ostream* os) {
         *os << "NULL";
         return;
     }
-    withElement(typeOf(desc), [&](auto* tag) {
+    wire::withCType(typeOf(desc), [&](auto* tag) {
         using E = std::remove_pointer_t<decltype(tag)>;
         printList(reinterpret_cast<const staticList<E>*>(word), os);
     });
@@ -150,7 +123,7 @@ void copy(unsigned int desc, ValueWord* dst, ValueWord src, Owned& owned) {
         *dst = src;
         return;
     }
-    withElement(typeOf(desc), [&](auto* tag) {
+    wire::withCType(typeOf(desc), [&](auto* tag) {
         using E = std::remove_pointer_t<decltype(tag)>;
         auto* l = new staticList<E>(*reinterpret_cast<const staticList<E>*>(src));
         owned.adopt(dst, l);

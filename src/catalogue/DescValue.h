@@ -10,18 +10,12 @@
 
 namespace tolk::cat::dcv {
 
-constexpr unsigned int typeOf(unsigned int desc) {
-    return (desc & 0xF80000u) >> 19;
-}
-constexpr unsigned int countOf(unsigned int desc) {
-    return ((desc & 0x7F800u) >> 11) + 1;
-}
-constexpr bool isList(unsigned int desc) {
-    return (desc & 0x7F800u) != 0;
-}
+using wire::countOf;
+using wire::isList;
+using wire::typeOf;
 // Bytes that the value takes on the wire.
 constexpr unsigned int wireSize(unsigned int desc) {
-    return countOf(desc) * codeWidth(typeOf(desc));
+    return wire::bytesOf(desc);
 }
 
 // Moves `n` elements at `base` in chunks of at most 255, never as a body's first field.

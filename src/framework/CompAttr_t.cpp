@@ -9,13 +9,13 @@ void CompAttr_t::toStream(std::ostream* os) const {
 }
 
 unsigned int CompAttr_t::writeMsg(Msg* msg, unsigned int offset) {
-    offset = putFirst(msg, offset, 0x380000, &key);
-    return putField(msg, offset, 0x180000, &value);
+    offset = putFirst(msg, offset, wire::pack(wire::U32), &key);
+    return putField(msg, offset, wire::pack(wire::I32), &value);
 }
 
 unsigned int CompAttr_t::readMsg(Msg* msg, unsigned int offset) {
-    offset = getFirst(msg, offset, 0x380000, &key);
-    return getField(msg, offset, 0x180000, &value);
+    offset = getFirst(msg, offset, wire::pack(wire::U32), &key);
+    return getField(msg, offset, wire::pack(wire::I32), &value);
 }
 
 }  // namespace tolk

@@ -5,8 +5,8 @@
 namespace tolk {
 
 namespace {
-constexpr unsigned int U16 = 0x280000;
-constexpr unsigned int U8 = 0x200000;
+constexpr unsigned int U16 = wire::pack(wire::U16);
+constexpr unsigned int U8 = wire::pack(wire::U8);
 }  // namespace
 
 CompDesc_t::CompDesc_t(const TKCompDesc& d)

@@ -24,7 +24,7 @@ void* fnWord(EvtCallback::BodyFn f) {
 // The group is the first word of every event body.
 unsigned int readGroup(Msg* msg) {
     unsigned int group = 0;
-    getFirst(msg, 0, 0x380000, &group);
+    getFirst(msg, 0, wire::pack(wire::U32), &group);
     return group;
 }
 

@@ -2,24 +2,10 @@
 
 namespace tolk {
 
-unsigned int descWidth(unsigned int desc) {
-    switch (descTypeCode(desc)) {
-        case 0:
-        case 4:
-        case 10:
-            return 1;
-        case 1:
-        case 5:
-            return 2;
-        default:
-            return 4;
-    }
-}
-
 unsigned int putFirst(Msg* m, unsigned int off, unsigned int desc, const void* p) {
     tkMsgVarFieldPut(m->getMsgRef(), 1, &off, desc, p);
     if (off == 0) {
-        off = descWidth(desc) * descCount(desc);
+        off = wire::bytesOf(desc);
     }
     return off;
 }
@@ -27,7 +13,7 @@ unsigned int putFirst(Msg* m, unsigned int off, unsigned int desc, const void* p
 unsigned int getFirst(Msg* m, unsigned int off, unsigned int desc, void* p) {
     tkMsgVarFieldGet(m->getMsgRef(), 1, &off, desc, p);
     if (off == 0) {
-        off = descWidth(desc) * descCount(desc);
+        off = wire::bytesOf(desc);
     }
     return off;
 }

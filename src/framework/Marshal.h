@@ -4,6 +4,7 @@
 // (the library may hand an offset of 0 back unadvanced), lists in chunks of at most 255
 // elements, trailing lists sized by what is left of the message.
 
+#include "catalogue/generated/wire.h"
 #include "framework/Exception.h"
 #include "framework/Msg.h"
 #include "framework/staticList.h"
@@ -11,20 +12,13 @@
 
 namespace tolk {
 
-inline constexpr unsigned int MaxChunk = 255;
+// A run moves in chunks of at most this many elements, one short of what a descriptor counts.
+inline constexpr unsigned int MaxChunk = wire::kMaxCount - 1;
 
-inline constexpr unsigned int descTypeCode(unsigned int desc) {
-    return (desc & 0xF80000u) >> 19;
+// Element width in bytes of a descriptor's type code.
+inline constexpr unsigned int descWidth(unsigned int desc) {
+    return wire::width(wire::typeOf(desc));
 }
-inline constexpr unsigned int descCount(unsigned int desc) {
-    return ((desc & 0x7F800u) >> 11) + 1;
-}
-inline constexpr unsigned int makeDesc(unsigned int typeCode, unsigned int count) {
-    return ((typeCode & 0x1Fu) << 19) | (((count - 1) & 0xFFu) << 11);
-}
-
-// Element width in bytes of a descriptor's type code; unknown codes are 32 bits wide.
-unsigned int descWidth(unsigned int desc);
 
 // A body's first field: moved alone, and if the offset is still 0 afterwards its width in bytes
 // (element width times count) is added.
@@ -57,7 +51,7 @@ namespace detail {
 // the type code would let it run past the list's array.
 template <class T>
 void checkElementWidth(unsigned int typeCode) {
-    if (sizeof(T) != descWidth(typeCode << 19)) {
+    if (sizeof(T) != wire::width(typeCode)) {
         throw Exception("tolk::Marshal: list element type does not match its field type code");
     }
 }
@@ -65,7 +59,7 @@ void checkElementWidth(unsigned int typeCode) {
 // One descriptor counts 1 to 256 elements; a larger fixed array would be cut short by the
 // descriptor while the caller sized its list and GetByteSize for all of it.
 inline void checkFixedCount(unsigned int n) {
-    if (n > MaxChunk + 1) {
+    if (n > wire::kMaxCount) {
         throw Exception("tolk::Marshal: a fixed array holds at most 256 elements");
     }
 }
@@ -79,9 +73,9 @@ unsigned int moveChunks(unsigned int off, unsigned int typeCode, staticList<T>& 
     }
     checkElementWidth<T>(typeCode);
     unsigned int chunk = n % MaxChunk == 0 ? MaxChunk : n % MaxChunk;
-    off = move(off, makeDesc(typeCode, chunk), l[0], first);
+    off = move(off, wire::pack(typeCode, chunk), l[0], first);
     for (unsigned int at = chunk; at < n; at += MaxChunk) {
-        off = move(off, makeDesc(typeCode, MaxChunk), l[at], false);
+        off = move(off, wire::pack(typeCode, MaxChunk), l[at], false);
     }
     return off;
 }
@@ -124,7 +118,7 @@ unsigned int putFixed(Msg* m, unsigned int off, unsigned int typeCode, unsigned 
         l.realloc(n);
     }
     detail::checkElementWidth<T>(typeCode);
-    unsigned int desc = makeDesc(typeCode, n);
+    unsigned int desc = wire::pack(typeCode, n);
     return first ? putFirst(m, off, desc, l[0]) : putField(m, off, desc, l[0]);
 }
 template <class T>
@@ -136,7 +130,7 @@ unsigned int getFixed(Msg* m, unsigned int off, unsigned int typeCode, unsigned 
         return off;
     }
     detail::checkElementWidth<T>(typeCode);
-    unsigned int desc = makeDesc(typeCode, n);
+    unsigned int desc = wire::pack(typeCode, n);
     return first ? getFirst(m, off, desc, l[0]) : getField(m, off, desc, l[0]);
 }
 

@@ -13,11 +13,11 @@ void MsgDefault_t::toStream(std::ostream* os) const {
 }
 
 unsigned int MsgDefault_t::writeMsg(Msg* msg, unsigned int offset) {
-    return putList(msg, offset, 4, *data, true);
+    return putList(msg, offset, wire::U8, *data, true);
 }
 
 unsigned int MsgDefault_t::readMsg(Msg* msg, unsigned int offset) {
-    return getList(msg, offset, 4, *data, remaining(msg, offset), true);
+    return getList(msg, offset, wire::U8, *data, remaining(msg, offset), true);
 }
 
 }  // namespace tolk

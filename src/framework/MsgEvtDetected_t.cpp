@@ -9,13 +9,13 @@ void MsgEvtDetected_t::toStream(std::ostream* os) const {
 }
 
 unsigned int MsgEvtDetected_t::writeMsg(Msg* msg, unsigned int offset) {
-    offset = putFirst(msg, offset, 0x380000, &EvtGroup);
-    return putList(msg, offset, 4, Data, false);
+    offset = putFirst(msg, offset, wire::pack(wire::U32), &EvtGroup);
+    return putList(msg, offset, wire::U8, Data, false);
 }
 
 unsigned int MsgEvtDetected_t::readMsg(Msg* msg, unsigned int offset) {
-    offset = getFirst(msg, offset, 0x380000, &EvtGroup);
-    return getList(msg, offset, 4, Data, remaining(msg, offset), false);
+    offset = getFirst(msg, offset, wire::pack(wire::U32), &EvtGroup);
+    return getList(msg, offset, wire::U8, Data, remaining(msg, offset), false);
 }
 
 }  // namespace tolk

@@ -16,7 +16,7 @@ struct SignalList {
 
     static unsigned int number(const BodyDesc& d, void* const* refs, unsigned int f) {
         const void* p = refs[f];
-        switch (codeWidth(d.fields[f].typeCode)) {
+        switch (wire::width(d.fields[f].typeCode)) {
             case 1:
                 return *static_cast<const unsigned char*>(p);
             case 2:
@@ -33,9 +33,9 @@ struct SignalList {
     template <class F>
     static void with(const BodyDesc& d, void* const* refs, unsigned int idx, ValueWord w, F&& f) {
         if (chars(d, refs, idx)) {
-            f(reinterpret_cast<Chars*>(w), 10u);
+            f(reinterpret_cast<Chars*>(w), wire::CHAR);
         } else {
-            f(reinterpret_cast<Bytes*>(w), 4u);
+            f(reinterpret_cast<Bytes*>(w), wire::U8);
         }
     }
     static unsigned int write(const BodyDesc& d, void* const* refs, unsigned int idx, Msg* m,
@@ -58,12 +58,12 @@ struct SignalList {
             auto* l = new Chars();
             owned.adopt(w, l);
             *w = reinterpret_cast<ValueWord>(l);
-            return getList<char>(m, off, 10, *l, n, false);
+            return getList<char>(m, off, wire::CHAR, *l, n, false);
         }
         auto* l = new Bytes();
         owned.adopt(w, l);
         *w = reinterpret_cast<ValueWord>(l);
-        return getList<unsigned char>(m, off, 4, *l, n, false);
+        return getList<unsigned char>(m, off, wire::U8, *l, n, false);
     }
     static unsigned int size(const BodyDesc& d, void* const* refs, unsigned int idx) {
         ValueWord w = *static_cast<ValueWord*>(refs[idx]);

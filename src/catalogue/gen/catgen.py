@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
 """catgen: writes the body classes of the component catalogue from the schema files.
 
-Usage: catgen.py OUTDIR SCHEMA...
+Usage: catgen.py OUTDIR --wire WIRE_SCHEMA SCHEMA...
 
 A schema is line based. '#' starts a comment. Lines:
 
@@ -40,24 +40,34 @@ import luagen
 
 FORMAT_VERSION = 3
 
-SCALARS = {
-    "u8": ("unsigned char", 4),
-    "u16": ("unsigned short", 5),
-    "u32": ("unsigned int", 7),
-    "word32": ("unsigned int", 6),
-    "i32": ("int", 3),
-}
-RUNS = {
-    "u8": ("unsigned char", 4),
-    "u16": ("unsigned short", 5),
-    "u32": ("unsigned int", 7),
-    "char": ("char", 10),
-}
+# Filled from the wire schema before any body schema is read: the numbers and widths of the
+# element types live there, not here.
+SCALARS = {}  # schema word -> (C type, code name)
+RUNS = {}
 FRAMEWORK_ELEMS = {"CompDesc_t": 6, "CompAttr_t": 8}
 
 
-def width(code):
-    return 1 if code in (0, 4, 10) else 2 if code in (1, 5) else 4
+class Wire:
+    """The element types and the descriptor layout read from the wire schema."""
+
+    def __init__(self):
+        self.types = []  # (name, code, width, ctype)
+        self.other = None  # (width, ctype)
+        self.bits = {}  # part -> (shift, bits)
+        self.schema = None
+
+    def code(self, name):
+        return next(t[1] for t in self.types if t[0] == name)
+
+    def width(self, name):
+        return next((t[2] for t in self.types if t[0] == name), self.other[0])
+
+
+WIRE = Wire()
+
+
+def width(name):
+    return WIRE.width(name)
 
 
 class SchemaError(Exception):
@@ -71,7 +81,8 @@ class FieldSpec:
         self.where = where
         self.kind = None
         self.ctype = None
-        self.code = 0
+        self.code = 0  # element type code, as a number (the dissector's) and by name (C++'s)
+        self.code_name = None
         self.fixed = 0
         self.ref_name = None
         self.elem = None
@@ -81,7 +92,7 @@ class FieldSpec:
         t = self.text
         m = re.fullmatch(r"(\w+)\[(\w*)\]", t)
         if t in SCALARS:
-            self.kind, (self.ctype, self.code) = "Scalar", SCALARS[t]
+            self.kind, (self.ctype, self.code_name) = "Scalar", SCALARS[t]
         elif t == "CompDesc_t":
             self.kind, self.ctype = "Contained", "CompDesc_t"
         elif t.startswith("dcv(") and t.endswith(")"):
@@ -96,10 +107,10 @@ class FieldSpec:
             base, arg = m.group(1), m.group(2)
             if base in RUNS:
                 self.ctype = f"staticList<{RUNS[base][0]}>"
-                self.code = RUNS[base][1]
+                self.code_name = RUNS[base][1]
                 if arg.isdigit():
                     self.kind, self.fixed = "Fixed", int(arg)
-                    if base not in ("char", "u8") or not 1 <= self.fixed <= 256:
+                    if width(self.code_name) != 1 or not 1 <= self.fixed <= 256:
                         raise SchemaError(f"{self.where}: bad fixed run {t}")
                 elif arg == "":
                     self.kind = "TrailingList"
@@ -115,6 +126,8 @@ class FieldSpec:
                     self.ref_name = arg
         else:
             raise SchemaError(f"{self.where}: unknown field type {t}")
+        if self.code_name is not None:
+            self.code = WIRE.code(self.code_name)
         self.ref = -1
         if self.ref_name is not None:
             names = [f.label for f in body.fields]
@@ -128,13 +141,13 @@ class FieldSpec:
         if self.kind not in ("CountedList", "TrailingList"):
             return "nullptr"
         if self.elem is None:
-            return f"&cat::ScalarList<{self.ctype[11:-1]}, {self.code}>::ops"
+            return f"&cat::ScalarList<{self.ctype[11:-1]}, wire::{self.code_name}>::ops"
         q = self.elem if self.elem in FRAMEWORK_ELEMS else f"{outer_q}::{self.elem}"
         return f"&cat::BodyList<{q}>::ops"
 
     def min_wire(self):
         if self.kind == "Scalar":
-            return width(self.code)
+            return width(self.code_name)
         if self.kind == "Contained":
             return 6
         if self.kind == "Fixed":
@@ -254,6 +267,126 @@ def parse(path):
     return classes
 
 
+def parse_wire(path):
+    """Reads the wire schema into WIRE, SCALARS and RUNS."""
+    import shlex
+
+    WIRE.schema = os.path.basename(path)
+    for lineno, raw in enumerate(open(path, encoding="utf-8"), 1):
+        where = f"{WIRE.schema}:{lineno}"
+        tok = shlex.split(raw.split("#", 1)[0])
+        if not tok:
+            continue
+        try:
+            if tok[0] == "type":
+                name, code, w, ctype, word, flags = tok[1], int(tok[2]), int(tok[3]), tok[4], None, []
+                if len(tok) > 5:
+                    word, flags = tok[5], tok[6:]
+                if any(t[0] == name or t[1] == code for t in WIRE.types):
+                    raise SchemaError(f"{where}: type {name} or code {code} twice")
+                WIRE.types.append((name, code, w, ctype))
+                if "scalar" in flags:
+                    SCALARS[word] = (ctype, name)
+                if "run" in flags:
+                    RUNS[word] = (ctype, name)
+            elif tok[0] == "other":
+                WIRE.other = (int(tok[1]), tok[2])
+            elif tok[0] == "bits":
+                WIRE.bits[tok[1]] = (int(tok[2]), int(tok[3]))
+            else:
+                raise SchemaError(f"{where}: cannot read '{raw.strip()}'")
+        except (IndexError, ValueError):
+            raise SchemaError(f"{where}: cannot read '{raw.strip()}'") from None
+    if WIRE.other is None or set(WIRE.bits) != {"type", "count"}:
+        raise SchemaError(f"{WIRE.schema}: needs an 'other' line and the bits of type and count")
+
+
+def wire_header():
+    tshift, tbits = WIRE.bits["type"]
+    cshift, cbits = WIRE.bits["count"]
+    ncodes = 1 << tbits
+    widths = [WIRE.other[0]] * ncodes
+    for _, code, w, _ in WIRE.types:
+        widths[code] = w
+    out = [
+        f"// generated from {WIRE.schema} by catgen.py; do not edit",
+        "#pragma once",
+        "",
+        "// Element types of a field descriptor and the layout of the descriptor word: the one place",
+        "// that the build knows their numbers and widths.",
+        "",
+        "namespace tolk::wire {",
+        "",
+        "enum TypeCode : unsigned int {",
+    ]
+    out += [f"    {n} = {c},  // {w} byte(s), {ct}" for n, c, w, ct in WIRE.types]
+    out += [
+        "};",
+        "",
+        f"inline constexpr unsigned int kTypeShift = {tshift};",
+        f"inline constexpr unsigned int kTypeMask = 0x{((1 << tbits) - 1) << tshift:X};",
+        f"inline constexpr unsigned int kCountShift = {cshift};",
+        f"inline constexpr unsigned int kCountMask = 0x{((1 << cbits) - 1) << cshift:X};",
+        "// Elements that one descriptor can count.",
+        f"inline constexpr unsigned int kMaxCount = {1 << cbits};",
+        "",
+        f"// Element width in bytes of every type code; a code not named above counts {WIRE.other[0]}.",
+        f"inline constexpr unsigned char kWidth[{ncodes}] = {{{', '.join(map(str, widths))}}};",
+        "",
+        "constexpr unsigned int width(unsigned int code) {",
+        f"    return code < {ncodes} ? kWidth[code] : {WIRE.other[0]};",
+        "}",
+        "",
+        "// The descriptor of `count` elements (1 to kMaxCount) of a type.",
+        "constexpr unsigned int pack(unsigned int code, unsigned int count = 1) {",
+        "    return ((code << kTypeShift) & kTypeMask) | (((count - 1) << kCountShift) & kCountMask);",
+        "}",
+        "constexpr unsigned int typeOf(unsigned int desc) {",
+        "    return (desc & kTypeMask) >> kTypeShift;",
+        "}",
+        "constexpr unsigned int countOf(unsigned int desc) {",
+        "    return ((desc & kCountMask) >> kCountShift) + 1;",
+        "}",
+        "// More than one element: the value is a list, not a number.",
+        "constexpr bool isList(unsigned int desc) {",
+        "    return (desc & kCountMask) != 0;",
+        "}",
+        "// Bytes that the elements of a descriptor take in a body.",
+        "constexpr unsigned int bytesOf(unsigned int desc) {",
+        "    return width(typeOf(desc)) * countOf(desc);",
+        "}",
+        "",
+        "// The host type of an element of each type code.",
+        "template <TypeCode C>",
+        "struct CType {",
+        f"    using type = {WIRE.other[1]};",
+        "};",
+    ]
+    for n, _, _, ct in WIRE.types:
+        if ct != WIRE.other[1]:
+            out += ["template <>", f"struct CType<{n}> {{", f"    using type = {ct};", "};"]
+    out += [
+        "",
+        "// Calls f with a null pointer of the host element type of a type code.",
+        "template <class F>",
+        "void withCType(unsigned int code, F&& f) {",
+        "    switch (code) {",
+    ]
+    for n, c, _, ct in WIRE.types:
+        if ct != WIRE.other[1]:
+            out += [f"        case {c}:", f"            return f(static_cast<{ct}*>(nullptr));"]
+    out += [
+        "        default:",
+        f"            return f(static_cast<{WIRE.other[1]}*>(nullptr));",
+        "    }",
+        "}",
+        "",
+        "}  // namespace tolk::wire",
+        "",
+    ]
+    return "\n".join(out)
+
+
 def snake(name):
     return re.sub(r"(?<!^)(?=[A-Z])", "_", name).lower()
 
@@ -358,7 +491,7 @@ def emit_defs(b, q, tables):
         if f.kind == "Custom":
             custom = f"&cat::{f.custom}<{q}>::ops"
         rows.append(
-            f'    {{"{f.label}", cat::Kind::{f.kind}, {f.code}, {f.fixed}, {f.ref}, '
+            f'    {{"{f.label}", cat::Kind::{f.kind}, {"wire::" + f.code_name if f.code_name else "{}"}, {f.fixed}, {f.ref}, '
             f"{f.list_ops(q)}, {custom}}},"
         )
     number = b.number if b.role != "elem" else 0
@@ -571,6 +704,10 @@ def main(argv):
     os.makedirs(outdir, exist_ok=True)
     classes = []
     try:
+        if argv[2] != "--wire" or len(argv) < 5:
+            raise SchemaError("the wire schema comes first: --wire WIRE_SCHEMA")
+        parse_wire(argv[3])
+        argv = argv[:2] + argv[4:]
         for path in argv[2:]:
             classes.extend(parse(path))
     except SchemaError as e:
@@ -583,6 +720,7 @@ def main(argv):
         write_if_changed(os.path.join(outdir, hname), header(c))
         write_if_changed(os.path.join(outdir, hname[:-2] + ".cpp"), source(c, hname))
     write_if_changed(os.path.join(outdir, "values.h"), values_header(classes))
+    write_if_changed(os.path.join(outdir, "wire.h"), wire_header())
     ih, isrc = index_files(classes, headers)
     write_if_changed(os.path.join(outdir, "index.h"), ih)
     write_if_changed(os.path.join(outdir, "index.cpp"), isrc)

@@ -74,7 +74,7 @@ struct ErrorData {
         if (isRecord(errorMsg(d, refs, idx))) {
             return reinterpret_cast<MsgBody*>(w)->writeMsg(m, off);
         }
-        return putList<unsigned int>(m, off, 7, *reinterpret_cast<Words*>(w), false);
+        return putList<unsigned int>(m, off, wire::U32, *reinterpret_cast<Words*>(w), false);
     }
     static unsigned int read(const BodyDesc& d, void* const* refs, unsigned int idx, Owned& owned,
                              Msg* m, unsigned int off, bool) {
@@ -90,7 +90,7 @@ struct ErrorData {
         auto* l = new Words();
         owned.adopt(w, l);
         *w = reinterpret_cast<ValueWord>(l);
-        return getList<unsigned int>(m, off, 7, *l, bytesLeft(m, off) / 4, false);
+        return getList<unsigned int>(m, off, wire::U32, *l, bytesLeft(m, off) / 4, false);
     }
     static unsigned int size(const BodyDesc& d, void* const* refs, unsigned int idx) {
         ValueWord w = word(refs, idx);

@@ -45,19 +45,21 @@ class CallInfoRecord : public MsgBody {
     ~CallInfoRecord() override = default;
 
     unsigned int writeMsg(Msg* m, unsigned int off) override {
-        off = putFirst(m, off, 0x380000, &InfoId);
-        off = putGroup(m, off, 0x200000u, &State, 0x300000u, &Type, 0x280000u, &Length);
+        off = putFirst(m, off, wire::pack(wire::U32), &InfoId);
+        off = putGroup(m, off, wire::pack(wire::U8), &State, wire::pack(wire::WORD32), &Type,
+                       wire::pack(wire::U16), &Length);
         if (isTextInfoId(InfoId)) {
             if (Value != 0) {
-                off = putList<char>(m, off, 10, *reinterpret_cast<Text*>(Value), false);
+                off = putList<char>(m, off, wire::CHAR, *reinterpret_cast<Text*>(Value), false);
             }
             return off;
         }
         return dcv::write(Type, Value, m, off);
     }
     unsigned int readMsg(Msg* m, unsigned int off) override {
-        off = getFirst(m, off, 0x380000, &InfoId);
-        off = getGroup(m, off, 0x200000u, &State, 0x300000u, &Type, 0x280000u, &Length);
+        off = getFirst(m, off, wire::pack(wire::U32), &InfoId);
+        off = getGroup(m, off, wire::pack(wire::U8), &State, wire::pack(wire::WORD32), &Type,
+                       wire::pack(wire::U16), &Length);
         if (!isTextInfoId(InfoId)) {
             return dcv::read(Type, &Value, owned_, m, off);
         }
@@ -65,7 +67,7 @@ class CallInfoRecord : public MsgBody {
         auto* t = new Text();
         owned_.adopt(&Value, t);
         Value = reinterpret_cast<ValueWord>(t);
-        return getList<char>(m, off, 10, *t, capCount(m, off, Length, 1), false);
+        return getList<char>(m, off, wire::CHAR, *t, capCount(m, off, Length, 1), false);
     }
     // For a shaped value this counts four bytes an element whatever the element width: a
     // sender's buffer is then a little larger than the data, as the boards have always had it.

@@ -26,7 +26,7 @@ inline bool isTextCallInfoType(unsigned int type) {
 template <class Outer>
 struct CallInfoEvtValue {
     using Text = staticList<char>;
-    static constexpr unsigned int kTextDesc = 0x53F800;
+    static constexpr unsigned int kTextDesc = wire::pack(wire::CHAR, 128);
 
     static bool text(const BodyDesc& d, void* const* refs, unsigned int idx) {
         return isTextCallInfoType(*static_cast<const unsigned int*>(refs[d.fields[idx].ref]));
@@ -36,7 +36,7 @@ struct CallInfoEvtValue {
         ValueWord w = *static_cast<ValueWord*>(refs[idx]);
         if (!text(d, refs, idx)) {
             unsigned int v = static_cast<unsigned int>(w);
-            return putField(m, off, 0x380000, &v);
+            return putField(m, off, wire::pack(wire::U32), &v);
         }
         Text zeros;
         Text& t = w == 0 ? zeros : *reinterpret_cast<Text*>(w);
@@ -51,7 +51,7 @@ struct CallInfoEvtValue {
         owned.release(w);
         if (!text(d, refs, idx)) {
             unsigned int v = 0;
-            off = getField(m, off, 0x380000, &v);
+            off = getField(m, off, wire::pack(wire::U32), &v);
             *w = v;
             return off;
         }

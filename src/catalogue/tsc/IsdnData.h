@@ -30,16 +30,16 @@ class IsdnDataRecord : public MsgBody {
     ~IsdnDataRecord() override = default;
 
     unsigned int writeMsg(Msg* m, unsigned int off) override {
-        off = putFirst(m, off, 0x200000, &IEId);
+        off = putFirst(m, off, wire::pack(wire::U8), &IEId);
         if (isSingleOctetIE(IEId)) {
             return off;
         }
         unsigned char len = static_cast<unsigned char>(Length);
-        off = putField(m, off, 0x200000, &len);
-        return Value == 0 ? off : putList<unsigned char>(m, off, 4, *bytes(Value), false);
+        off = putField(m, off, wire::pack(wire::U8), &len);
+        return Value == 0 ? off : putList<unsigned char>(m, off, wire::U8, *bytes(Value), false);
     }
     unsigned int readMsg(Msg* m, unsigned int off) override {
-        off = getFirst(m, off, 0x200000, &IEId);
+        off = getFirst(m, off, wire::pack(wire::U8), &IEId);
         owned_.clear();
         if (isSingleOctetIE(IEId)) {
             adopt(&Length, new Bytes());
@@ -47,11 +47,11 @@ class IsdnDataRecord : public MsgBody {
             return off;
         }
         unsigned char len = 0;
-        off = getField(m, off, 0x200000, &len);
+        off = getField(m, off, wire::pack(wire::U8), &len);
         Length = len;
         auto* v = new Bytes();
         adopt(&Value, v);
-        return getList<unsigned char>(m, off, 4, *v, capCount(m, off, len, 1), false);
+        return getList<unsigned char>(m, off, wire::U8, *v, capCount(m, off, len, 1), false);
     }
     unsigned int GetByteSize() override {
         if (isSingleOctetIE(IEId)) {

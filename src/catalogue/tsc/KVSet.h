@@ -32,13 +32,13 @@ class KVSetRecord : public MsgBody {
 
         bool isTerminator() const { return Id == 0 && Type == 0; }
         unsigned int writeMsg(Msg* m, unsigned int off) override {
-            off = putFirst(m, off, 0x380000, &Id);
-            off = putField(m, off, 0x300000, &Type);
+            off = putFirst(m, off, wire::pack(wire::U32), &Id);
+            off = putField(m, off, wire::pack(wire::WORD32), &Type);
             return Id == 0 ? off : dcv::write(Type, Value, m, off);
         }
         unsigned int readMsg(Msg* m, unsigned int off) override {
-            off = getFirst(m, off, 0x380000, &Id);
-            off = getField(m, off, 0x300000, &Type);
+            off = getFirst(m, off, wire::pack(wire::U32), &Id);
+            off = getField(m, off, wire::pack(wire::WORD32), &Type);
             if (Id == 0) {
                 owned_.release(&Value);
                 return off;
@@ -80,8 +80,8 @@ class KVSetRecord : public MsgBody {
     ~KVSetRecord() override = default;
 
     unsigned int writeMsg(Msg* m, unsigned int off) override {
-        off = putFirst(m, off, 0x380000, &Key);
-        off = putField(m, off, 0x380000, &ByteLength);
+        off = putFirst(m, off, wire::pack(wire::U32), &Key);
+        off = putField(m, off, wire::pack(wire::U32), &ByteLength);
         if (Key == wire::TSC::KVKey::RECORDS) {
             // A missing list is an empty one: the receiver still needs the terminator to
             // know where the list ends.
@@ -105,12 +105,12 @@ class KVSetRecord : public MsgBody {
         if (Key == wire::TSC::KVKey::CALL_INFO) {
             return reinterpret_cast<Value_Key_0x1202_t*>(Value)->writeMsg(m, off);
         }
-        return putList<unsigned char>(m, off, 4, *reinterpret_cast<Bytes*>(Value), false);
+        return putList<unsigned char>(m, off, wire::U8, *reinterpret_cast<Bytes*>(Value), false);
     }
 
     unsigned int readMsg(Msg* m, unsigned int off) override {
-        off = getFirst(m, off, 0x380000, &Key);
-        off = getField(m, off, 0x380000, &ByteLength);
+        off = getFirst(m, off, wire::pack(wire::U32), &Key);
+        off = getField(m, off, wire::pack(wire::U32), &ByteLength);
         owned_.release(&Value);
         if (Key == wire::TSC::KVKey::CALL_INFO) {
             auto* v = new Value_Key_0x1202_t();
@@ -140,7 +140,7 @@ class KVSetRecord : public MsgBody {
         auto* b = new Bytes();
         adopt(b);
         unsigned int n = Key == 0 ? 0 : capCount(m, off, ByteLength, 1);
-        return getList<unsigned char>(m, off, 4, *b, n, false);
+        return getList<unsigned char>(m, off, wire::U8, *b, n, false);
     }
 
     unsigned int GetByteSize() override {

@@ -3,27 +3,12 @@
 #include <cstdint>
 #include <cstring>
 
+#include "catalogue/generated/wire.h"
 #include "platform/tkhost/tkhost.h"
 
 namespace {
 
-unsigned int elementWidth(unsigned int desc) {
-    switch ((desc >> 19) & 0x1F) {
-        case 0:
-        case 4:
-        case 10:
-            return 1;
-        case 1:
-        case 5:
-            return 2;
-        default:
-            return 4;
-    }
-}
-
-unsigned int elementCount(unsigned int desc) {
-    return ((desc >> 11) & 0xFF) + 1;
-}
+namespace wire = tolk::wire;
 
 void putElement(unsigned char* dst, const unsigned char* src, unsigned int width) {
     switch (width) {
@@ -94,7 +79,7 @@ TKStatus tkMsgVarFieldPut(TKMsg32Bit* msg, int fieldCount, unsigned int* offset,
     for (int i = 0; i < fieldCount; ++i) {
         unsigned int desc = va_arg(check, unsigned int);
         void* ptr = va_arg(check, void*);
-        at += std::uint64_t(elementWidth(desc)) * elementCount(desc);
+        at += std::uint64_t(wire::width(wire::typeOf(desc))) * wire::countOf(desc);
         if (ptr == nullptr || at > msg->size) {
             fits = false;
             break;
@@ -110,8 +95,8 @@ TKStatus tkMsgVarFieldPut(TKMsg32Bit* msg, int fieldCount, unsigned int* offset,
     for (int i = 0; i < fieldCount; ++i) {
         unsigned int desc = va_arg(args, unsigned int);
         auto* src = static_cast<const unsigned char*>(va_arg(args, void*));
-        unsigned int width = elementWidth(desc);
-        unsigned int count = elementCount(desc);
+        unsigned int width = wire::width(wire::typeOf(desc));
+        unsigned int count = wire::countOf(desc);
         for (unsigned int k = 0; k < count; ++k) {
             putElement(body + at, src + std::size_t(k) * width, width);
             at += width;
@@ -136,8 +121,8 @@ TKStatus tkMsgVarFieldGet(TKMsg32Bit* msg, int fieldCount, unsigned int* offset,
     for (int i = 0; i < fieldCount; ++i) {
         unsigned int desc = va_arg(args, unsigned int);
         auto* dst = static_cast<unsigned char*>(va_arg(args, void*));
-        unsigned int width = elementWidth(desc);
-        unsigned int count = elementCount(desc);
+        unsigned int width = wire::width(wire::typeOf(desc));
+        unsigned int count = wire::countOf(desc);
         if (dst == nullptr) {
             status = TK_ERR_PARAM;
             at += std::uint64_t(width) * count;
