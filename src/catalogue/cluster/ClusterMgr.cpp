@@ -1,7 +1,5 @@
 #include "catalogue/cluster/ClusterMgr.h"
 
-#include "catalogue/generated/values.h"
-
 namespace tolk {
 
 namespace {
@@ -45,8 +43,8 @@ Cluster ClusterMgr::findByTSC(unsigned int trunk, unsigned int channel) {
 Cluster ClusterMgr::findByTSC(unsigned int trunk, unsigned int channel,
                               staticList<CompAttr_t> attrs) {
     append(attrs, 0, 18);
-    append(attrs, wire::TSC::Attr::TRUNK, trunk);
-    append(attrs, wire::TSC::Attr::CHANNEL, channel);
+    append(attrs, 0x1200, trunk);
+    append(attrs, 0x1201, channel);
     return find(attrs);
 }
 
@@ -56,60 +54,8 @@ Cluster ClusterMgr::findByLCON(unsigned int line) {
 
 Cluster ClusterMgr::findByLCON(unsigned int line, staticList<CompAttr_t> attrs) {
     append(attrs, 0, 22);
-    append(attrs, wire::LCON::Attr::LINE, line);
+    append(attrs, 0x1600, line);
     return find(attrs);
-}
-
-void ClusterMgr::ClusterFindInst(ClusterCompByAttr_t* body, ComponentResult_t* ret) {
-    request(ClusterCompByAttr_t::MsgType, body, ComponentResult_t::MsgType, ret, 0, 1);
-}
-
-void ClusterMgr::ClusterFindInst(CompDesc_t& ClustDesc, unsigned char& CompType,
-                                 staticList<CompAttr_t>& Attrs, ComponentResult_t* ret) {
-    ClusterFindInst(ClustDesc, CompType, Attrs, 0xFF, ret);
-}
-
-void ClusterMgr::ClusterFindInst(CompDesc_t& ClustDesc, unsigned char& CompType,
-                                 staticList<CompAttr_t>& Attrs, unsigned char Count,
-                                 ComponentResult_t* ret) {
-    ClusterCompByAttr_t body(ClustDesc, CompType, Count, Attrs);
-    request(ClusterCompByAttr_t::MsgType, &body, ComponentResult_t::MsgType, ret, 0, 1);
-}
-
-void ClusterMgr::ClusterCreate(ClusterCreate_t* body, ClusterResult_t* ret) {
-    request(ClusterCreate_t::MsgType, body, ClusterResult_t::MsgType, ret);
-}
-
-void ClusterMgr::ClusterCreate(ClusterResult_t* ret) {
-    ClusterCreate_t body;
-    request(ClusterCreate_t::MsgType, &body, ClusterResult_t::MsgType, ret);
-}
-
-void ClusterMgr::ClusterDestroy(ClusterDestroy_t* body) {
-    request(ClusterDestroy_t::MsgType, body);
-}
-
-void ClusterMgr::ClusterDestroy(CompDesc_t& ClustDesc) {
-    ClusterDestroy_t body(ClustDesc);
-    request(ClusterDestroy_t::MsgType, &body);
-}
-
-void ClusterMgr::ClusterFree(ClusterFree_t* body) {
-    request(ClusterFree_t::MsgType, body);
-}
-
-void ClusterMgr::ClusterFree(CompDesc_t& ClustDesc) {
-    ClusterFree_t body(ClustDesc);
-    request(ClusterFree_t::MsgType, &body);
-}
-
-void ClusterMgr::ClusterFindByComp(ClusterByComp_t* body, ClusterResult_t* ret) {
-    request(ClusterByComp_t::MsgType, body, ClusterResult_t::MsgType, ret);
-}
-
-void ClusterMgr::ClusterFindByComp(CompDesc_t& desc, ClusterResult_t* ret) {
-    ClusterByComp_t body(desc);
-    request(ClusterByComp_t::MsgType, &body, ClusterResult_t::MsgType, ret);
 }
 
 }  // namespace tolk

@@ -13,6 +13,7 @@ A schema is line based. '#' starts a comment. Lines:
     hand <Elem> <Template>         (indented) hand-written element: <Template><Outer>
   value <Group> <NAME> <number>    a named wire value of the class (state, alarm, reason,
                                    parameter id, ...), for every layer that must write it
+  op <Name> <Cmd> ...              an operation family of the class (see opgen.py)
 
 A field is <Label>:<type> with <type> one of
   u8 u16 u32 word32 i32            numbers
@@ -25,6 +26,7 @@ A field is <Label>:<type> with <type> one of
   @Ops(X)                          hand-written field: cat::Ops<Outer>::ops, argument field X
 
 Output (deterministic, no timestamps): <outdir>/catalogue/generated/<name>_bodies.{h,cpp}
+and <name>_ops.{h,cpp} (the operations, written by opgen.py)
 for each class, <outdir>/catalogue/generated/index.{h,cpp} listing every body,
 <outdir>/catalogue/generated/values.h with the named values as
 tolk::wire::<Class>::<Group>::<NAME> (header only: layers below the catalogue include it), and
@@ -37,6 +39,7 @@ import re
 import sys
 
 import luagen
+import opgen
 
 FORMAT_VERSION = 3
 
@@ -195,6 +198,7 @@ class Cls:
         self.includes = includes
         self.bodies = []
         self.values = []  # (group, name, number, where)
+        self.ops = []
 
 
 VALUE_NAME = re.compile(r"[A-Z][A-Z0-9_]*")
@@ -258,6 +262,8 @@ def parse(path):
             last.hands.append((tok[1], tok[2]))
         elif word == "value" and not indented:
             parse_value(cls, tok, where)
+        elif word == "op" and not indented:
+            opgen.parse_op(cls, tok, where)
         else:
             raise SchemaError(f"{where}: cannot read '{line.strip()}'")
     for c in classes:
@@ -709,8 +715,11 @@ def main(argv):
         parse_wire(argv[3])
         argv = argv[:2] + argv[4:]
         for path in argv[2:]:
-            classes.extend(parse(path))
-    except SchemaError as e:
+            for c in parse(path):
+                c.path = path
+                opgen.resolve(c)
+                classes.append(c)
+    except (SchemaError, opgen.OpError) as e:
         print(f"catgen: {e}", file=sys.stderr)
         return 1
     headers = []
@@ -721,6 +730,9 @@ def main(argv):
         write_if_changed(os.path.join(outdir, hname[:-2] + ".cpp"), source(c, hname))
     write_if_changed(os.path.join(outdir, "values.h"), values_header(classes))
     write_if_changed(os.path.join(outdir, "wire.h"), wire_header())
+        oname = f"{c.name.lower()}_ops"
+        write_if_changed(os.path.join(outdir, oname + ".h"), opgen.fragment(c))
+        write_if_changed(os.path.join(outdir, oname + ".cpp"), opgen.source(c))
     ih, isrc = index_files(classes, headers)
     write_if_changed(os.path.join(outdir, "index.h"), ih)
     write_if_changed(os.path.join(outdir, "index.cpp"), isrc)

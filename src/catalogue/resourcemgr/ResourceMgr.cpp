@@ -88,30 +88,4 @@ void ResourceMgr::unuse(StdResource* resource) {
     request(CompUnuse_t::MsgType, &body, ResultComplete_t::MsgType, nullptr);
 }
 
-void ResourceMgr::FindAllComponents(CompFindAll_t* body, CompMultipleResult_t* ret) {
-    request(CompFindAll_t::MsgType, body, CompMultipleResult_t::MsgType, ret);
-}
-
-void ResourceMgr::FindAllComponents(CompDesc_t& startDesc, CompDesc_t& endDesc,
-                                    staticList<CompAttr_t>& attrs, CompMultipleResult_t* ret) {
-    FindAllComponents(startDesc, endDesc, attrs, 0xFFFFFFFF, ret);
-}
-
-void ResourceMgr::FindAllComponents(CompDesc_t& startDesc, CompDesc_t& endDesc,
-                                    staticList<CompAttr_t>& attrs, unsigned int count,
-                                    CompMultipleResult_t* ret) {
-    CompFindAll_t body(startDesc, endDesc, count, attrs);
-    request(CompFindAll_t::MsgType, &body, CompMultipleResult_t::MsgType, ret);
-}
-
-void ResourceMgr::AttrInfo(CompAttrInfo_t* body, CompAttrInfoResult_t* ret) {
-    request(CompAttrInfo_t::MsgType, body, CompAttrInfoResult_t::MsgType, ret);
-}
-
-void ResourceMgr::AttrInfo(CompDesc_t& theInstance, unsigned int count, unsigned int attroffset,
-                           CompAttrInfoResult_t* ret) {
-    CompAttrInfo_t body(theInstance, count, attroffset);
-    request(CompAttrInfo_t::MsgType, &body, CompAttrInfoResult_t::MsgType, ret);
-}
-
 }  // namespace tolk
