@@ -728,11 +728,11 @@ def main(argv):
         headers.append(hname)
         write_if_changed(os.path.join(outdir, hname), header(c))
         write_if_changed(os.path.join(outdir, hname[:-2] + ".cpp"), source(c, hname))
-    write_if_changed(os.path.join(outdir, "values.h"), values_header(classes))
-    write_if_changed(os.path.join(outdir, "wire.h"), wire_header())
         oname = f"{c.name.lower()}_ops"
         write_if_changed(os.path.join(outdir, oname + ".h"), opgen.fragment(c))
         write_if_changed(os.path.join(outdir, oname + ".cpp"), opgen.source(c))
+    write_if_changed(os.path.join(outdir, "values.h"), values_header(classes))
+    write_if_changed(os.path.join(outdir, "wire.h"), wire_header())
     ih, isrc = index_files(classes, headers)
     write_if_changed(os.path.join(outdir, "index.h"), ih)
     write_if_changed(os.path.join(outdir, "index.cpp"), isrc)
