@@ -1,8 +1,7 @@
 // vx7sim's server: the emulation served over the relay's frame protocol on TCP. One thread runs
 // the whole loop (sockets, control lines, the emulation), so the emulation needs no lock and
 // everything happens in the order it arrived.
-#ifndef LINEPROBE_SIM_RELAYSERVER_H
-#define LINEPROBE_SIM_RELAYSERVER_H
+#pragma once
 
 #include <atomic>
 #include <chrono>
@@ -131,5 +130,3 @@ class RelayServer {
 };
 
 }  // namespace sim
-
-#endif

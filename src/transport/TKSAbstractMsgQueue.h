@@ -1,6 +1,5 @@
 // The interface of a transport under TKSMsgQueue.
-#ifndef LINEPROBE_TRANSPORT_TKSABSTRACTMSGQUEUE_H
-#define LINEPROBE_TRANSPORT_TKSABSTRACTMSGQUEUE_H
+#pragma once
 
 #include <functional>
 
@@ -29,5 +28,3 @@ class TKSAbstractMsgQueue {
 
     TKCompDesc hostDesc{};
 };
-
-#endif

@@ -1,6 +1,5 @@
 // The small TCP socket wrapper under the remote transport, and its text helpers.
-#ifndef LINEPROBE_TRANSPORT_TKSSOCK_H
-#define LINEPROBE_TRANSPORT_TKSSOCK_H
+#pragma once
 
 #include <netinet/in.h>
 
@@ -83,5 +82,3 @@ void dntoip(char* dst, const char* name);  // dst needs 16 bytes
 int stn(const char* text);
 void print_msg(const char* title, const msg_t& m);
 void byte_print_msg(const char* bytes, int n);
-
-#endif
