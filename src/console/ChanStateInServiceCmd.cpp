@@ -1,27 +1,15 @@
 #include "console/ChanStateInServiceCmd.h"
 
 #include "console/PhoneView.h"
-#include "console/PhoneViewMgr.h"
 #include "model/Phone.h"
 
 namespace lineprobe {
 
-int ChanStateInServiceCmd::Execute() {
-    return 0;
-}
-
 int ChanStateInServiceCmd::Execute(int board, int line, int chan) {
-    PhoneView* phoneView =
-        manager->FindPhoneView(static_cast<unsigned int>(board), static_cast<unsigned int>(line),
-                               static_cast<unsigned int>(chan));
-    if (phoneView != nullptr) {
-        vx7diag::Phone* phone = phoneView->GetPhone();
-        phone->SetChanState(256);
-    } else {
-        Report("ERROR - unable to find phone view");
-        RefreshView();
-    }
-    return 0;
+    return OnPhoneView(board, line, chan, [](PhoneView& view) {
+        view.GetPhone()->SetChanState(256);
+        return Silent();
+    });
 }
 
 }  // namespace lineprobe
