@@ -19,6 +19,7 @@
 #include "platform/tkhost/tkhost.h"
 #include "sim/Control.h"
 #include "sim/Emulation.h"
+#include "sim/RelayConnection.h"
 
 namespace sim {
 
@@ -65,7 +66,7 @@ class RelayServer {
     std::size_t connectionCount() const { return connectionCount_.load(); }
 
   private:
-    struct Conn;
+    using Conn = RelayConnection;
 
     void acceptAll();
     void readFrom(Conn& c);
@@ -76,6 +77,8 @@ class RelayServer {
     void sendFrame(Conn& c, std::uint32_t type, const unsigned char* body, std::uint32_t size,
                    const unsigned char* ex, std::uint32_t exSize);
     void sendBlock(Conn& c, const TKMsg32Bit* block);
+    // Closes a client that lets too much pile up, then holds all of them to their cap.
+    void checkPending(Conn& c);
     void flush(Conn& c);
     void flushAll();
     void close(Conn& c, const char* why);
