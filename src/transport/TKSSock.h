@@ -11,6 +11,10 @@
 
 class sock {
   public:
+    // What the calls below return, unless they say otherwise.
+    static constexpr int SOCK_OK = 0;
+    static constexpr int SOCK_FAILED = -1;
+
     sock(const char* name, int port);
     sock(unsigned long address, int port);
     sock(int fd, sockaddr_in& peer);
