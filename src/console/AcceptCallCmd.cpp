@@ -1,27 +1,15 @@
 #include "console/AcceptCallCmd.h"
 
 #include "console/PhoneView.h"
-#include "console/PhoneViewMgr.h"
 #include "model/Phone.h"
 
 namespace lineprobe {
 
-int AcceptCallCmd::Execute() {
-    return 0;
-}
-
 int AcceptCallCmd::Execute(int board, int line, int chan) {
-    PhoneView* phoneView =
-        manager->FindPhoneView(static_cast<unsigned int>(board), static_cast<unsigned int>(line),
-                               static_cast<unsigned int>(chan));
-    if (phoneView != nullptr) {
-        vx7diag::Phone* phone = phoneView->GetPhone();
-        phone->AcceptCall(phoneView->GetCurCallId());
-    } else {
-        Report("ERROR - unable to find phone view");
-    }
-    RefreshView();
-    return 0;
+    return OnPhoneView(board, line, chan, [](PhoneView& view) {
+        view.GetPhone()->AcceptCall(view.GetCurCallId());
+        return RefreshedOnly();
+    });
 }
 
 }  // namespace lineprobe

@@ -1,23 +1,16 @@
 #pragma once
 
-#include "console/Command.h"
+#include "console/PhoneCommand.h"
 
 namespace lineprobe {
 
-class PhoneViewMgr;
-
 // `answer`: Answers the call last shown on the channel's row (call id 0 before any).
-class AnswerCallCmd : public Command {
+class AnswerCallCmd : public PhoneCommand {
   public:
-    AnswerCallCmd(std::string name, PhoneViewMgr* manager)
-        : Command(std::move(name)), manager(manager) {}
+    using PhoneCommand::PhoneCommand;
 
     using Command::Execute;
-    int Execute() override;
     int Execute(int board, int line, int chan) override;
-
-  private:
-    PhoneViewMgr* manager;
 };
 
 }  // namespace lineprobe

@@ -1,23 +1,16 @@
 #pragma once
 
-#include "console/Command.h"
+#include "console/PhoneCommand.h"
 
 namespace lineprobe {
 
-class PhoneViewMgr;
-
 // `chan_ins`: Takes the channel into service (state 256).
-class ChanStateInServiceCmd : public Command {
+class ChanStateInServiceCmd : public PhoneCommand {
   public:
-    ChanStateInServiceCmd(std::string name, PhoneViewMgr* manager)
-        : Command(std::move(name)), manager(manager) {}
+    using PhoneCommand::PhoneCommand;
 
     using Command::Execute;
-    int Execute() override;
     int Execute(int board, int line, int chan) override;
-
-  private:
-    PhoneViewMgr* manager;
 };
 
 }  // namespace lineprobe

@@ -47,6 +47,15 @@ void Command::RefreshView() {
     }
 }
 
+void Command::Show(const Outcome& outcome) {
+    if (outcome.text != nullptr) {
+        Report(outcome.text);
+    }
+    if (outcome.refresh) {
+        RefreshView();
+    }
+}
+
 void Command::SetView(View* view) {
     if (view != nullptr) {
         view_ = view;

@@ -32,6 +32,17 @@ class Command {
     void Report(const char* text);
     void RefreshView();
 
+    // What the command window shows once a command has acted: its result text, if any, and
+    // whether the window is refreshed at all (some commands leave it to the next prompt).
+    struct Outcome {
+        const char* text;
+        bool refresh;
+    };
+    static constexpr Outcome Shown(const char* text) { return {text, true}; }
+    static constexpr Outcome RefreshedOnly() { return {nullptr, true}; }
+    static constexpr Outcome Silent() { return {nullptr, false}; }
+    void Show(const Outcome& outcome);
+
     View* view_ = nullptr;
     std::string name_;
 };

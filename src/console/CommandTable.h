@@ -1,6 +1,9 @@
 #pragma once
 
 #include <array>
+#include <cstddef>
+#include <memory>
+#include <string>
 #include <string_view>
 #include <vector>
 
@@ -8,23 +11,30 @@ namespace lineprobe {
 
 class CmdProcessor;
 class Command;
+class PhoneViewMgr;
+class TrunkViewMgr;
 
-// Every command word, in the order start-up creates the command objects.
-inline constexpr std::array<std::string_view, 23> COMMAND_CREATION_ORDER = {
-    "quit",       "help",      "phone",      "trunk",    "delphone", "makecall",
-    "answer",     "accept",    "drop",       "release",  "chan_oos", "chan_ins",
-    "trunk_ins",  "trunk_oos", "origaddr",   "destaddr", "deltrunk", "reset",
-    "disablelbk", "linelbk",   "payloadlbk", "startrai", "stoprai"};
+// What a command may be given when it is made: the managers of the views it acts on.
+struct CommandContext {
+    PhoneViewMgr* phones = nullptr;
+    TrunkViewMgr* trunks = nullptr;
+};
 
-// The order of registration: that of creation, but for delphone ahead of trunk. Lookup
-// does not depend on it; the trace of start-up does.
-inline constexpr std::array<std::string_view, 23> COMMAND_REGISTRATION_ORDER = {
-    "quit",       "help",      "phone",      "delphone", "trunk",    "makecall",
-    "answer",     "accept",    "drop",       "release",  "chan_oos", "chan_ins",
-    "trunk_ins",  "trunk_oos", "origaddr",   "destaddr", "deltrunk", "reset",
-    "disablelbk", "linelbk",   "payloadlbk", "startrai", "stoprai"};
+struct CommandEntry {
+    std::string_view word;
+    // Where the command comes in the order of registration (from 0). Lookup does not depend
+    // on it; the trace of start-up does.
+    std::size_t registration;
+    std::unique_ptr<Command> (*make)(std::string word, const CommandContext& context);
+};
 
-// Registers the given commands in the order of COMMAND_REGISTRATION_ORDER; a command
+// Every command of the prompt, in the order start-up creates them.
+extern const std::array<CommandEntry, 23> COMMAND_TABLE;
+
+// One command of each entry of COMMAND_TABLE, in its order, each under its own word.
+std::vector<std::unique_ptr<Command>> CreateCommands(const CommandContext& context);
+
+// Registers the given commands in their order of registration in COMMAND_TABLE; a command
 // whose word is not in that table comes last, in the order given. The results of
 // RegisterCommand are not looked at.
 void RegisterCommands(CmdProcessor& processor, const std::vector<Command*>& commands);

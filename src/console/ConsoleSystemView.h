@@ -2,7 +2,7 @@
 
 #include <map>
 
-#include "console/SystemView.h"
+#include "model/SystemView.h"
 
 namespace lineprobe {
 

@@ -4,10 +4,6 @@
 
 namespace lineprobe {
 
-int DeletePhoneCmd::Execute() {
-    return 0;
-}
-
 int DeletePhoneCmd::Execute(int board, int line, int chan) {
     const int result =
         manager->DestroyPhoneView(static_cast<unsigned int>(board), static_cast<unsigned int>(line),

@@ -1,23 +1,16 @@
 #pragma once
 
-#include "console/Command.h"
+#include "console/PhoneCommand.h"
 
 namespace lineprobe {
 
-class PhoneViewMgr;
-
 // `delphone`: Stops the channel's phone view and clears its row.
-class DeletePhoneCmd : public Command {
+class DeletePhoneCmd : public PhoneCommand {
   public:
-    DeletePhoneCmd(std::string name, PhoneViewMgr* manager)
-        : Command(std::move(name)), manager(manager) {}
+    using PhoneCommand::PhoneCommand;
 
     using Command::Execute;
-    int Execute() override;
     int Execute(int board, int line, int chan) override;
-
-  private:
-    PhoneViewMgr* manager;
 };
 
 }  // namespace lineprobe

@@ -4,10 +4,6 @@
 
 namespace lineprobe {
 
-int DeleteTrunkCmd::Execute() {
-    return 0;
-}
-
 int DeleteTrunkCmd::Execute(int board, int line) {
     const int result = manager->DestroyTrunkView(static_cast<unsigned int>(board),
                                                  static_cast<unsigned int>(line));

@@ -1,23 +1,16 @@
 #pragma once
 
-#include "console/Command.h"
+#include "console/TrunkCommand.h"
 
 namespace lineprobe {
 
-class TrunkViewMgr;
-
 // `deltrunk`: Stops the line's trunk view and clears its row.
-class DeleteTrunkCmd : public Command {
+class DeleteTrunkCmd : public TrunkCommand {
   public:
-    DeleteTrunkCmd(std::string name, TrunkViewMgr* manager)
-        : Command(std::move(name)), manager(manager) {}
+    using TrunkCommand::TrunkCommand;
 
     using Command::Execute;
-    int Execute() override;
     int Execute(int board, int line) override;
-
-  private:
-    TrunkViewMgr* manager;
 };
 
 }  // namespace lineprobe

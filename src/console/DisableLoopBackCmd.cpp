@@ -1,28 +1,15 @@
 #include "console/DisableLoopBackCmd.h"
 
 #include "console/TrunkView.h"
-#include "console/TrunkViewMgr.h"
 #include "model/Trunk.h"
 
 namespace lineprobe {
 
-int DisableLoopBackCmd::Execute() {
-    return 0;
-}
-
 int DisableLoopBackCmd::Execute(int board, int line) {
-    TrunkView* trunkView =
-        manager->FindTrunkView(static_cast<unsigned int>(board), static_cast<unsigned int>(line));
-    if (trunkView != nullptr) {
-        vx7diag::Trunk* trunk = trunkView->GetTrunk();
-        trunk->DisableLoopBack();
-        Report("Disabling loopback mode completed");
-        RefreshView();
-    } else {
-        Report("ERROR - unable to find trunk view");
-        RefreshView();
-    }
-    return 0;
+    return OnTrunkView(board, line, [](TrunkView& view) {
+        view.GetTrunk()->DisableLoopBack();
+        return Shown("Disabling loopback mode completed");
+    });
 }
 
 }  // namespace lineprobe

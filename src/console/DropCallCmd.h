@@ -1,23 +1,16 @@
 #pragma once
 
-#include "console/Command.h"
+#include "console/PhoneCommand.h"
 
 namespace lineprobe {
 
-class PhoneViewMgr;
-
 // `drop`: Drops the call last shown on the channel's row.
-class DropCallCmd : public Command {
+class DropCallCmd : public PhoneCommand {
   public:
-    DropCallCmd(std::string name, PhoneViewMgr* manager)
-        : Command(std::move(name)), manager(manager) {}
+    using PhoneCommand::PhoneCommand;
 
     using Command::Execute;
-    int Execute() override;
     int Execute(int board, int line, int chan) override;
-
-  private:
-    PhoneViewMgr* manager;
 };
 
 }  // namespace lineprobe

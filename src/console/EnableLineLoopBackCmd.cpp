@@ -1,28 +1,15 @@
 #include "console/EnableLineLoopBackCmd.h"
 
 #include "console/TrunkView.h"
-#include "console/TrunkViewMgr.h"
 #include "model/Trunk.h"
 
 namespace lineprobe {
 
-int EnableLineLoopBackCmd::Execute() {
-    return 0;
-}
-
 int EnableLineLoopBackCmd::Execute(int board, int line) {
-    TrunkView* trunkView =
-        manager->FindTrunkView(static_cast<unsigned int>(board), static_cast<unsigned int>(line));
-    if (trunkView != nullptr) {
-        vx7diag::Trunk* trunk = trunkView->GetTrunk();
-        trunk->EnableLoopBack(2);
-        Report("enabling line loopback completed");
-        RefreshView();
-    } else {
-        Report("ERROR - unable to find trunk view");
-        RefreshView();
-    }
-    return 0;
+    return OnTrunkView(board, line, [](TrunkView& view) {
+        view.GetTrunk()->EnableLoopBack(2);
+        return Shown("enabling line loopback completed");
+    });
 }
 
 }  // namespace lineprobe

@@ -1,23 +1,16 @@
 #pragma once
 
-#include "console/Command.h"
+#include "console/TrunkCommand.h"
 
 namespace lineprobe {
 
-class TrunkViewMgr;
-
 // `linelbk`: Switches the line to line loopback.
-class EnableLineLoopBackCmd : public Command {
+class EnableLineLoopBackCmd : public TrunkCommand {
   public:
-    EnableLineLoopBackCmd(std::string name, TrunkViewMgr* manager)
-        : Command(std::move(name)), manager(manager) {}
+    using TrunkCommand::TrunkCommand;
 
     using Command::Execute;
-    int Execute() override;
     int Execute(int board, int line) override;
-
-  private:
-    TrunkViewMgr* manager;
 };
 
 }  // namespace lineprobe

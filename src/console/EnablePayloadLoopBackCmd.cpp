@@ -1,28 +1,15 @@
 #include "console/EnablePayloadLoopBackCmd.h"
 
 #include "console/TrunkView.h"
-#include "console/TrunkViewMgr.h"
 #include "model/Trunk.h"
 
 namespace lineprobe {
 
-int EnablePayloadLoopBackCmd::Execute() {
-    return 0;
-}
-
 int EnablePayloadLoopBackCmd::Execute(int board, int line) {
-    TrunkView* trunkView =
-        manager->FindTrunkView(static_cast<unsigned int>(board), static_cast<unsigned int>(line));
-    if (trunkView != nullptr) {
-        vx7diag::Trunk* trunk = trunkView->GetTrunk();
-        trunk->EnableLoopBack(1);
-        Report("enabling Payload loopback completed");
-        RefreshView();
-    } else {
-        Report("ERROR - unable to find trunk view");
-        RefreshView();
-    }
-    return 0;
+    return OnTrunkView(board, line, [](TrunkView& view) {
+        view.GetTrunk()->EnableLoopBack(1);
+        return Shown("enabling Payload loopback completed");
+    });
 }
 
 }  // namespace lineprobe

@@ -6,10 +6,6 @@
 
 namespace lineprobe {
 
-int NewPhoneCmd::Execute() {
-    return 0;
-}
-
 int NewPhoneCmd::Execute(int board, int line, int chan) {
     int result = PHONEVIEWMGR_ERROR;
     PhoneView* phoneView =

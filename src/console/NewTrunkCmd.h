@@ -1,22 +1,16 @@
 #pragma once
 
-#include "console/Command.h"
+#include "console/TrunkCommand.h"
 
 namespace lineprobe {
 
-class TrunkViewMgr;
-
 // `trunk`: Opens a trunk view on the line and starts it.
-class NewTrunkCmd : public Command {
+class NewTrunkCmd : public TrunkCommand {
   public:
-    NewTrunkCmd(std::string name, TrunkViewMgr* manager)
-        : Command(std::move(name)), manager(manager) {}
+    using TrunkCommand::TrunkCommand;
 
     using Command::Execute;
     int Execute(int board, int line) override;
-
-  private:
-    TrunkViewMgr* manager;
 };
 
 }  // namespace lineprobe

@@ -6,7 +6,7 @@
 #include <vector>
 
 #include "console/RowInfo.h"
-#include "console/SystemView.h"
+#include "model/SystemView.h"
 
 namespace vx7diag {
 class BoardManager;

@@ -1,23 +1,16 @@
 #pragma once
 
-#include "console/Command.h"
+#include "console/TrunkCommand.h"
 
 namespace lineprobe {
 
-class TrunkViewMgr;
-
 // `trunk_ins`: Puts the line in service; the TrunkState column shows the result.
-class TrunkStateInServiceCmd : public Command {
+class TrunkStateInServiceCmd : public TrunkCommand {
   public:
-    TrunkStateInServiceCmd(std::string name, TrunkViewMgr* manager)
-        : Command(std::move(name)), manager(manager) {}
+    using TrunkCommand::TrunkCommand;
 
     using Command::Execute;
-    int Execute() override;
     int Execute(int board, int line) override;
-
-  private:
-    TrunkViewMgr* manager;
 };
 
 }  // namespace lineprobe

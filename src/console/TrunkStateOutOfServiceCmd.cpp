@@ -1,26 +1,15 @@
 #include "console/TrunkStateOutOfServiceCmd.h"
 
 #include "console/TrunkView.h"
-#include "console/TrunkViewMgr.h"
 #include "model/Trunk.h"
 
 namespace lineprobe {
 
-int TrunkStateOutOfServiceCmd::Execute() {
-    return 0;
-}
-
 int TrunkStateOutOfServiceCmd::Execute(int board, int line) {
-    TrunkView* trunkView =
-        manager->FindTrunkView(static_cast<unsigned int>(board), static_cast<unsigned int>(line));
-    if (trunkView != nullptr) {
-        vx7diag::Trunk* trunk = trunkView->GetTrunk();
-        trunk->PutOutOfService();
-    } else {
-        Report("ERROR - unable to find trunk view");
-        RefreshView();
-    }
-    return 0;
+    return OnTrunkView(board, line, [](TrunkView& view) {
+        view.GetTrunk()->PutOutOfService();
+        return Silent();
+    });
 }
 
 }  // namespace lineprobe

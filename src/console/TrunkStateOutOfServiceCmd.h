@@ -1,23 +1,16 @@
 #pragma once
 
-#include "console/Command.h"
+#include "console/TrunkCommand.h"
 
 namespace lineprobe {
 
-class TrunkViewMgr;
-
 // `trunk_oos`: Puts the line out of service; the TrunkState column shows the result.
-class TrunkStateOutOfServiceCmd : public Command {
+class TrunkStateOutOfServiceCmd : public TrunkCommand {
   public:
-    TrunkStateOutOfServiceCmd(std::string name, TrunkViewMgr* manager)
-        : Command(std::move(name)), manager(manager) {}
+    using TrunkCommand::TrunkCommand;
 
     using Command::Execute;
-    int Execute() override;
     int Execute(int board, int line) override;
-
-  private:
-    TrunkViewMgr* manager;
 };
 
 }  // namespace lineprobe

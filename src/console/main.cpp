@@ -1,41 +1,21 @@
 #include <csignal>
 #include <exception>
 #include <iostream>
+#include <memory>
+#include <vector>
 
 #include <cstdlib>
 
-#include "console/AcceptCallCmd.h"
-#include "console/AnswerCallCmd.h"
-#include "console/ChanStateInServiceCmd.h"
-#include "console/ChanStateOutOfServiceCmd.h"
 #include "console/CmdProcessor.h"
+#include "console/Command.h"
 #include "console/CommandTable.h"
 #include "console/ConsoleDisplay.h"
 #include "console/ConsoleLayout.h"
 #include "console/ConsoleSystemView.h"
-#include "console/DeletePhoneCmd.h"
-#include "console/DeleteTrunkCmd.h"
-#include "console/DestAddrCmd.h"
-#include "console/DisableLoopBackCmd.h"
-#include "console/DropCallCmd.h"
-#include "console/EnableLineLoopBackCmd.h"
-#include "console/EnablePayloadLoopBackCmd.h"
-#include "console/HelpCmd.h"
 #include "console/Lifecycle.h"
-#include "console/MakeCallCmd.h"
-#include "console/NewPhoneCmd.h"
-#include "console/NewTrunkCmd.h"
-#include "console/OrigAddrCmd.h"
 #include "console/PhoneViewMgr.h"
-#include "console/QuitCmd.h"
 #include "console/Redirect.h"
 #include "console/RelayStatus.h"
-#include "console/ReleaseCallCmd.h"
-#include "console/ResetChanCmd.h"
-#include "console/StartTxRAICmd.h"
-#include "console/StopTxRAICmd.h"
-#include "console/TrunkStateInServiceCmd.h"
-#include "console/TrunkStateOutOfServiceCmd.h"
 #include "console/TrunkViewMgr.h"
 #include "console/View.h"
 #include "framework/tolk.h"
@@ -121,36 +101,14 @@ int main(int argc, char* argv[]) {
                  CMDPROCESSOR_VIEW_WINDOW_STARTING_ROW, CMDPROCESSOR_VIEW_WINDOW_STARTING_COL);
     CmdProcessor processor(g_CmdProcessorView);
 
-    // Created in the order of COMMAND_CREATION_ORDER; RegisterCommands registers them in
-    // the order of COMMAND_REGISTRATION_ORDER.
-    PhoneViewMgr* phones = g_phoneViewMgr;
-    TrunkViewMgr* trunks = g_trunkViewMgr;
-    const std::vector<Command*> commands = {
-        new QuitCmd("quit"),
-        new HelpCmd("help", "lineprobe_help.txt", phones, trunks),
-        new NewPhoneCmd("phone", phones),
-        new NewTrunkCmd("trunk", trunks),
-        new DeletePhoneCmd("delphone", phones),
-        new MakeCallCmd("makecall", phones),
-        new AnswerCallCmd("answer", phones),
-        new AcceptCallCmd("accept", phones),
-        new DropCallCmd("drop", phones),
-        new ReleaseCallCmd("release", phones),
-        new ChanStateOutOfServiceCmd("chan_oos", phones),
-        new ChanStateInServiceCmd("chan_ins", phones),
-        new TrunkStateInServiceCmd("trunk_ins", trunks),
-        new TrunkStateOutOfServiceCmd("trunk_oos", trunks),
-        new OrigAddrCmd("origaddr", phones),
-        new DestAddrCmd("destaddr", phones),
-        new DeleteTrunkCmd("deltrunk", trunks),
-        new ResetChanCmd("reset", phones),
-        new DisableLoopBackCmd("disablelbk", trunks),
-        new EnableLineLoopBackCmd("linelbk", trunks),
-        new EnablePayloadLoopBackCmd("payloadlbk", trunks),
-        new StartTxRAICmd("startrai", trunks),
-        new StopTxRAICmd("stoprai", trunks),
-    };
-    RegisterCommands(processor, commands);
+    // The commands live until the process ends: every end leaves through terminate_app.
+    const std::vector<std::unique_ptr<Command>> commands =
+        CreateCommands({g_phoneViewMgr, g_trunkViewMgr});
+    std::vector<Command*> table;
+    for (const std::unique_ptr<Command>& command : commands) {
+        table.push_back(command.get());
+    }
+    RegisterCommands(processor, table);
 
     processor.ProcessCommands();
 

@@ -1,5 +1,7 @@
 #include "framework/Addressable.h"
 
+#include <memory>
+
 #include "framework/tolk.h"
 
 namespace tolk {
@@ -106,6 +108,20 @@ Msg* buildCommand(unsigned int cmdType, MsgBody* cmdBody, unsigned int& trans, C
     return msg;
 }
 
+// A reply that is not the awaited completion travels on inside UnexpectedMsg, with its body
+// attached when the class knows it, so that it prints whole.
+Addressable::UnexpectedMsg unexpected(Addressable* self, unsigned int cmdType,
+                                      const MsgQueue::ErrorMsg& e) {
+    MsgBody* def = nullptr;
+    try {
+        def = self->MsgBodyLookup(e.msg->getMsgType());
+    } catch (...) {
+        def = nullptr;
+    }
+    e.msg->setBodyDef(def);
+    return Addressable::UnexpectedMsg(self, cmdType, e);
+}
+
 }  // namespace
 
 void Addressable::request(unsigned int cmdType, MsgBody* cmdBody, unsigned int retType,
@@ -115,29 +131,14 @@ void Addressable::request(unsigned int cmdType, MsgBody* cmdBody, unsigned int r
     try {
         reply = queue->request(msg, ResponseTimeout, retType, anySource);
     } catch (const MsgQueue::ErrorMsg& e) {
-        MsgBody* def = nullptr;
-        try {
-            def = MsgBodyLookup(e.msg->getMsgType());
-        } catch (...) {
-            def = nullptr;
-        }
-        e.msg->setBodyDef(def);
-        throw UnexpectedMsg(this, cmdType, e);
+        throw unexpected(this, cmdType, e);
     } catch (const MsgQueue::Timeout& e) {
         throw Timeout(this, cmdType, retType, trans, e.timeoutMs);
     }
-    if (reply == nullptr) {
-        return;
+    const std::unique_ptr<Msg> owned(reply);
+    if (owned != nullptr && retBody != nullptr) {
+        owned->read(retBody, 0);
     }
-    try {
-        if (retBody != nullptr) {
-            reply->read(retBody, 0);
-        }
-    } catch (...) {
-        delete reply;
-        throw;
-    }
-    delete reply;
 }
 
 void Addressable::request(unsigned int cmdType, MsgBody* cmdBody, unsigned int trans,
@@ -147,14 +148,7 @@ void Addressable::request(unsigned int cmdType, MsgBody* cmdBody, unsigned int t
         Msg* reply = queue->request(msg, ErrorWaitTime, 0, anySource);
         delete reply;
     } catch (const MsgQueue::ErrorMsg& e) {
-        MsgBody* def = nullptr;
-        try {
-            def = MsgBodyLookup(e.msg->getMsgType());
-        } catch (...) {
-            def = nullptr;
-        }
-        e.msg->setBodyDef(def);
-        throw UnexpectedMsg(this, cmdType, e);
+        throw unexpected(this, cmdType, e);
     }
 }
 

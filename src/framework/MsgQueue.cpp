@@ -1,6 +1,7 @@
 #include "framework/MsgQueue.h"
 
 #include <iostream>
+#include <mutex>
 
 #include "framework/AsyncMsgReceiver.h"
 #include "transport/TKSMsgQueue.h"
@@ -53,28 +54,25 @@ unsigned long MsgQueue::endedRequests() {
 
 Msg* MsgQueue::request(Msg* msg, unsigned int timeoutMs, unsigned int retMsgType, int anySource) {
     TKSMsgRef ref(*msg->getTKMsgRef());
-    TKSMsgRef reply;
-    if (timeoutMs != 0) {
-        requestLock.lock();
-    }
-    try {
-        reply = queue->request(ref, timeoutMs, retMsgType, anySource);
+    // The block belongs to the transport once it has been handed on, whatever the outcome.
+    auto handedOn = [msg] {
         ++g_endedRequests;
-    } catch (...) {
-        ++g_endedRequests;
-        if (timeoutMs != 0) {
-            requestLock.unlock();
-        }
         *msg->getTKMsgRef() = TKSMsgRef();
         delete msg;
+    };
+    TKSMsgRef reply;
+    try {
+        // Only a request that waits holds the queue: the transport has one wait record.
+        std::unique_lock<Mutex> waiting(requestLock, std::defer_lock);
+        if (timeoutMs != 0) {
+            waiting.lock();
+        }
+        reply = queue->request(ref, timeoutMs, retMsgType, anySource);
+    } catch (...) {
+        handedOn();
         throw;
     }
-    if (timeoutMs != 0) {
-        requestLock.unlock();
-    }
-    // The block belongs to the transport now.
-    *msg->getTKMsgRef() = TKSMsgRef();
-    delete msg;
+    handedOn();
 
     if (reply.getMsgRef() == nullptr) {
         if (retMsgType != 0) {
@@ -83,8 +81,9 @@ Msg* MsgQueue::request(Msg* msg, unsigned int timeoutMs, unsigned int retMsgType
         return nullptr;
     }
     Msg* answer = new Msg(&reply);
-    unsigned int type = answer->getMsgType();
-    if (type == 0 || type != retMsgType) {
+    // Only the awaited completion is an answer. A refusal (type 0) is never one, and a request
+    // that awaits none has nothing but refusals to hear.
+    if (retMsgType == 0 || answer->getMsgType() != retMsgType) {
         throw ErrorMsg(this, answer);
     }
     return answer;

@@ -1,7 +1,6 @@
 // The emulation served in-process: plugged behind the local switch, so that a program without
 // REMOTE_TKHOST talks to the boards of the farm as if they were in the machine.
-#ifndef LINEPROBE_SIM_BUILTIN_H
-#define LINEPROBE_SIM_BUILTIN_H
+#pragma once
 
 #include <memory>
 #include <string>
@@ -24,5 +23,3 @@ bool builtinEmulationRunning();
 std::string builtinControl(const std::string& line);
 
 }  // namespace sim
-
-#endif

@@ -1,7 +1,6 @@
 // The control language of the emulation: one command a line, as a script or an operator types it
 // to inject what a real network would do.
-#ifndef LINEPROBE_SIM_CONTROL_H
-#define LINEPROBE_SIM_CONTROL_H
+#pragma once
 
 #include <cstdint>
 #include <string>
@@ -80,5 +79,3 @@ constexpr std::uint32_t kMaxSleepMs = 3'600'000;
 ScriptParse parseScript(std::string_view text);
 
 }  // namespace sim
-
-#endif

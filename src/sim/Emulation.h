@@ -2,8 +2,7 @@
 // a board of the farm and queues the answer and the events that a board would send, each ready
 // to be delivered by its target address. One thread at a time may use an Emulation; both
 // servings (the in-process switch and the relay) keep it on one thread of their own.
-#ifndef LINEPROBE_SIM_EMULATION_H
-#define LINEPROBE_SIM_EMULATION_H
+#pragma once
 
 #include <chrono>
 #include <cstdint>
@@ -148,5 +147,3 @@ class Emulation {
 };
 
 }  // namespace sim
-
-#endif

@@ -1,7 +1,6 @@
 // What the units of the emulation share and nothing else needs: the request in hand and the
 // conversions between the farm's addresses and the catalogue's.
-#ifndef LINEPROBE_SIM_EMULATIONINTERNAL_H
-#define LINEPROBE_SIM_EMULATIONINTERNAL_H
+#pragma once
 
 #include <cstdint>
 
@@ -34,5 +33,3 @@ inline tolk::CompDesc_t toCD(const Address& a) {
 inline constexpr std::uint16_t kAnyInstance = 0xFFFF;
 
 }  // namespace sim
-
-#endif

@@ -1,7 +1,6 @@
 // The ErrorCode values the emulated boards put in MsgError_t. A real board's codes are its own;
 // these are the emulation's, one per kind of refusal, so that tests and logs can tell them apart.
-#ifndef LINEPROBE_SIM_ERRORCODES_H
-#define LINEPROBE_SIM_ERRORCODES_H
+#pragma once
 
 #include <cstdint>
 
@@ -25,5 +24,3 @@ enum ErrorCode : std::uint32_t {
 };
 
 }  // namespace sim
-
-#endif

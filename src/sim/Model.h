@@ -1,8 +1,7 @@
 // The state of the emulated boards, over plain data: channels with their calls, lines with their
 // alarms, cluster ports, and who subscribed to which events. Operations change the state and
 // report what a board would report as abstract events; Emulation turns them into messages.
-#ifndef LINEPROBE_SIM_MODEL_H
-#define LINEPROBE_SIM_MODEL_H
+#pragma once
 
 #include <cstdint>
 #include <map>
@@ -265,5 +264,3 @@ class Model {
 };
 
 }  // namespace sim
-
-#endif

@@ -21,26 +21,8 @@
 
 namespace sim {
 
-struct RelayServer::Conn {
-    int fd = -1;
-    std::uint64_t serial = 0;
-    bool opened = false;
-    bool dead = false;
-    bool wantWrite = false;
-    Clock::time_point accepted;
-    TKCompDesc addr{};
-    std::vector<unsigned char> in;
-    std::size_t inPos = 0;
-    std::vector<unsigned char> out;
-    std::size_t outPos = 0;
-
-    std::size_t pending() const { return out.size() - outPos; }
-};
-
 namespace {
 
-constexpr std::size_t kReadChunk = 256 * 1024;
-constexpr std::size_t kMaxControlLine = 64 * 1024;
 constexpr std::size_t kBurstSlice = 512;
 // Bursts wait while any client has this much unsent.
 constexpr std::size_t kBurstWatermark = 1u << 20;
@@ -252,10 +234,7 @@ void RelayServer::acceptAll() {
         }
         int one = 1;
         setsockopt(fd, IPPROTO_TCP, TCP_NODELAY, &one, sizeof one);
-        auto c = std::make_unique<Conn>();
-        c->fd = fd;
-        c->serial = ++serial_;
-        c->accepted = Clock::now();
+        auto c = std::make_unique<Conn>(fd, ++serial_, Clock::now());
         epoll_event ev{};
         ev.events = EPOLLIN;
         ev.data.fd = fd;
@@ -294,64 +273,41 @@ void RelayServer::expireUnopened(Clock::time_point now) {
 }
 
 void RelayServer::readFrom(Conn& c) {
-    static thread_local std::vector<unsigned char> chunk(kReadChunk);
     for (int round = 0; round < 4; ++round) {
-        ssize_t n = ::recv(c.fd, chunk.data(), chunk.size(), 0);
-        if (n <= 0) {
-            if (n == 0) {
-                close(c, c.inPos < c.in.size() ? "closed in the middle of a frame" : nullptr);
-                return;
-            }
-            if (errno == EAGAIN || errno == EWOULDBLOCK || errno == EINTR) {
-                break;
-            }
-            close(c, std::strerror(errno));
+        const Conn::Read r = c.receive();
+        if (r.ended) {
+            close(c, r.why.empty() ? nullptr : r.why.c_str());
             return;
         }
-        c.in.insert(c.in.end(), chunk.data(), chunk.data() + n);
-        if (!processFrames(c)) {
+        if (r.bytes == 0 || !processFrames(c)) {
             return;
         }
-        if (static_cast<std::size_t>(n) < chunk.size()) {
-            break;
+        if (!r.full) {
+            return;
         }
     }
 }
 
 bool RelayServer::processFrames(Conn& c) {
+    Conn::Frame f;
     for (;;) {
-        std::size_t avail = c.in.size() - c.inPos;
-        if (avail < TKS_FRAME_HEADER_SIZE) {
+        const Conn::FrameStatus status = c.nextFrame(f);
+        if (status == Conn::FrameStatus::Partial) {
             break;
         }
-        const unsigned char* p = c.in.data() + c.inPos;
-        msg_t h;
-        tksDecodeFrameHeader(p, h);
-        if (!tksFrameSizesValid(h.size, h.ex_size)) {
-            log_ << "vx7sim: connection " << c.serial << ": frame of type " << h.type
-                 << " with parts of " << h.size << " and " << h.ex_size
+        if (status == Conn::FrameStatus::Oversized) {
+            log_ << "vx7sim: connection " << c.serial << ": frame of type " << f.header.type
+                 << " with parts of " << f.header.size << " and " << f.header.ex_size
                  << " bytes, over the limit; closing it" << std::endl;
             close(c, nullptr);
             return false;
         }
-        std::size_t whole = TKS_FRAME_HEADER_SIZE + h.size + h.ex_size;
-        if (avail < whole) {
-            break;
-        }
-        c.inPos += whole;
-        const unsigned char* body = p + TKS_FRAME_HEADER_SIZE;
-        if (!handleFrame(c, h.type, body, h.size, body + h.size, h.ex_size)) {
-            return false;
-        }
-        if (c.dead) {
+        if (!handleFrame(c, f.header.type, f.body, f.header.size, f.ex, f.header.ex_size) ||
+            c.dead) {
             return false;
         }
     }
-    // Keep the buffer small: move what is left of a partial frame to the front.
-    if (c.inPos > 0) {
-        c.in.erase(c.in.begin(), c.in.begin() + static_cast<std::ptrdiff_t>(c.inPos));
-        c.inPos = 0;
-    }
+    c.compactInput();
     return true;
 }
 
@@ -492,20 +448,11 @@ void RelayServer::sendFrame(Conn& c, std::uint32_t type, const unsigned char* bo
     if (c.dead) {
         return;
     }
-    msg_t m;
-    m.type = type;
-    m.size = size;
-    m.ex_size = exSize;
-    unsigned char header[TKS_FRAME_HEADER_SIZE];
-    tksEncodeFrameHeader(m, header);
-    c.out.insert(c.out.end(), header, header + sizeof header);
-    if (size) {
-        c.out.insert(c.out.end(), body, body + size);
-    }
-    if (exSize) {
-        c.out.insert(c.out.end(), ex, ex + exSize);
-    }
-    queued_ += sizeof header + size + exSize;
+    queued_ += c.queueFrame(type, body, size, ex, exSize);
+    checkPending(c);
+}
+
+void RelayServer::checkPending(Conn& c) {
     if (c.pending() > options_.maxPendingOutput) {
         log_ << "vx7sim: connection " << c.serial << " reads too slowly (" << c.pending()
              << " bytes waiting); closing it" << std::endl;
@@ -540,37 +487,24 @@ void RelayServer::sendBlock(Conn& c, const TKMsg32Bit* block) {
     if (options_.trace) {
         log_ << "trace " << traceLine("out", c.serial, block) << std::endl;
     }
-    unsigned char header[TKS_MSG_HEADER_BYTES];
-    tksPackMsgHeader(block, header);
-    sendFrame(c, TKS_FRAME_MESSAGE, header, sizeof header,
-              reinterpret_cast<const unsigned char*>(block) + TK_MSG_HEADER_SIZE, block->size);
-}
-
-void RelayServer::flush(Conn& c) {
-    while (!c.dead && c.pending() > 0) {
-        ssize_t n = ::send(c.fd, c.out.data() + c.outPos, c.pending(), MSG_NOSIGNAL);
-        if (n < 0) {
-            if (errno == EINTR) {
-                continue;
-            }
-            if (errno == EAGAIN || errno == EWOULDBLOCK) {
-                break;
-            }
-            close(c, std::strerror(errno));
-            return;
-        }
-        c.outPos += static_cast<std::size_t>(n);
-        queued_ -= static_cast<std::size_t>(n);
-    }
     if (c.dead) {
         return;
     }
-    if (c.pending() == 0) {
-        c.out.clear();
-        c.outPos = 0;
-    } else if (c.outPos > (1u << 20)) {
-        c.out.erase(c.out.begin(), c.out.begin() + static_cast<std::ptrdiff_t>(c.outPos));
-        c.outPos = 0;
+    queued_ += c.queueBlock(block);
+    checkPending(c);
+}
+
+void RelayServer::flush(Conn& c) {
+    if (c.dead) {
+        return;
+    }
+    std::size_t sent = 0;
+    std::string why;
+    const bool ok = c.send(sent, why);
+    queued_ -= sent;
+    if (!ok) {
+        close(c, why.c_str());
+        return;
     }
     if (c.pending() > options_.maxPendingOutput) {
         log_ << "vx7sim: connection " << c.serial << " reads too slowly (" << c.pending()
@@ -606,9 +540,7 @@ void RelayServer::close(Conn& c, const char* why) {
     c.dead = true;
     epoll_ctl(epollFd_, EPOLL_CTL_DEL, c.fd, nullptr);
     unopened_.erase(c.serial);
-    queued_ -= c.pending();
-    c.out.clear();
-    c.outPos = 0;
+    queued_ -= c.discardOutput();
     if (c.opened) {
         byInstance_.erase(c.addr.instance);
         emu_.forget(c.addr);
@@ -628,101 +560,6 @@ void RelayServer::reap() {
 void RelayServer::dropAll() {
     for (auto& [fd, c] : conns_) {
         close(*c, nullptr);
-    }
-}
-
-void RelayServer::readControl(int fd, std::ostream* out) {
-    char buf[4096];
-    for (;;) {
-        ssize_t n = ::read(fd, buf, sizeof buf);
-        if (n <= 0) {
-            break;
-        }
-        std::string_view chunk(buf, static_cast<std::size_t>(n));
-        while (!chunk.empty()) {
-            std::size_t nl = chunk.find('\n');
-            if (discardingControl_) {
-                // The rest of a refused line is not a command of its own.
-                if (nl == std::string_view::npos) {
-                    break;
-                }
-                discardingControl_ = false;
-                chunk.remove_prefix(nl + 1);
-                continue;
-            }
-            controlPending_.append(chunk.substr(0, nl));
-            if (controlPending_.size() > kMaxControlLine) {
-                controlPending_.clear();
-                discardingControl_ = nl == std::string_view::npos;
-                if (out) {
-                    *out << "error: control line too long" << std::endl;
-                }
-            } else if (nl != std::string_view::npos) {
-                std::string reply = runControl(controlPending_);
-                controlPending_.clear();
-                if (!reply.empty() && out) {
-                    *out << reply << std::endl;
-                }
-            }
-            if (nl == std::string_view::npos) {
-                break;
-            }
-            chunk.remove_prefix(nl + 1);
-        }
-    }
-}
-
-std::string RelayServer::runControl(const std::string& line) {
-    ControlOutcome o = emu_.control(line);
-    if (o.drop) {
-        std::size_t n = liveConnections();
-        dropAll();
-        reap();
-        o.reply = "ok dropped " + std::to_string(n);
-    }
-    if (o.quit) {
-        running_ = false;
-    }
-    if (o.reply.rfind("ok stats", 0) == 0) {
-        o.reply += " connections=" + std::to_string(liveConnections()) +
-                   " queued=" + std::to_string(queued_);
-    }
-    drainEmulation();
-    return o.reply;
-}
-
-std::string RelayServer::control(const std::string& line) {
-    std::future<std::string> f;
-    {
-        std::lock_guard<std::mutex> g(crossLock_);
-        cross_.push_back(CrossCall{line, {}});
-        f = cross_.back().result.get_future();
-    }
-    std::uint64_t one = 1;
-    [[maybe_unused]] ssize_t w = ::write(wakeFd_, &one, sizeof one);
-    return f.get();
-}
-
-void RelayServer::playScript(Clock::time_point now) {
-    while (running_ && scriptNext_ < script_.size() && scriptDue_ <= now) {
-        const ScriptStep& step = script_[scriptNext_++];
-        if (step.command.empty()) {
-            scriptDue_ = now + std::chrono::milliseconds(step.sleepMs);
-            continue;
-        }
-        log_ << "vx7sim: script line " << step.line << ": " << step.command << ": "
-             << runControl(step.command) << std::endl;
-    }
-}
-
-void RelayServer::runCrossThread() {
-    std::deque<CrossCall> calls;
-    {
-        std::lock_guard<std::mutex> g(crossLock_);
-        calls.swap(cross_);
-    }
-    for (CrossCall& call : calls) {
-        call.result.set_value(runControl(call.line));
     }
 }
 

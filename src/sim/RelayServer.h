@@ -1,8 +1,7 @@
 // vx7sim's server: the emulation served over the relay's frame protocol on TCP. One thread runs
 // the whole loop (sockets, control lines, the emulation), so the emulation needs no lock and
 // everything happens in the order it arrived.
-#ifndef LINEPROBE_SIM_RELAYSERVER_H
-#define LINEPROBE_SIM_RELAYSERVER_H
+#pragma once
 
 #include <atomic>
 #include <chrono>
@@ -20,6 +19,7 @@
 #include "platform/tkhost/tkhost.h"
 #include "sim/Control.h"
 #include "sim/Emulation.h"
+#include "sim/RelayConnection.h"
 
 namespace sim {
 
@@ -66,7 +66,7 @@ class RelayServer {
     std::size_t connectionCount() const { return connectionCount_.load(); }
 
   private:
-    struct Conn;
+    using Conn = RelayConnection;
 
     void acceptAll();
     void readFrom(Conn& c);
@@ -77,6 +77,8 @@ class RelayServer {
     void sendFrame(Conn& c, std::uint32_t type, const unsigned char* body, std::uint32_t size,
                    const unsigned char* ex, std::uint32_t exSize);
     void sendBlock(Conn& c, const TKMsg32Bit* block);
+    // Closes a client that lets too much pile up, then holds all of them to their cap.
+    void checkPending(Conn& c);
     void flush(Conn& c);
     void flushAll();
     void close(Conn& c, const char* why);
@@ -131,5 +133,3 @@ class RelayServer {
 };
 
 }  // namespace sim
-
-#endif

@@ -1,7 +1,6 @@
 // vx7sim's protocol trace: one line for each message the relay routes, named from the catalogue,
 // so that the traffic can be read without a capture.
-#ifndef LINEPROBE_SIM_TRACE_H
-#define LINEPROBE_SIM_TRACE_H
+#pragma once
 
 #include <cstdint>
 #include <string>
@@ -17,5 +16,3 @@ namespace sim {
 std::string traceLine(std::string_view direction, std::uint64_t conn, const TKMsg32Bit* block);
 
 }  // namespace sim
-
-#endif

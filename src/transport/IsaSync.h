@@ -1,6 +1,5 @@
 // Namespace isa: the plain critical section, its scope guard, and the shared-ownership pointer.
-#ifndef LINEPROBE_TRANSPORT_ISASYNC_H
-#define LINEPROBE_TRANSPORT_ISASYNC_H
+#pragma once
 
 #include <pthread.h>
 
@@ -131,5 +130,3 @@ class RefPtr {
 };
 
 }  // namespace isa
-
-#endif

@@ -1,16 +1,23 @@
 // The interface of a transport under TKSMsgQueue.
-#ifndef LINEPROBE_TRANSPORT_TKSABSTRACTMSGQUEUE_H
-#define LINEPROBE_TRANSPORT_TKSABSTRACTMSGQUEUE_H
+#pragma once
 
 #include <functional>
 
 #include "platform/tkhost/tkhost.h"
 
+// Statuses of msgRead and msgWrite. The local transport hands on those of the host library,
+// where 0 is success as well and any other value a failure.
+enum TKSStatus : int {
+    TKS_OK = 0,
+    // Nothing moved: no block was read, or the block to write stays with the caller.
+    TKS_NOT_MOVED = 2,
+};
+
 class TKSAbstractMsgQueue {
   public:
-    // Blocks for the next message; 0 when *out holds a new block that the caller now owns.
+    // Blocks for the next message; TKS_OK when *out holds a new block that the caller now owns.
     virtual int msgRead(TKMsg32Bit** out) = 0;
-    // 0: the block went to the transport. Any other status: it stays with the caller.
+    // TKS_OK: the block went to the transport. Any other status: it stays with the caller.
     virtual int msgWrite(TKMsg32Bit* msg) = 0;
     virtual ~TKSAbstractMsgQueue() = default;
     // At shutdown, while the reader still reads: anything the transport must exchange before
@@ -29,5 +36,3 @@ class TKSAbstractMsgQueue {
 
     TKCompDesc hostDesc{};
 };
-
-#endif

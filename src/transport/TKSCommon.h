@@ -1,6 +1,5 @@
 // Threads, signals, sleeps and the transport's exceptions, directly on POSIX threads.
-#ifndef LINEPROBE_TRANSPORT_TKSCOMMON_H
-#define LINEPROBE_TRANSPORT_TKSCOMMON_H
+#pragma once
 
 #include <pthread.h>
 
@@ -146,5 +145,3 @@ void TKSHostCleanup();
 void tks_sleep(unsigned int seconds);
 // milliseconds must be at most 1000.
 void tks_sleep_ms(unsigned int milliseconds);
-
-#endif

@@ -1,8 +1,7 @@
 // The relay socket protocol's frames, as bytes: encoders and decoders shared by the client
 // transport and any server. A frame is a 20-byte big-endian header (type, tran, size, ex_size,
 // one ignored word), `size` bytes of body and `ex_size` bytes of ex, without padding.
-#ifndef LINEPROBE_TRANSPORT_TKSFRAME_H
-#define LINEPROBE_TRANSPORT_TKSFRAME_H
+#pragma once
 
 #include <cstddef>
 #include <cstdint>
@@ -89,5 +88,3 @@ void tksEncodeOpen(const TKSOpenRequest& req, unsigned char out[TKS_OPEN_BODY_BY
 bool tksDecodeOpen(const msg_t& m, TKSOpenRequest& req);
 void tksEncodeAssigned(TKCompDesc addr, unsigned char out[TKS_ASSIGNED_BODY_BYTES]);
 bool tksDecodeAssigned(const msg_t& m, TKCompDesc& addr);
-
-#endif

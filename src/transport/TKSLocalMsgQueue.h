@@ -1,6 +1,5 @@
 // Transport straight onto the host message library's local queues.
-#ifndef LINEPROBE_TRANSPORT_TKSLOCALMSGQUEUE_H
-#define LINEPROBE_TRANSPORT_TKSLOCALMSGQUEUE_H
+#pragma once
 
 #include "transport/TKSAbstractMsgQueue.h"
 
@@ -18,5 +17,3 @@ class TKSLocalMsgQueue : public TKSAbstractMsgQueue {
   private:
     TKQueueHandle queue;
 };
-
-#endif

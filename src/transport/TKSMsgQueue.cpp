@@ -214,7 +214,7 @@ TKSMsgRef TKSMsgQueue::request(TKSMsgRef& msg, unsigned int timeoutMs, unsigned 
     msg.setSrcAddr(self);
 
     if (timeoutMs == 0) {
-        if (transport->msgWrite(block) != 0) {
+        if (transport->msgWrite(block) != TKS_OK) {
             if (!transport->connected()) {
                 return notSent(down.c_str());
             }
@@ -228,7 +228,7 @@ TKSMsgRef TKSMsgQueue::request(TKSMsgRef& msg, unsigned int timeoutMs, unsigned 
         std::lock_guard<std::mutex> lk(waitLock);
         waiting = true;
     }
-    if (transport->msgWrite(block) != 0) {
+    if (transport->msgWrite(block) != TKS_OK) {
         if (!transport->connected()) {
             std::lock_guard<std::mutex> lk(waitLock);
             waiting = false;
@@ -440,7 +440,7 @@ void* TKSMsgQueue::readNroute(void*, void*) {
             tkMsgFree(block);
             break;
         }
-        if (status != 0 || block == nullptr) {
+        if (status != TKS_OK || block == nullptr) {
             continue;
         }
         route(block);

@@ -1,7 +1,6 @@
 // One transport and one reader thread: sends, and sorts what arrives into the awaited reply and
 // everything else, which goes to the registered callback.
-#ifndef LINEPROBE_TRANSPORT_TKSMSGQUEUE_H
-#define LINEPROBE_TRANSPORT_TKSMSGQUEUE_H
+#pragma once
 
 #include <condition_variable>
 #include <functional>
@@ -108,5 +107,3 @@ class TKSMsgQueue : public TKSRunnable {
     TKSMutex pickupReady;
     TKSMutex pickupFree;
 };
-
-#endif

@@ -1,6 +1,5 @@
 // A handle on one message block: copying copies the pointer; only free() or a transport frees.
-#ifndef LINEPROBE_TRANSPORT_TKSMSGREF_H
-#define LINEPROBE_TRANSPORT_TKSMSGREF_H
+#pragma once
 
 #include "platform/tkhost/tkhost.h"
 #include "transport/TKSCommon.h"
@@ -51,5 +50,3 @@ bool operator==(const TKCompDesc& a, const TKCompDesc& b);
 inline bool operator!=(const TKCompDesc& a, const TKCompDesc& b) {
     return !(a == b);
 }
-
-#endif

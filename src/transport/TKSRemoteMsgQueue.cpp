@@ -103,7 +103,7 @@ std::unique_ptr<sock> TKSRemoteMsgQueue::openConnection(TKCompDesc& assigned, st
     // A partial answer must not hold the program any longer than no answer at all: one limit
     // for the whole exchange, connection included.
     auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(OPEN_WAIT_MS);
-    if (s->connect(static_cast<int>(OPEN_WAIT_MS)) != 0) {
+    if (s->connect(static_cast<int>(OPEN_WAIT_MS)) != sock::SOCK_OK) {
         reason = errno == ETIMEDOUT
                      ? "no connection within " + std::to_string(OPEN_WAIT_MS / 1000) + " s"
                      : std::string(std::strerror(errno));
@@ -116,7 +116,7 @@ std::unique_ptr<sock> TKSRemoteMsgQueue::openConnection(TKCompDesc& assigned, st
     open.type = TKS_FRAME_OPEN;
     open.size = TKS_OPEN_BODY_BYTES;
     open.body = body;
-    if (s->snd_msg(open) != 0) {
+    if (s->snd_msg(open) != sock::SOCK_OK) {
         reason = "cannot send the open: the relay closed the connection";
         return nullptr;
     }
@@ -125,7 +125,7 @@ std::unique_ptr<sock> TKSRemoteMsgQueue::openConnection(TKCompDesc& assigned, st
     unsigned char header[TKS_FRAME_HEADER_SIZE];
     long missing = 0;
     long r = s->readblock(header, TKS_FRAME_HEADER_SIZE, deadline, &missing);
-    if (r != 0) {
+    if (r != sock::SOCK_OK) {
         reason = answerMissing(r, long(TKS_FRAME_HEADER_SIZE) - missing, whole);
         return nullptr;
     }
@@ -146,7 +146,7 @@ std::unique_ptr<sock> TKSRemoteMsgQueue::openConnection(TKCompDesc& assigned, st
     }
     unsigned char address[TKS_ASSIGNED_BODY_BYTES];
     r = s->readblock(address, TKS_ASSIGNED_BODY_BYTES, deadline, &missing);
-    if (r != 0) {
+    if (r != sock::SOCK_OK) {
         reason = answerMissing(r, whole - missing, whole);
         return nullptr;
     }
@@ -172,7 +172,7 @@ TKSRemoteMsgQueue::~TKSRemoteMsgQueue() {
                 int r = socket->get_msg(m);
                 std::uint32_t type = m.type;
                 free_msg(m);
-                if (r != 0 || type == TKS_FRAME_CLOSE_ACK) {
+                if (r != sock::SOCK_OK || type == TKS_FRAME_CLOSE_ACK) {
                     break;
                 }
             }
@@ -228,7 +228,7 @@ int TKSRemoteMsgQueue::reconnect(const char* why) {
         {
             std::unique_lock<std::mutex> lk(closingLock);
             if (closingCond.wait_for(lk, pause, [this] { return closing.load(); })) {
-                return 2;
+                return TKS_NOT_MOVED;
             }
         }
         std::string reason;
@@ -252,7 +252,7 @@ int TKSRemoteMsgQueue::reconnect(const char* why) {
             if (connectionChanged) {
                 connectionChanged(true, "");
             }
-            return 2;
+            return TKS_NOT_MOVED;
         }
         pause = std::min(pause * 2, std::chrono::milliseconds(RECONNECT_MAX_MS));
     }
@@ -262,44 +262,44 @@ int TKSRemoteMsgQueue::closedByRelay() {
     closeSignal.unlock();
     std::unique_lock<std::mutex> lk(closingLock);
     closingCond.wait(lk, [this] { return closing.load(); });
-    return 2;
+    return TKS_NOT_MOVED;
 }
 
 int TKSRemoteMsgQueue::msgWrite(TKMsg32Bit* msg) {
     std::lock_guard<std::mutex> lk(writeLock);
     if (!up.load()) {
-        return 2;
+        return TKS_NOT_MOVED;
     }
     if (!tksEncodeMessageFrame(msg, outFrame)) {
-        return 2;
+        return TKS_NOT_MOVED;
     }
     // Judged by this write alone: the reader marks the socket failed when the relay closes,
     // which may come just after the relay has read this very message.
     long r = socket->writeblock(outFrame.data(), static_cast<long>(outFrame.size()));
-    if (r != 0) {
-        return 2;
+    if (r != sock::SOCK_OK) {
+        return TKS_NOT_MOVED;
     }
     tkMsgFree(msg);
-    return 0;
+    return TKS_OK;
 }
 
 int TKSRemoteMsgQueue::msgRead(TKMsg32Bit** out) {
     *out = nullptr;
     if (closing.load()) {
-        return 2;
+        return TKS_NOT_MOVED;
     }
     msg_t m;
     m.type = TKS_FRAME_CLOSE;
     int r = socket->get_msg(m);
-    if (r == 0 && m.type == TKS_FRAME_CLOSE_ACK) {
+    if (r == sock::SOCK_OK && m.type == TKS_FRAME_CLOSE_ACK) {
         free_msg(m);
         closeSignal.unlock();
-        return 2;
+        return TKS_NOT_MOVED;
     }
-    if (r != 0 || m.type == TKS_FRAME_CLOSE) {
+    if (r != sock::SOCK_OK || m.type == TKS_FRAME_CLOSE) {
         free_msg(m);
         if (closing.load()) {
-            return 2;
+            return TKS_NOT_MOVED;
         }
         if (closeSent.load()) {
             return closedByRelay();
@@ -313,21 +313,21 @@ int TKSRemoteMsgQueue::msgRead(TKMsg32Bit** out) {
         if (--retries <= 0) {
             return reconnect("ten frames in a row could not be read");
         }
-        return 2;
+        return TKS_NOT_MOVED;
     }
     if (m.type != TKS_FRAME_MESSAGE) {
         std::cerr << "Discarding a frame of unknown type " << m.type << " from " << hostName
                   << std::endl;
         free_msg(m);
-        return 2;
+        return TKS_NOT_MOVED;
     }
     TKMsg32Bit* block = tksBlockFromFrame(m);
     free_msg(m);
     if (block == nullptr) {
         std::cerr << "Discarding a malformed message frame from " << hostName << std::endl;
-        return 2;
+        return TKS_NOT_MOVED;
     }
     retries = 10;
     *out = block;
-    return 0;
+    return TKS_OK;
 }

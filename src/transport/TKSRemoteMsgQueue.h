@@ -1,6 +1,5 @@
 // Transport over one TCP connection to a relay host.
-#ifndef LINEPROBE_TRANSPORT_TKSREMOTEMSGQUEUE_H
-#define LINEPROBE_TRANSPORT_TKSREMOTEMSGQUEUE_H
+#pragma once
 
 #include <atomic>
 #include <condition_variable>
@@ -93,5 +92,3 @@ class TKSRemoteMsgQueue : public TKSAbstractMsgQueue {
     std::condition_variable closingCond;
     std::vector<unsigned char> outFrame;
 };
-
-#endif

@@ -150,7 +150,7 @@ sock::~sock() {
 int sock::connect() {
     if (fd < 0 || failed.load() != 0) {
         failed = 1;
-        return -1;
+        return SOCK_FAILED;
     }
     int r;
     do {
@@ -158,24 +158,24 @@ int sock::connect() {
     } while (r < 0 && errno == EINTR);
     if (r < 0) {
         failed = 1;
-        return -1;
+        return SOCK_FAILED;
     }
     // Requests and replies are small and wait on each other: never hold one back.
     int one = 1;
     setsockopt(fd, IPPROTO_TCP, TCP_NODELAY, &one, sizeof one);
-    return 0;
+    return SOCK_OK;
 }
 
 int sock::connect(int timeoutMs) {
     if (fd < 0 || failed.load() != 0) {
         failed = 1;
         errno = EBADF;
-        return -1;
+        return SOCK_FAILED;
     }
     int flags = fcntl(fd, F_GETFL, 0);
     if (flags < 0 || fcntl(fd, F_SETFL, flags | O_NONBLOCK) < 0) {
         failed = 1;
-        return -1;
+        return SOCK_FAILED;
     }
     int r = ::connect(fd, reinterpret_cast<sockaddr*>(&peer), sizeof peer);
     int error = r == 0 ? 0 : errno;
@@ -214,16 +214,16 @@ int sock::connect(int timeoutMs) {
     if (error != 0) {
         failed = 1;
         errno = error;
-        return -1;
+        return SOCK_FAILED;
     }
     int one = 1;
     setsockopt(fd, IPPROTO_TCP, TCP_NODELAY, &one, sizeof one);
-    return 0;
+    return SOCK_OK;
 }
 
 int sock::close() {
     if (fd < 0) {
-        return 0;
+        return SOCK_OK;
     }
     linger l{};
     l.l_onoff = 1;
@@ -348,7 +348,7 @@ long sock::readUntil(void* dst, long n, bool limited,
         }
         if (interrupted.load()) {
             failed = 1;
-            return -1;
+            return SOCK_FAILED;
         }
         if (limited) {
             auto left = std::chrono::duration_cast<std::chrono::microseconds>(
@@ -371,7 +371,7 @@ long sock::readUntil(void* dst, long n, bool limited,
                 continue;
             }
             failed = 1;
-            return -1;
+            return SOCK_FAILED;
         }
         if (r == 0) {
             failed = 1;
@@ -383,7 +383,7 @@ long sock::readUntil(void* dst, long n, bool limited,
     if (missingOut != nullptr) {
         *missingOut = 0;
     }
-    return 0;
+    return SOCK_OK;
 }
 
 long sock::writeblock(const void* src, long n) {
@@ -403,7 +403,7 @@ long sock::writeblock(const void* src, long n) {
                 continue;
             }
             failed = 1;
-            return -1;
+            return SOCK_FAILED;
         }
         if (r == 0) {
             failed = 1;
@@ -412,31 +412,31 @@ long sock::writeblock(const void* src, long n) {
         in += r;
         missing -= static_cast<long>(r);
     }
-    return 0;
+    return SOCK_OK;
 }
 
 int sock::snd_msg(const msg_t& m) {
     std::vector<unsigned char> bytes = tksEncodeFrame(m);
     if (bytes.empty()) {
-        return -1;
+        return SOCK_FAILED;
     }
     long r = writeblock(bytes.data(), static_cast<long>(bytes.size()));
     if (r < 0) {
         return static_cast<int>(r);
     }
-    return failed.load() != 0 || r != 0 ? -1 : 0;
+    return failed.load() != 0 || r != 0 ? SOCK_FAILED : SOCK_OK;
 }
 
 int sock::get_msg(msg_t& m) {
     SockByteSource src(*this);
     switch (tksReadFrame(src, m)) {
         case TKS_READ_OK:
-            return 0;
+            return SOCK_OK;
         case TKS_READ_NO_MEMORY:
             std::cerr << "Unable to allocate memory in get_msg" << std::endl;
-            return -1;
+            return SOCK_FAILED;
         default:
-            return -1;
+            return SOCK_FAILED;
     }
 }
 

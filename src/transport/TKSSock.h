@@ -1,6 +1,5 @@
 // The small TCP socket wrapper under the remote transport, and its text helpers.
-#ifndef LINEPROBE_TRANSPORT_TKSSOCK_H
-#define LINEPROBE_TRANSPORT_TKSSOCK_H
+#pragma once
 
 #include <netinet/in.h>
 
@@ -12,6 +11,10 @@
 
 class sock {
   public:
+    // What the calls below return, unless they say otherwise.
+    static constexpr int SOCK_OK = 0;
+    static constexpr int SOCK_FAILED = -1;
+
     sock(const char* name, int port);
     sock(unsigned long address, int port);
     sock(int fd, sockaddr_in& peer);
@@ -83,5 +86,3 @@ void dntoip(char* dst, const char* name);  // dst needs 16 bytes
 int stn(const char* text);
 void print_msg(const char* title, const msg_t& m);
 void byte_print_msg(const char* bytes, int n);
-
-#endif

@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <memory>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -15,18 +16,6 @@ namespace {
 
 using lineprobe::testing::CoutCapture;
 
-const std::vector<std::string> CREATION = {
-    "quit",       "help",      "phone",      "trunk",    "delphone", "makecall",
-    "answer",     "accept",    "drop",       "release",  "chan_oos", "chan_ins",
-    "trunk_ins",  "trunk_oos", "origaddr",   "destaddr", "deltrunk", "reset",
-    "disablelbk", "linelbk",   "payloadlbk", "startrai", "stoprai"};
-
-const std::vector<std::string> REGISTRATION = {
-    "quit",       "help",      "phone",      "delphone", "trunk",    "makecall",
-    "answer",     "accept",    "drop",       "release",  "chan_oos", "chan_ins",
-    "trunk_ins",  "trunk_oos", "origaddr",   "destaddr", "deltrunk", "reset",
-    "disablelbk", "linelbk",   "payloadlbk", "startrai", "stoprai"};
-
 std::vector<std::string> RegisteredNames(const std::string& trace) {
     std::vector<std::string> names;
     const std::string marker = "command name: ";
@@ -38,30 +27,40 @@ std::vector<std::string> RegisteredNames(const std::string& trace) {
     return names;
 }
 
-TEST(CommandTable, HoldsEveryWordInCreationAndRegistrationOrder) {
-    EXPECT_EQ(
-        std::vector<std::string>(COMMAND_CREATION_ORDER.begin(), COMMAND_CREATION_ORDER.end()),
-        CREATION);
-    EXPECT_EQ(std::vector<std::string>(COMMAND_REGISTRATION_ORDER.begin(),
-                                       COMMAND_REGISTRATION_ORDER.end()),
-              REGISTRATION);
+TEST(CommandTable, MakesOneCommandForEachWordUnderThatWord) {
+    const std::vector<std::unique_ptr<Command>> commands = CreateCommands({});
+
+    ASSERT_EQ(commands.size(), COMMAND_TABLE.size());
+    std::set<std::string> words;
+    for (std::size_t i = 0; i < commands.size(); ++i) {
+        ASSERT_NE(commands[i], nullptr) << COMMAND_TABLE[i].word;
+        EXPECT_EQ(commands[i]->GetCommandName(), COMMAND_TABLE[i].word);
+        words.insert(commands[i]->GetCommandName());
+    }
+    EXPECT_EQ(words.size(), COMMAND_TABLE.size()) << "a word made twice would shadow a command";
 }
 
-TEST(CommandTable, RegistersCreatedCommandsInRegistrationOrder) {
-    std::vector<std::unique_ptr<Command>> owned;
+TEST(CommandTable, RegistersTheCreatedCommandsInRegistrationOrder) {
+    const std::vector<std::unique_ptr<Command>> owned = CreateCommands({});
     std::vector<Command*> created;
-    for (const std::string& name : CREATION) {
-        owned.push_back(std::make_unique<Command>(name));
-        created.push_back(owned.back().get());
+    for (const std::unique_ptr<Command>& command : owned) {
+        created.push_back(command.get());
+    }
+    std::vector<std::string> expected(COMMAND_TABLE.size());
+    for (const CommandEntry& entry : COMMAND_TABLE) {
+        ASSERT_LT(entry.registration, expected.size()) << entry.word;
+        EXPECT_TRUE(expected[entry.registration].empty()) << "two words at one place";
+        expected[entry.registration] = std::string(entry.word);
     }
     CmdProcessor processor(nullptr);
     CoutCapture out;
 
     RegisterCommands(processor, created);
 
-    EXPECT_EQ(RegisteredNames(out.Text()), REGISTRATION);
-    for (std::size_t i = 0; i < CREATION.size(); ++i) {
-        EXPECT_EQ(processor.FindCommand(CREATION[i]), created[i]) << CREATION[i];
+    EXPECT_EQ(RegisteredNames(out.Text()), expected);
+    for (std::size_t i = 0; i < created.size(); ++i) {
+        EXPECT_EQ(processor.FindCommand(std::string(COMMAND_TABLE[i].word)), created[i])
+            << COMMAND_TABLE[i].word;
     }
 }
 

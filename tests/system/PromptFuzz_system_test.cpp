@@ -21,15 +21,23 @@
 #include "ConsoleScreen.h"
 #include "SystemRun.h"
 #include "TerminalSession.h"
+#include "console/CommandTable.h"
 
 namespace lineprobe::testing {
 namespace {
 
-constexpr std::array<const char*, 22> WORDS{
-    "help",      "phone",      "trunk",    "delphone", "makecall", "answer",
-    "accept",    "drop",       "release",  "chan_oos", "chan_ins", "trunk_ins",
-    "trunk_oos", "origaddr",   "destaddr", "deltrunk", "reset",    "disablelbk",
-    "linelbk",   "payloadlbk", "startrai", "stoprai"};
+// Every word of the prompt but quit, which would end the run.
+std::vector<std::string> Words() {
+    std::vector<std::string> words;
+    for (const CommandEntry& entry : COMMAND_TABLE) {
+        if (entry.word != "quit") {
+            words.emplace_back(entry.word);
+        }
+    }
+    return words;
+}
+
+const std::vector<std::string> WORDS = Words();
 
 constexpr std::array<const char*, 14> NUMBERS{"0",
                                               "1",
@@ -70,7 +78,7 @@ class LineMaker {
                 break;
             }
             case 3:  // a known word followed by a long text field
-                line = std::string(WORDS[random_() % WORDS.size()]) + " 1 1 1 " +
+                line = WORDS[random_() % WORDS.size()] + " 1 1 1 " +
                        std::string(200 + random_() % 400, static_cast<char>('0' + random_() % 10));
                 break;
             case 4:  // one long word, longer than any buffer of the prompt

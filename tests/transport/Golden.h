@@ -1,5 +1,4 @@
-#ifndef LINEPROBE_TESTS_TRANSPORT_GOLDEN_H
-#define LINEPROBE_TESTS_TRANSPORT_GOLDEN_H
+#pragma once
 
 #include <gtest/gtest.h>
 
@@ -38,5 +37,3 @@ inline void PutU32(Bytes& b, unsigned int v) {
     b.push_back(static_cast<unsigned char>(v >> 8));
     b.push_back(static_cast<unsigned char>(v));
 }
-
-#endif

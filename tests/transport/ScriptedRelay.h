@@ -1,6 +1,5 @@
 // A relay peer for tests: listens on loopback, accepts one connection and plays a script on it.
-#ifndef LINEPROBE_TESTS_TRANSPORT_SCRIPTEDRELAY_H
-#define LINEPROBE_TESTS_TRANSPORT_SCRIPTEDRELAY_H
+#pragma once
 
 #include <arpa/inet.h>
 #include <gtest/gtest.h>
@@ -131,5 +130,3 @@ class ScriptedRelay {
     int port = 0;
     std::thread worker;
 };
-
-#endif

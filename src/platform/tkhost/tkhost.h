@@ -1,7 +1,6 @@
 // Host message library: message blocks, their header and body fields, and local queues.
 // C-callable, so that the code above calls it exactly as it would call the vendor's library.
-#ifndef LINEPROBE_PLATFORM_TKHOST_TKHOST_H
-#define LINEPROBE_PLATFORM_TKHOST_TKHOST_H
+#pragma once
 
 #include <stdint.h>
 
@@ -115,6 +114,4 @@ TKStatus tkMsgVarFieldGet(TKMsg32Bit* msg, int fieldCount, unsigned int* offset,
 
 #ifdef __cplusplus
 }
-#endif
-
 #endif

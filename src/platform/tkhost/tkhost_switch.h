@@ -1,6 +1,5 @@
 // The switch behind the local queues, and the plug where the board emulation attaches.
-#ifndef LINEPROBE_PLATFORM_TKHOST_TKHOST_SWITCH_H
-#define LINEPROBE_PLATFORM_TKHOST_TKHOST_SWITCH_H
+#pragma once
 
 #include <cstdint>
 
@@ -34,5 +33,3 @@ void tkSwitchResetUndeliverableCount();
 void tkSwitchSetQueueLimit(unsigned int n);
 
 constexpr std::uint8_t TK_HOST_BOARD = 0xFF;
-
-#endif

@@ -1,5 +1,4 @@
-#ifndef LINEPROBE_PLATFORM_UNITMAP_H
-#define LINEPROBE_PLATFORM_UNITMAP_H
+#pragma once
 
 /* Stand-in for the closed device map library: a tree of AUs (addressable units) built from the
  * farm (platform/farm/ActiveFarm.h), each with named attributes.
@@ -65,6 +64,4 @@ int um_initAttributeStruct(um_attribute* attribute, const char* name, void* valu
 
 #ifdef __cplusplus
 }
-#endif
-
 #endif

@@ -1,5 +1,4 @@
-#ifndef LINEPROBE_PLATFORM_ZLG_H
-#define LINEPROBE_PLATFORM_ZLG_H
+#pragma once
 
 /* Stand-in for the closed trace library. Module and label handles are small integers handed out
  * by name (the same name always gives the same handle, from 1). Each trace is one line appended
@@ -35,6 +34,4 @@ int ZlgTraceNoClient(ZLG_HANDLE module, ZLG_HANDLE label, const char* text);
 
 #ifdef __cplusplus
 }
-#endif
-
 #endif

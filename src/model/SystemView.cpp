@@ -1,4 +1,4 @@
-#include "console/SystemView.h"
+#include "model/SystemView.h"
 
 #include <cstdint>
 #include <cstring>
