@@ -12,8 +12,11 @@ A schema is line based. '#' starts a comment. Lines:
     elem <Elem> <field>...         (indented) element body nested in the body above
     hand <Elem> <Template>         (indented) hand-written element: <Template><Outer>
 
+The wire schema (wire.schema) declares the element types (name, code, width, host type and
+the word that the body schemas use) and the layout of the descriptor word; see its header.
+
 A field is <Label>:<type> with <type> one of
-  u8 u16 u32 word32 i32            numbers
+  u8 u16 u32 word32 i32            numbers (the wire schema's `scalar` words)
   CompDesc_t                       a contained address
   char[N] u8[N]                    fixed run of N
   u8[X] u16[X] u32[X] char[X]      run counted by the earlier field X
@@ -22,8 +25,9 @@ A field is <Label>:<type> with <type> one of
   dcv(X)                           value shaped by the descriptor in field X
   @Ops(X)                          hand-written field: cat::Ops<Outer>::ops, argument field X
 
-Output (deterministic, no timestamps): <outdir>/catalogue/generated/<name>_bodies.{h,cpp}
-for each class, <outdir>/catalogue/generated/index.{h,cpp} listing every body, and
+Output (deterministic, no timestamps): <outdir>/catalogue/generated/wire.h, the type codes,
+their widths and the descriptor helpers; <outdir>/catalogue/generated/<name>_bodies.{h,cpp}
+for each class (fields, constructors and a field table; cat::Body does the rest), <outdir>/catalogue/generated/index.{h,cpp} listing every body, and
 <outdir>/catalogue/generated/vx7relay.lua, the Wireshark decoder of the relay protocol
 (written by luagen.py from the same tables).
 """
