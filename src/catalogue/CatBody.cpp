@@ -4,6 +4,12 @@
 
 namespace tolk::cat {
 
+Owned::~Owned() {
+    for (unsigned int i = 0; i < n_; ++i) {
+        delete entries_[i].obj;
+    }
+}
+
 void Owned::adopt(ValueWord* word, virtualObject* obj) {
     release(word);
     if (n_ == kMax) {

@@ -3,8 +3,12 @@
 // Table-driven marshalling shared by every body of the catalogue. catgen.py writes one
 // BodyDesc per body; the walker below is the only code that turns a table into field calls.
 
+#include <algorithm>
+#include <array>
+#include <cstddef>
 #include <cstdint>
 #include <ostream>
+#include <type_traits>
 
 #include "catalogue/generated/wire.h"
 #include "framework/CompAttr_t.h"
@@ -17,7 +21,7 @@
 namespace tolk::cat {
 
 // Bumped whenever the meaning of the tables changes; generated files assert it.
-inline constexpr unsigned int kFormatVersion = 3;
+inline constexpr unsigned int kFormatVersion = 4;
 
 // A word that holds either a small value or the address of an object allocated by readMsg.
 // It is pointer-sized so that an address survives on 64-bit hosts.
@@ -89,7 +93,8 @@ class Owned {
     Owned() = default;
     Owned(const Owned&) = delete;
     Owned& operator=(const Owned&) = delete;
-    ~Owned() { clear(); }
+    // Deletes what it holds but leaves the words alone: in a generated body they are gone by now.
+    ~Owned();
 
     void adopt(ValueWord* word, virtualObject* obj);
     // Deletes what was adopted for this word, if anything, and clears the word.
@@ -113,6 +118,84 @@ class Owned {
 [[nodiscard]] unsigned int sizeBody(const BodyDesc& d, void* const* refs);
 void printBody(const BodyDesc& d, void* const* refs, std::ostream* os);
 void copyBody(const BodyDesc& d, void* const* dst, void* const* src, Owned* owned);
+
+// The field pointers of one body, in table order.
+template <std::size_t N>
+using Refs = std::array<void*, N>;
+
+// A generated body: its field table (D::Desc) and its field pointers (D::refs()) are all that
+// it declares; marshalling, size, text and copy come from here. Owns: some field holds an
+// object that readMsg allocates (a shaped value or a hand-written field).
+template <class D, bool Owns = false>
+class Body : public MsgBody {
+  public:
+    unsigned int writeMsg(Msg* m, unsigned int off) override {
+        return writeBody(D::Desc, self().refs().data(), m, off);
+    }
+    unsigned int readMsg(Msg* m, unsigned int off) override {
+        return readBody(D::Desc, self().refs().data(), owned(), m, off);
+    }
+    unsigned int GetByteSize() override { return sizeBody(D::Desc, self().refs().data()); }
+    void toStream(std::ostream* os) const override {
+        printBody(D::Desc, const_cast<Body*>(this)->self().refs().data(), os);
+    }
+
+  protected:
+    Body() = default;
+    // The objects that the other body owns stay with it: copyFrom makes copies of its own.
+    Body(const Body& other) : MsgBody(other) {}
+    Body& operator=(const Body&) { return *this; }
+    ~Body() override = default;
+
+    // Copies the values behind the other body's pointers into the fields behind this one's.
+    void copyFrom(const D& other) {
+        copyBody(D::Desc, self().refs().data(), const_cast<D&>(other).refs().data(), owned());
+    }
+    D& assign(const D& other) {
+        if (&other != &self()) {
+            copyFrom(other);
+        }
+        return self();
+    }
+
+  private:
+    struct NoObjects {};
+    D& self() { return static_cast<D&>(*this); }
+    Owned* owned() {
+        if constexpr (Owns) {
+            return &owned_;
+        } else {
+            return nullptr;
+        }
+    }
+    [[no_unique_address]] std::conditional_t<Owns, Owned, NoObjects> owned_;
+};
+
+// One numbered body of a class's message or event table.
+struct NumberedBody {
+    unsigned int number;
+    const char* name;
+    MsgBody* (*make)();
+};
+
+template <class B>
+MsgBody* makeBody() {
+    return new B();
+}
+
+// The entry for a number in a table sorted by number, or null.
+template <std::size_t N>
+const NumberedBody* findNumber(const NumberedBody (&table)[N], unsigned int number) {
+    const NumberedBody* end = table + N;
+    const NumberedBody* at = std::lower_bound(
+        table, end, number, [](const NumberedBody& e, unsigned int n) { return e.number < n; });
+    return at != end && at->number == number ? at : nullptr;
+}
+
+template <class B>
+MsgBody* cloneBody(const MsgBody& b) {
+    return new B(static_cast<const B&>(b));
+}
 
 // Bytes left in the message behind `off`; 0 when `off` is at or beyond the end.
 unsigned int bytesLeft(Msg* m, unsigned int off);

@@ -107,3 +107,31 @@ inline void chars(Bytes& b, const char* s, std::size_t fixed) {
 }
 
 }  // namespace golden
+
+namespace golden {
+
+// Filled into a message before a body writes it; the byte behind the body must keep it.
+inline constexpr std::uint8_t kCanary = 0xA5;
+
+struct Canaried {
+    Bytes bytes;           // the body's bytes as written, GetByteSize of them
+    unsigned int size;     // GetByteSize
+    unsigned int written;  // writeMsg's result
+    bool canaryKept;       // the byte behind GetByteSize is untouched
+};
+
+// As encode, into a message one byte longer than GetByteSize and filled with the canary, so
+// that a body writing past its size, or leaving a gap, shows in the bytes.
+inline Canaried encodeCanaried(tolk::MsgBody& body) {
+    Canaried c;
+    c.size = body.GetByteSize();
+    tolk::Msg m(c.size + 1);
+    std::memset(bodyOf(m), kCanary, c.size + 1);
+    c.written = body.writeMsg(&m, 0);
+    const std::uint8_t* p = bodyOf(m);
+    c.bytes = Bytes(p, p + c.size);
+    c.canaryKept = p[c.size] == kCanary;
+    return c;
+}
+
+}  // namespace golden

@@ -15,8 +15,11 @@ A schema is line based. '#' starts a comment. Lines:
                                    parameter id, ...), for every layer that must write it
   op <Name> <Cmd> ...              an operation family of the class (see opgen.py)
 
+The wire schema (wire.schema) declares the element types (name, code, width, host type and
+the word that the body schemas use) and the layout of the descriptor word; see its header.
+
 A field is <Label>:<type> with <type> one of
-  u8 u16 u32 word32 i32            numbers
+  u8 u16 u32 word32 i32            numbers (the wire schema's `scalar` words)
   CompDesc_t                       a contained address
   char[N] u8[N]                    fixed run of N
   u8[X] u16[X] u32[X] char[X]      run counted by the earlier field X
@@ -25,11 +28,12 @@ A field is <Label>:<type> with <type> one of
   dcv(X)                           value shaped by the descriptor in field X
   @Ops(X)                          hand-written field: cat::Ops<Outer>::ops, argument field X
 
-Output (deterministic, no timestamps): <outdir>/catalogue/generated/<name>_bodies.{h,cpp}
-and <name>_ops.{h,cpp} (the operations, written by opgen.py)
-for each class, <outdir>/catalogue/generated/index.{h,cpp} listing every body,
-<outdir>/catalogue/generated/values.h with the named values as
-tolk::wire::<Class>::<Group>::<NAME> (header only: layers below the catalogue include it), and
+Output (deterministic, no timestamps), in <outdir>/catalogue/generated/: wire.h, the type
+codes, their widths and the descriptor helpers; for each class <name>_bodies.{h,cpp} (fields,
+constructors and a field table; cat::Body does the rest) and <name>_ops.{h,cpp} (the
+operations, written by opgen.py); index.{h,cpp} listing every body; values.h with the named
+values as tolk::wire::<Class>::<Group>::<NAME> (header only: layers below the catalogue
+include it); and
 <outdir>/catalogue/generated/vx7relay.lua, the Wireshark decoder of the relay protocol
 (written by luagen.py from the same tables).
 """
@@ -41,7 +45,7 @@ import sys
 import luagen
 import opgen
 
-FORMAT_VERSION = 3
+FORMAT_VERSION = 4
 
 # Filled from the wire schema before any body schema is read: the numbers and widths of the
 # element types live there, not here.
@@ -400,58 +404,48 @@ def snake(name):
 # ---------------------------------------------------------------- header
 
 
-def emit_decl(b, ind, outer_name):
+def emit_decl(b, ind):
+    """A body is its fields and its constructors; cat::Body walks Desc for everything else."""
     p = " " * ind
-    out = []
-    out.append(f"{p}class {b.name} : public MsgBody {{")
-    out.append(f"{p}public:")
+    elem = b.role == "elem"
+    owns = "true" if b.needs_owned() else "false"
+    out = [f"{p}class {b.name} : public cat::Body<{b.name}, {owns}> {{", f"{p}public:"]
     for h_name, tmpl in b.hands:
         out.append(f"{p}    class {h_name} : public {tmpl}<{b.name}> {{}};")
     for e in b.elems:
-        out.extend(emit_decl(e, ind + 4, b.name))
-    if b.role == "elem":
+        out.extend(emit_decl(e, ind + 4))
+    if elem:
         mw = max(1, sum(f.min_wire() for f in b.fields))
         out.append(f"{p}    static constexpr unsigned int kMinWireSize = {mw};")
     else:
         what = "MsgType" if b.role == "msg" else "EvtGroup_"
         out.append(f"{p}    static constexpr unsigned int {what} = 0x{b.number:X};")
     out.append(f"{p}    static const cat::BodyDesc Desc;")
-    out.append("")
-    out.append(f"{p}    {b.name}();")
-    out.append(f"{p}    {b.name}(const {b.name}& other);")
-    if b.role == "elem":
-        out.append(f"{p}    {b.name}& operator=(const {b.name}& other);")
-    else:
+    for f in b.fields:
+        init = " = 0" if f.kind in ("Scalar", "DescValue", "Custom") else ""
+        ptr = "" if elem else f" {f.ctype}* p{f.label} = &{f.label};"
+        out.append(f"{p}    {f.ctype} {f.label}{init};{ptr}")
+    out.append(f"{p}    {b.name}() = default;")
+    if not elem:
+        out.append(f"{p}    {b.name}(const {b.name}& o) : Body(o) {{ copyFrom(o); }}")
         out.append(f"{p}    {b.name}& operator=(const {b.name}&) = delete;")
         if b.fields:
             args = ", ".join(f"{f.ctype}& {f.label}_" for f in b.fields)
+            inits = ", ".join(f"p{f.label}(&{f.label}_)" for f in b.fields)
             explicit = "explicit " if len(b.fields) == 1 else ""
-            out.append(f"{p}    {explicit}{b.name}({args});")
-    out.append(f"{p}    ~{b.name}() override;")
-    out.append("")
-    out.append(f"{p}    void toStream(std::ostream* os) const override;")
-    out.append(f"{p}    unsigned int writeMsg(Msg* msg, unsigned int offset) override;")
-    out.append(f"{p}    unsigned int readMsg(Msg* msg, unsigned int offset) override;")
-    out.append(f"{p}    unsigned int GetByteSize() override;")
-    out.append("")
-    for f in b.fields:
-        init = " = 0" if f.kind in ("Scalar", "DescValue", "Custom") else ""
-        out.append(f"{p}    {f.ctype} {f.label}{init};")
-    if b.role != "elem":
-        for f in b.fields:
-            out.append(f"{p}    {f.ctype}* p{f.label};")
-    if b.needs_owned():
-        out.append("")
-        out.append(f"{p}private:")
-        out.append(f"{p}    cat::Owned owned_;")
+            out.append(f"{p}    {explicit}{b.name}({args}) : {inits} {{}}")
+    elif b.needs_owned():
+        out.append(f"{p}    {b.name}(const {b.name}& o) : Body(o) {{ copyFrom(o); }}")
+        out.append(f"{p}    {b.name}& operator=(const {b.name}& o) {{ return assign(o); }}")
+    refs = ", ".join(f"&{f.label}" if elem else f"p{f.label}" for f in b.fields)
+    out.append(f"{p}    cat::Refs<{len(b.fields)}> refs() {{ return {{{refs}}}; }}")
     out.append(f"{p}}};")
-    out.append("")
     return out
 
 
 def header(c):
     g = f"generated from {c.schema} by catgen.py; do not edit"
-    out = [f"// {g}", "#pragma once", "", "#include <ostream>", "", '#include "catalogue/CatBody.h"']
+    out = [f"// {g}", "#pragma once", "", '#include "catalogue/CatBody.h"']
     for inc in c.includes:
         out.append(f'#include "{inc}"')
     out += [
@@ -465,7 +459,7 @@ def header(c):
         f"struct {c.name}_Bodies {{",
     ]
     for b in c.bodies:
-        out.extend(emit_decl(b, 4, None))
+        out.extend(emit_decl(b, 4))
     out += [
         "    // A new default-constructed body for a number, or null if this table has none.",
         "    static MsgBody* msgLookup(unsigned int type);",
@@ -484,136 +478,62 @@ def header(c):
 # ---------------------------------------------------------------- source
 
 
-def emit_defs(b, q, tables):
-    """q: qualified class name."""
+def emit_defs(b, q, descs):
+    """q: qualified class name. The field tables of b and of its elements; their Desc
+    definitions go to descs."""
     out = []
     for e in b.elems:
-        out.extend(emit_defs(e, f"{q}::{e.name}", tables))
-    tname = "kF_" + re.sub(r"\W", "_", q)
-    n = len(b.fields)
-    rows = []
-    for f in b.fields:
-        custom = "nullptr"
-        if f.kind == "Custom":
-            custom = f"&cat::{f.custom}<{q}>::ops"
-        rows.append(
-            f'    {{"{f.label}", cat::Kind::{f.kind}, {"wire::" + f.code_name if f.code_name else "{}"}, {f.fixed}, {f.ref}, '
-            f"{f.list_ops(q)}, {custom}}},"
-        )
+        out.extend(emit_defs(e, f"{q}::{e.name}", descs))
     number = b.number if b.role != "elem" else 0
-    if n:
-        tables.append(f"// Fields of {q}.")
-        tables.append(f"constexpr cat::Field {tname}[] = {{")
-        tables.extend(rows)
-        tables.append("};")
-        out.append(f'const cat::BodyDesc {q}::Desc{{"{b.name}", 0x{number:X}, {tname}, {n}}};')
-    else:
-        out.append(f'const cat::BodyDesc {q}::Desc{{"{b.name}", 0x{number:X}, nullptr, 0}};')
-    short = b.name
-    elem = b.role == "elem"
-
-    def refs_of(obj=""):
-        if elem:
-            return ", ".join(f"&{obj}{f.label}" for f in b.fields)
-        return ", ".join(f"{obj}p{f.label}" for f in b.fields)
-
-    owned = "&owned_" if b.needs_owned() else "nullptr"
-    inits = "" if elem or not n else " : " + ", ".join(f"p{f.label}(&{f.label})" for f in b.fields)
-    out.append(f"{q}::{short}(){inits} {{}}")
-    cinits = ["MsgBody(other)"]
-    if not elem:
-        cinits += [f"p{f.label}(&{f.label})" for f in b.fields]
-    out.append(f"{q}::{short}(const {short}& other) : {', '.join(cinits)} {{")
-    if n:
-        out.append(f"    void* const dst[] = {{{refs_of()}}};")
-        src = refs_of("other.")
-        if elem:
-            src = ", ".join(f"const_cast<void*>(static_cast<const void*>(&other.{f.label}))" for f in b.fields)
-        out.append(f"    void* const src[] = {{{src}}};")
-        out.append(f"    cat::copyBody(Desc, dst, src, {owned});")
-    out.append("}")
-    if elem:
-        out.append(f"{q}& {q}::operator=(const {short}& other) {{")
-        if n:
-            out.append("    if (this != &other) {")
-            out.append(f"        void* const dst[] = {{{refs_of()}}};")
-            src = ", ".join(f"const_cast<void*>(static_cast<const void*>(&other.{f.label}))" for f in b.fields)
-            out.append(f"        void* const src[] = {{{src}}};")
-            out.append(f"        cat::copyBody(Desc, dst, src, {owned});")
-            out.append("    }")
-        out.append("    return *this;")
-        out.append("}")
-    elif n:
-        args = ", ".join(f"{f.ctype}& {f.label}_" for f in b.fields)
-        rinits = ", ".join(f"p{f.label}(&{f.label}_)" for f in b.fields)
-        out.append(f"{q}::{short}({args}) : {rinits} {{}}")
-    out.append(f"{q}::~{short}() = default;")
-    if n:
-        cref = refs_of()
-        if elem:
-            cref = ", ".join(f"const_cast<void*>(static_cast<const void*>(&{f.label}))" for f in b.fields)
-        out.append(f"void {q}::toStream(std::ostream* os) const {{")
-        out.append(f"    void* const r[] = {{{cref}}};")
-        out.append("    cat::printBody(Desc, r, os);")
-        out.append("}")
-        out.append(f"unsigned int {q}::writeMsg(Msg* msg, unsigned int offset) {{")
-        out.append(f"    void* const r[] = {{{refs_of()}}};")
-        out.append("    return cat::writeBody(Desc, r, msg, offset);")
-        out.append("}")
-        out.append(f"unsigned int {q}::readMsg(Msg* msg, unsigned int offset) {{")
-        out.append(f"    void* const r[] = {{{refs_of()}}};")
-        out.append(f"    return cat::readBody(Desc, r, {owned}, msg, offset);")
-        out.append("}")
-        out.append(f"unsigned int {q}::GetByteSize() {{")
-        out.append(f"    void* const r[] = {{{refs_of()}}};")
-        out.append("    return cat::sizeBody(Desc, r);")
-        out.append("}")
-    else:
-        out.append(f'void {q}::toStream(std::ostream* os) const {{ *os << "{{}}"; }}')
-        out.append(f"unsigned int {q}::writeMsg(Msg*, unsigned int offset) {{ return offset; }}")
-        out.append(f"unsigned int {q}::readMsg(Msg*, unsigned int offset) {{ return offset; }}")
-        out.append(f"unsigned int {q}::GetByteSize() {{ return 0; }}")
-    out.append("")
+    table = "nullptr"
+    if b.fields:
+        table = "kF_" + re.sub(r"\W", "_", q)
+        out.append(f"constexpr cat::Field {table}[] = {{")
+        for f in b.fields:
+            code = f"wire::{f.code_name}" if f.code_name else "{}"
+            custom = f"&cat::{f.custom}<{q}>::ops" if f.kind == "Custom" else "nullptr"
+            out.append(
+                f'    {{"{f.label}", cat::Kind::{f.kind}, {code}, {f.fixed}, {f.ref}, '
+                f"{f.list_ops(q)}, {custom}}},"
+            )
+        out.append("};")
+    descs.append(f'const cat::BodyDesc {q}::Desc{{"{b.name}", 0x{number:X}, {table}, {len(b.fields)}}};')
     return out
 
 
 def source(c, hname):
     g = f"generated from {c.schema} by catgen.py; do not edit"
     bq = f"{c.name}_Bodies"
-    tables = []
-    defs = []
-    for b in c.bodies:
-        defs.extend(emit_defs(b, f"{bq}::{b.name}", tables))
     out = [f"// {g}", f'#include "catalogue/generated/{hname}"', "", "namespace tolk {", ""]
     out.append("namespace {")
     out.append("")
-    out.extend(tables)
-    out.append("")
-    out.append("}  // namespace")
-    out.append("")
-    out.extend(defs)
+    descs = []
+    for b in c.bodies:
+        out.extend(emit_defs(b, f"{bq}::{b.name}", descs))
+    out += ["", "}  // namespace", ""] + descs + ["", "namespace {", ""]
+    for role in ("msg", "evt"):
+        rows = sorted((b.number, b.name) for b in c.bodies if b.role == role)
+        if rows:
+            out.append(f"// Sorted by number for cat::findNumber.")
+            out.append(f"constexpr cat::NumberedBody k{role.capitalize()}s[] = {{")
+            out += [f'    {{0x{n:X}, "{name}", &cat::makeBody<{bq}::{name}>}},' for n, name in rows]
+            out.append("};")
+    out += ["", "}  // namespace", ""]
     for role, fn, nfn in (("msg", "msgLookup", "msgTypeName"), ("evt", "evtLookup", "evtGroupName")):
         arg = "type" if role == "msg" else "group"
-        out.append(f"MsgBody* {bq}::{fn}(unsigned int {arg}) {{")
-        out.append(f"    switch ({arg}) {{")
-        for b in c.bodies:
-            if b.role == role:
-                out.append(f"        case 0x{b.number:X}:")
-                out.append(f"            return new {b.name}();")
-        out.append("        default:")
-        out.append("            return nullptr;")
-        out.append("    }")
-        out.append("}")
-        out.append(f"const char* {bq}::{nfn}(unsigned int {arg}) {{")
-        out.append(f"    switch ({arg}) {{")
-        for b in c.bodies:
-            if b.role == role:
-                out.append(f"        case 0x{b.number:X}:")
-                out.append(f'            return "{b.name}";')
-        out.append("        default:")
-        out.append("            return nullptr;")
-        out.append("    }")
-        out.append("}")
+        if any(b.role == role for b in c.bodies):
+            found = f"cat::findNumber(k{role.capitalize()}s, {arg})"
+            out.append(f"MsgBody* {bq}::{fn}(unsigned int {arg}) {{")
+            out.append(f"    const cat::NumberedBody* b = {found};")
+            out.append("    return b == nullptr ? nullptr : b->make();")
+            out.append("}")
+            out.append(f"const char* {bq}::{nfn}(unsigned int {arg}) {{")
+            out.append(f"    const cat::NumberedBody* b = {found};")
+            out.append("    return b == nullptr ? nullptr : b->name;")
+            out.append("}")
+        else:
+            out.append(f"MsgBody* {bq}::{fn}(unsigned int) {{ return nullptr; }}")
+            out.append(f"const char* {bq}::{nfn}(unsigned int) {{ return nullptr; }}")
     out += ["", "}  // namespace tolk", ""]
     return "\n".join(out)
 
@@ -636,6 +556,7 @@ def index_files(classes, headers):
         "    char role;         // 'm' message, 'e' event, 'l' list element",
         "    unsigned int number;",
         "    MsgBody* (*make)();",
+        "    MsgBody* (*copy)(const MsgBody&);  // a copy of a body of this entry",
         "    const BodyDesc* desc;  // the body's table; null for hand-written elements",
         "};",
         "",
@@ -656,10 +577,10 @@ def index_files(classes, headers):
         q = f"{prefix}::{b.name}" if prefix else b.name
         full = f"{c.name}_Bodies::{q}"
         r = {"msg": "m", "evt": "e", "elem": "l"}[role]
-        s.append(f'    {{"{c.name}", "{q}", \'{r}\', 0x{b.number:X}, []() -> MsgBody* {{ return new {full}(); }}, &{full}::Desc}},')
+        s.append(f'    {{"{c.name}", "{q}", \'{r}\', 0x{b.number:X}, &makeBody<{full}>, &cloneBody<{full}>, &{full}::Desc}},')
         count += 1
         for hn, _ in b.hands:
-            s.append(f'    {{"{c.name}", "{q}::{hn}", \'l\', 0x0, []() -> MsgBody* {{ return new {full}::{hn}(); }}, nullptr}},')
+            s.append(f'    {{"{c.name}", "{q}::{hn}", \'l\', 0x0, &makeBody<{full}::{hn}>, &cloneBody<{full}::{hn}>, nullptr}},')
             count += 1
         for e in b.elems:
             walk(c, e, q, "elem")
