@@ -2,14 +2,6 @@
 
 namespace tolk {
 
-namespace {
-
-cat::ValueWord wordOf(staticList<unsigned char>* list) {
-    return reinterpret_cast<cat::ValueWord>(list);
-}
-
-}  // namespace
-
 CAS::CAS(const CompDesc_t& target, isa::RefPtr<MsgQueue>& q) : Instance(target, q) {
     registerNullHandlers();
 }
@@ -23,7 +15,7 @@ CAS::CAS(const CAS& other) : Instance(other), CAS_Bodies() {
 }
 
 void CAS::registerNullHandlers() {
-    asyncRegisterMsgType(0x1416, static_cast<EvtCallback::MsgFn>(nullptr), 0);
+    asyncRegisterMsgType(MsgDialCmplt_t::MsgType, static_cast<EvtCallback::MsgFn>(nullptr), 0);
 }
 
 CAS::~CAS() {
@@ -42,104 +34,6 @@ MsgBody* CAS::EvtBodyLookup(unsigned int group) {
         return body;
     }
     return Instance::superEvtBodyLookup(group);
-}
-
-void CAS::DisableSignal(MsgDisableSignal_t* body, MsgDisableSignalCmplt_t* ret) {
-    request(0x1407, body, 0x1408, ret);
-}
-
-void CAS::DisableSignal(unsigned int SignalId, MsgDisableSignalCmplt_t* ret) {
-    MsgDisableSignal_t body(SignalId);
-    request(0x1407, &body, 0x1408, ret);
-}
-
-void CAS::EnableSignal(MsgEnableSignal_t* body, MsgEnableSignalCmplt_t* ret) {
-    request(0x1409, body, 0x140A, ret);
-}
-
-void CAS::EnableSignal(unsigned int SignalId, MsgEnableSignalCmplt_t* ret) {
-    MsgEnableSignal_t body(SignalId);
-    request(0x1409, &body, 0x140A, ret);
-}
-
-void CAS::GenerateSignal(MsgGenerateSignal_t* body, MsgGenerateSignalCmplt_t* ret) {
-    request(0x140B, body, 0x140C, ret);
-}
-
-void CAS::GenerateSignal(unsigned int SignalId, MsgGenerateSignalCmplt_t* ret) {
-    GenerateSignal(SignalId, static_cast<unsigned short>(0), 0, ret);
-}
-
-void CAS::GenerateSignal(unsigned int SignalId, unsigned short Count,
-                         MsgGenerateSignalCmplt_t* ret) {
-    GenerateSignal(SignalId, Count, 0, ret);
-}
-
-// The default list lives on the stack for the send, instead of being left on the heap.
-void CAS::GenerateSignal(unsigned int SignalId, unsigned short Count, unsigned char Format,
-                         MsgGenerateSignalCmplt_t* ret) {
-    staticList<unsigned char> empty;
-    GenerateSignal(SignalId, Count, Format, wordOf(&empty), ret);
-}
-
-void CAS::GenerateSignal(unsigned int SignalId, unsigned short Count, unsigned char Format,
-                         cat::ValueWord SignalList, MsgGenerateSignalCmplt_t* ret) {
-    MsgGenerateSignal_t body(SignalId, Count, Format, SignalList);
-    request(0x140B, &body, 0x140C, ret);
-}
-
-void CAS::StartGenerateSignal(MsgGenerateSignal_t* body) {
-    request(0x140B, body);
-}
-
-void CAS::StartGenerateSignal(unsigned int SignalId, unsigned short Count, unsigned char Format) {
-    staticList<unsigned char> empty;
-    StartGenerateSignal(SignalId, Count, Format, wordOf(&empty));
-}
-
-void CAS::StartGenerateSignal(unsigned int SignalId, unsigned short Count, unsigned char Format,
-                              cat::ValueWord SignalList) {
-    MsgGenerateSignal_t body(SignalId, Count, Format, SignalList);
-    request(0x140B, &body);
-}
-
-void CAS::Dial(MsgDial_t* body, MsgDialCmplt_t* ret) {
-    request(0x1415, body, 0x1416, ret);
-}
-
-void CAS::Dial(unsigned int SignalId, const staticList<char>& DigitString, MsgDialCmplt_t* ret) {
-    staticList<char> digits(DigitString);
-    MsgDial_t body(SignalId, digits);
-    request(0x1415, &body, 0x1416, ret);
-}
-
-void CAS::StartDial(MsgDial_t* body) {
-    request(0x1415, body);
-}
-
-void CAS::StartDial(unsigned int SignalId, const staticList<char>& DigitString) {
-    staticList<char> digits(DigitString);
-    MsgDial_t body(SignalId, digits);
-    request(0x1415, &body);
-}
-
-void CAS::StopSignal(MsgStopSignal_t* body) {
-    request(0x140D, body);
-}
-
-void CAS::StopSignal() {
-    MsgStopSignal_t body;
-    request(0x140D, &body);
-}
-
-void CAS::MatchCondition(MsgMatchCondition_t* body, MsgMatchConditionCmplt_t* ret) {
-    request(0x1417, body, 0x1418, ret);
-}
-
-void CAS::MatchCondition(unsigned int SignalId, unsigned char Condition,
-                         MsgMatchConditionCmplt_t* ret) {
-    MsgMatchCondition_t body(SignalId, Condition);
-    request(0x1417, &body, 0x1418, ret);
 }
 
 }  // namespace tolk

@@ -50,7 +50,7 @@ Cluster::~Cluster() {
     delete resourceMgr;
 }
 
-// A cluster is also answered with the cluster service's records (0x800007, 0x80002C).
+// A cluster is also answered with two of the cluster service's records.
 MsgBody* Cluster::MsgBodyLookup(unsigned int type) {
     if (MsgBody* body = Cluster_Bodies::msgLookup(type)) {
         return body;
@@ -98,29 +98,11 @@ TmpInstance Cluster::allocateInst(unsigned char type, staticList<CompAttr_t> att
     return resourceMgr->allocate(type, 1, 0xFFFF, this, attrs);
 }
 
-void Cluster::Activate(ClusterActivate_t* body) {
-    request(0x80001B, body, 0x800000, nullptr);
-}
-
 void Cluster::Activate(unsigned int portId, Addressable* talker, unsigned char options) {
     CompDesc_t ClustDesc = TgtDesc;
     CompDesc_t talkerDesc = talker != nullptr ? talker->getTgtDesc() : allOnes();
     ClusterActivate_t body(ClustDesc, portId, options, talkerDesc);
-    request(0x80001B, &body, 0x800000, nullptr);
-}
-
-void Cluster::Deactivate(ClusterDeactivate_t* body) {
-    request(0x800023, body, 0x800000, nullptr);
-}
-
-void Cluster::Deactivate(unsigned int portId) {
-    CompDesc_t ClustDesc = TgtDesc;
-    ClusterDeactivate_t body(ClustDesc, portId);
-    request(0x800023, &body, 0x800000, nullptr);
-}
-
-void Cluster::TSAssign(ClusterSlotAssign_t* body) {
-    request(0x800030, body, 0x800000, nullptr);
+    Activate(&body);
 }
 
 void Cluster::TSAssign(unsigned int portId, staticList<unsigned short>& slotIds,
@@ -129,21 +111,7 @@ void Cluster::TSAssign(unsigned int portId, staticList<unsigned short>& slotIds,
     unsigned char width = static_cast<unsigned char>(slotIds.length());
     staticList<unsigned short> slots(slotIds);
     ClusterSlotAssign_t body(ClustDesc, portId, width, encoding, idlePattern, slots);
-    request(0x800030, &body, 0x800000, nullptr);
-}
-
-void Cluster::TSUnassign(ClusterSlotUnassign_t* body) {
-    request(0x800036, body, 0x800000, nullptr);
-}
-
-void Cluster::TSUnassign(unsigned int portId) {
-    CompDesc_t ClustDesc = TgtDesc;
-    ClusterSlotUnassign_t body(ClustDesc, portId);
-    request(0x800036, &body, 0x800000, nullptr);
-}
-
-void Cluster::TSInfo(ClusterSlotInfo_t* body, ClusterSlotInfoResult_t* ret) {
-    request(0x800032, body, 0x800033, ret);
+    TSAssign(&body);
 }
 
 void Cluster::TSInfo(unsigned int portId, unsigned char* width, unsigned char* encoding,
@@ -151,7 +119,7 @@ void Cluster::TSInfo(unsigned int portId, unsigned char* width, unsigned char* e
     CompDesc_t ClustDesc = TgtDesc;
     ClusterSlotInfo_t body(ClustDesc, portId);
     ClusterSlotInfoResult_t answer;
-    request(0x800032, &body, 0x800033, &answer);
+    TSInfo(&body, &answer);
     if (width != nullptr) {
         *width = answer.width;
     }
@@ -166,19 +134,11 @@ void Cluster::TSInfo(unsigned int portId, unsigned char* width, unsigned char* e
     }
 }
 
-void Cluster::Connect(ClusterConnect_t* body) {
-    request(0x80001F, body);
-}
-
 void Cluster::Connect(unsigned int portId1, unsigned int portId2, Addressable* a, Addressable* b) {
     CompDesc_t InstDesc1 = a != nullptr ? a->getTgtDesc() : TgtDesc;
     CompDesc_t InstDesc2 = b != nullptr ? b->getTgtDesc() : TgtDesc;
     ClusterConnect_t body(InstDesc1, portId1, InstDesc2, portId2);
-    request(0x80001F, &body);
-}
-
-void Cluster::Disconnect(ClusterDisconnect_t* body) {
-    request(0x800025, body);
+    Connect(&body);
 }
 
 void Cluster::Disconnect(unsigned int portId1, unsigned int portId2, Addressable* a,
@@ -186,65 +146,16 @@ void Cluster::Disconnect(unsigned int portId1, unsigned int portId2, Addressable
     CompDesc_t InstDesc1 = a != nullptr ? a->getTgtDesc() : TgtDesc;
     CompDesc_t InstDesc2 = b != nullptr ? b->getTgtDesc() : TgtDesc;
     ClusterDisconnect_t body(InstDesc1, portId1, InstDesc2, portId2);
-    request(0x800025, &body);
-}
-
-void Cluster::ClusterCompInfo(ClusterCompInfo_t* body, ClusterCompInfoResult_t* ret) {
-    request(0x800027, body, 0x800028, ret, 0, 1);
+    Disconnect(&body);
 }
 
 void Cluster::ClusterCompInfo(staticList<CompDesc_t>* out, CompDesc_t ClustDesc) {
     ClusterCompInfo_t body(ClustDesc);
     ClusterCompInfoResult_t answer;
-    request(0x800027, &body, 0x800028, &answer, 0, 1);
+    ClusterCompInfo(&body, &answer);
     if (out != nullptr) {
         *out = answer.instances;
     }
-}
-
-void Cluster::AttrAdd(ClusterAttrAdd_t* body, ResultComplete_t* ret) {
-    request(0x800054, body, 0x800000, ret);
-}
-
-void Cluster::AttrAdd(staticList<CompAttr_t>& Attrs, ResultComplete_t* ret) {
-    AttrAdd(Attrs, 0xFF, ret);
-}
-
-void Cluster::AttrAdd(staticList<CompAttr_t>& Attrs, unsigned char Count, ResultComplete_t* ret) {
-    ClusterAttrAdd_t body(Count, Attrs);
-    request(0x800054, &body, 0x800000, ret);
-}
-
-void Cluster::AttrRemove(ClusterAttrRemove_t* body, ResultComplete_t* ret) {
-    request(0x800055, body, 0x800000, ret);
-}
-
-void Cluster::AttrRemove(staticList<CompAttr_t>& Attrs, ResultComplete_t* ret) {
-    AttrRemove(Attrs, 0xFF, ret);
-}
-
-void Cluster::AttrRemove(staticList<CompAttr_t>& Attrs, unsigned char Count,
-                         ResultComplete_t* ret) {
-    ClusterAttrRemove_t body(Count, Attrs);
-    request(0x800055, &body, 0x800000, ret);
-}
-
-void Cluster::Lock(ClusterLock_t* body, ResultComplete_t* ret) {
-    request(0x800056, body, 0x800000, ret);
-}
-
-void Cluster::Lock(ResultComplete_t* ret) {
-    ClusterLock_t body;
-    request(0x800056, &body, 0x800000, ret);
-}
-
-void Cluster::Unlock(ClusterUnlock_t* body, ClusterUnlockCmplt_t* ret) {
-    request(0x800057, body, 0x800058, ret);
-}
-
-void Cluster::Unlock(ClusterUnlockCmplt_t* ret) {
-    ClusterUnlock_t body;
-    request(0x800057, &body, 0x800058, ret);
 }
 
 }  // namespace tolk

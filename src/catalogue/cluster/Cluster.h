@@ -29,41 +29,28 @@ class Cluster : public Addressable, public Cluster_Bodies {
     TmpInstance findAutoAllocate(unsigned char type, staticList<CompAttr_t> attrs);
     TmpInstance allocateInst(unsigned char type, staticList<CompAttr_t> attrs);
 
-    void Activate(ClusterActivate_t* body);
+    // The operation families, from the schema.
+#include "catalogue/generated/cluster_ops.h"
+
     // A null talker sends all-ones in talkerDesc.
     void Activate(unsigned int portId, Addressable* talker, unsigned char options);
-    void Deactivate(ClusterDeactivate_t* body);
-    void Deactivate(unsigned int portId);
-    void TSAssign(ClusterSlotAssign_t* body);
     void TSAssign(unsigned int portId, staticList<unsigned short>& slotIds, unsigned char encoding,
                   unsigned char idlePattern);
-    void TSUnassign(ClusterSlotUnassign_t* body);
-    void TSUnassign(unsigned int portId);
-    void TSInfo(ClusterSlotInfo_t* body, ClusterSlotInfoResult_t* ret);
     // Null out-arguments are skipped.
     void TSInfo(unsigned int portId, unsigned char* width, unsigned char* encoding,
                 unsigned char* idlePattern, staticList<unsigned short>* slotIds);
     // One-way, like the emulated and real service: no completion is awaited. A null instance
     // stands for the cluster itself.
-    void Connect(ClusterConnect_t* body);
     void Connect(unsigned int portId1, unsigned int portId2, Addressable* a, Addressable* b);
-    void Disconnect(ClusterDisconnect_t* body);
     void Disconnect(unsigned int portId1, unsigned int portId2, Addressable* a, Addressable* b);
-    void ClusterCompInfo(ClusterCompInfo_t* body, ClusterCompInfoResult_t* ret);
     void ClusterCompInfo(staticList<CompDesc_t>* out, CompDesc_t ClustDesc);
-    void AttrAdd(ClusterAttrAdd_t* body, ResultComplete_t* ret);
-    void AttrAdd(staticList<CompAttr_t>& Attrs, ResultComplete_t* ret);
-    void AttrAdd(staticList<CompAttr_t>& Attrs, unsigned char Count, ResultComplete_t* ret);
-    void AttrRemove(ClusterAttrRemove_t* body, ResultComplete_t* ret);
-    void AttrRemove(staticList<CompAttr_t>& Attrs, ResultComplete_t* ret);
-    void AttrRemove(staticList<CompAttr_t>& Attrs, unsigned char Count, ResultComplete_t* ret);
-    void Lock(ClusterLock_t* body, ResultComplete_t* ret);
-    void Lock(ResultComplete_t* ret);
-    void Unlock(ClusterUnlock_t* body, ClusterUnlockCmplt_t* ret);
-    void Unlock(ClusterUnlockCmplt_t* ret);
 
-    ClusterMgr* getClusterMgr() const { return clusterMgr; }
-    ResourceMgr* getResourceMgr() const { return resourceMgr; }
+    ClusterMgr* getClusterMgr() const {
+        return clusterMgr;
+    }
+    ResourceMgr* getResourceMgr() const {
+        return resourceMgr;
+    }
 
   protected:
     // Nothing in the system sets it; when set, the destructor destroys the cluster on the board.

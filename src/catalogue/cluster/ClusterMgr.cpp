@@ -31,7 +31,7 @@ Cluster ClusterMgr::find(staticList<CompAttr_t> attrs) {
     unsigned char count = 0xFF;
     ClusterFind_t body(CompStart, count, attrs);
     ClusterResult_t answer;
-    request(0x800053, &body, 0x80002C, &answer, 0, 1);
+    request(ClusterFind_t::MsgType, &body, ClusterResult_t::MsgType, &answer, 0, 1);
     Addressable found(answer.desc, queue);
     return Cluster(found);
 }
@@ -56,58 +56,6 @@ Cluster ClusterMgr::findByLCON(unsigned int line, staticList<CompAttr_t> attrs) 
     append(attrs, 0, 22);
     append(attrs, 0x1600, line);
     return find(attrs);
-}
-
-void ClusterMgr::ClusterFindInst(ClusterCompByAttr_t* body, ComponentResult_t* ret) {
-    request(0x80001E, body, 0x800007, ret, 0, 1);
-}
-
-void ClusterMgr::ClusterFindInst(CompDesc_t& ClustDesc, unsigned char& CompType,
-                                 staticList<CompAttr_t>& Attrs, ComponentResult_t* ret) {
-    ClusterFindInst(ClustDesc, CompType, Attrs, 0xFF, ret);
-}
-
-void ClusterMgr::ClusterFindInst(CompDesc_t& ClustDesc, unsigned char& CompType,
-                                 staticList<CompAttr_t>& Attrs, unsigned char Count,
-                                 ComponentResult_t* ret) {
-    ClusterCompByAttr_t body(ClustDesc, CompType, Count, Attrs);
-    request(0x80001E, &body, 0x800007, ret, 0, 1);
-}
-
-void ClusterMgr::ClusterCreate(ClusterCreate_t* body, ClusterResult_t* ret) {
-    request(0x800020, body, 0x80002C, ret);
-}
-
-void ClusterMgr::ClusterCreate(ClusterResult_t* ret) {
-    ClusterCreate_t body;
-    request(0x800020, &body, 0x80002C, ret);
-}
-
-void ClusterMgr::ClusterDestroy(ClusterDestroy_t* body) {
-    request(0x800024, body);
-}
-
-void ClusterMgr::ClusterDestroy(CompDesc_t& ClustDesc) {
-    ClusterDestroy_t body(ClustDesc);
-    request(0x800024, &body);
-}
-
-void ClusterMgr::ClusterFree(ClusterFree_t* body) {
-    request(0x800052, body);
-}
-
-void ClusterMgr::ClusterFree(CompDesc_t& ClustDesc) {
-    ClusterFree_t body(ClustDesc);
-    request(0x800052, &body);
-}
-
-void ClusterMgr::ClusterFindByComp(ClusterByComp_t* body, ClusterResult_t* ret) {
-    request(0x80001D, body, 0x80002C, ret);
-}
-
-void ClusterMgr::ClusterFindByComp(CompDesc_t& desc, ClusterResult_t* ret) {
-    ClusterByComp_t body(desc);
-    request(0x80001D, &body, 0x80002C, ret);
 }
 
 }  // namespace tolk

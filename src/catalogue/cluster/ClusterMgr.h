@@ -24,20 +24,8 @@ class ClusterMgr : public Addressable, public ClusterMgr_Bodies {
     Cluster findByLCON(unsigned int line);
     Cluster findByLCON(unsigned int line, staticList<CompAttr_t> attrs);
 
-    void ClusterFindInst(ClusterCompByAttr_t* body, ComponentResult_t* ret);
-    void ClusterFindInst(CompDesc_t& ClustDesc, unsigned char& CompType,
-                         staticList<CompAttr_t>& Attrs, ComponentResult_t* ret);
-    void ClusterFindInst(CompDesc_t& ClustDesc, unsigned char& CompType,
-                         staticList<CompAttr_t>& Attrs, unsigned char Count,
-                         ComponentResult_t* ret);
-    void ClusterCreate(ClusterCreate_t* body, ClusterResult_t* ret);
-    void ClusterCreate(ClusterResult_t* ret);
-    void ClusterDestroy(ClusterDestroy_t* body);
-    void ClusterDestroy(CompDesc_t& ClustDesc);
-    void ClusterFree(ClusterFree_t* body);
-    void ClusterFree(CompDesc_t& ClustDesc);
-    void ClusterFindByComp(ClusterByComp_t* body, ClusterResult_t* ret);
-    void ClusterFindByComp(CompDesc_t& desc, ClusterResult_t* ret);
+    // The operation families, from the schema.
+#include "catalogue/generated/clustermgr_ops.h"
 };
 
 }  // namespace tolk

@@ -11,6 +11,7 @@ A schema is line based. '#' starts a comment. Lines:
   evt <group> <Body> <field>...    an event body, known to the class's event lookup
     elem <Elem> <field>...         (indented) element body nested in the body above
     hand <Elem> <Template>         (indented) hand-written element: <Template><Outer>
+  op <Name> <Cmd> ...              an operation family of the class (see opgen.py)
 
 A field is <Label>:<type> with <type> one of
   u8 u16 u32 word32 i32            numbers
@@ -23,6 +24,7 @@ A field is <Label>:<type> with <type> one of
   @Ops(X)                          hand-written field: cat::Ops<Outer>::ops, argument field X
 
 Output (deterministic, no timestamps): <outdir>/catalogue/generated/<name>_bodies.{h,cpp}
+and <name>_ops.{h,cpp} (the operations, written by opgen.py)
 for each class, <outdir>/catalogue/generated/index.{h,cpp} listing every body, and
 <outdir>/catalogue/generated/vx7relay.lua, the Wireshark decoder of the relay protocol
 (written by luagen.py from the same tables).
@@ -33,6 +35,7 @@ import re
 import sys
 
 import luagen
+import opgen
 
 FORMAT_VERSION = 3
 
@@ -177,6 +180,7 @@ class Cls:
         self.schema = schema
         self.includes = includes
         self.bodies = []
+        self.ops = []
 
 
 def parse(path):
@@ -214,6 +218,8 @@ def parse(path):
             last.elems.append(e)
         elif word == "hand" and indented and last is not None:
             last.hands.append((tok[1], tok[2]))
+        elif word == "op" and not indented:
+            opgen.parse_op(cls, tok, where)
         else:
             raise SchemaError(f"{where}: cannot read '{line.strip()}'")
     for c in classes:
@@ -517,8 +523,11 @@ def main(argv):
     classes = []
     try:
         for path in argv[2:]:
-            classes.extend(parse(path))
-    except SchemaError as e:
+            for c in parse(path):
+                c.path = path
+                opgen.resolve(c)
+                classes.append(c)
+    except (SchemaError, opgen.OpError) as e:
         print(f"catgen: {e}", file=sys.stderr)
         return 1
     headers = []
@@ -527,6 +536,9 @@ def main(argv):
         headers.append(hname)
         write_if_changed(os.path.join(outdir, hname), header(c))
         write_if_changed(os.path.join(outdir, hname[:-2] + ".cpp"), source(c, hname))
+        oname = f"{c.name.lower()}_ops"
+        write_if_changed(os.path.join(outdir, oname + ".h"), opgen.fragment(c))
+        write_if_changed(os.path.join(outdir, oname + ".cpp"), opgen.source(c))
     ih, isrc = index_files(classes, headers)
     write_if_changed(os.path.join(outdir, "index.h"), ih)
     write_if_changed(os.path.join(outdir, "index.cpp"), isrc)

@@ -2,12 +2,6 @@
 
 namespace tolk {
 
-namespace {
-
-constexpr unsigned int kSetProtocolLength = 32;
-
-}  // namespace
-
 LCON::LCON(const CompDesc_t& target, isa::RefPtr<MsgQueue>& q) : Instance(target, q) {
     registerNullHandlers();
 }
@@ -21,7 +15,8 @@ LCON::LCON(const LCON& other) : Instance(other), LCON_Bodies() {
 }
 
 void LCON::registerNullHandlers() {
-    asyncRegisterMsgType(0x1611, static_cast<EvtCallback::MsgFn>(nullptr), 0);
+    asyncRegisterMsgType(MsgSetLineStateCmplt_t::MsgType, static_cast<EvtCallback::MsgFn>(nullptr),
+                         0);
 }
 
 LCON::~LCON() {
@@ -40,193 +35,6 @@ MsgBody* LCON::EvtBodyLookup(unsigned int group) {
         return body;
     }
     return Instance::superEvtBodyLookup(group);
-}
-
-void LCON::ConfigureLine(MsgConfigureLine_t* body, MsgConfigureLineCmplt_t* ret) {
-    request(0x1600, body, 0x1601, ret);
-}
-
-void LCON::ConfigureLine(MsgConfigureLineCmplt_t* ret) {
-    MsgConfigureLine_t body;
-    request(0x1600, &body, 0x1601, ret);
-}
-
-void LCON::GetAlarms(MsgGetAlarms_t* body, MsgGetAlarmsCmplt_t* ret) {
-    request(0x1602, body, 0x1603, ret);
-}
-
-void LCON::GetAlarms(staticList<unsigned int>& Alarms, MsgGetAlarmsCmplt_t* ret) {
-    GetAlarms(Alarms, 0xFFFFFFFF, ret);
-}
-
-void LCON::GetAlarms(staticList<unsigned int>& Alarms, unsigned int Count,
-                     MsgGetAlarmsCmplt_t* ret) {
-    MsgGetAlarms_t body(Count, Alarms);
-    request(0x1602, &body, 0x1603, ret);
-}
-
-void LCON::GetDiagMode(MsgGetDiagMode_t* body, MsgGetDiagModeCmplt_t* ret) {
-    request(0x1604, body, 0x1605, ret);
-}
-
-void LCON::GetDiagMode(MsgGetDiagModeCmplt_t* ret) {
-    MsgGetDiagMode_t body;
-    request(0x1604, &body, 0x1605, ret);
-}
-
-void LCON::GetFaults(MsgGetFaults_t* body, MsgGetFaultsCmplt_t* ret) {
-    request(0x1606, body, 0x1607, ret);
-}
-
-void LCON::GetFaults(staticList<unsigned int>& Faults, MsgGetFaultsCmplt_t* ret) {
-    GetFaults(Faults, 0xFFFFFFFF, ret);
-}
-
-void LCON::GetFaults(staticList<unsigned int>& Faults, unsigned int Count,
-                     MsgGetFaultsCmplt_t* ret) {
-    MsgGetFaults_t body(Count, Faults);
-    request(0x1606, &body, 0x1607, ret);
-}
-
-void LCON::GetLineState(MsgGetLineState_t* body, MsgGetLineStateCmplt_t* ret) {
-    request(0x1608, body, 0x1609, ret);
-}
-
-void LCON::GetLineState(MsgGetLineStateCmplt_t* ret) {
-    MsgGetLineState_t body;
-    request(0x1608, &body, 0x1609, ret);
-}
-
-void LCON::SendAlarm(MsgSendAlarm_t* body, MsgSendAlarmCmplt_t* ret) {
-    request(0x160C, body, 0x160D, ret);
-}
-
-void LCON::SendAlarm(unsigned int AlarmId, MsgSendAlarmCmplt_t* ret) {
-    MsgSendAlarm_t body(AlarmId);
-    request(0x160C, &body, 0x160D, ret);
-}
-
-void LCON::SetDiagMode(MsgSetDiagMode_t* body, MsgSetDiagModeCmplt_t* ret) {
-    request(0x160E, body, 0x160F, ret);
-}
-
-void LCON::SetDiagMode(unsigned char Mode, MsgSetDiagModeCmplt_t* ret) {
-    MsgSetDiagMode_t body(Mode);
-    request(0x160E, &body, 0x160F, ret);
-}
-
-void LCON::SetLineState(MsgSetLineState_t* body, MsgSetLineStateCmplt_t* ret) {
-    request(0x1610, body, 0x1611, ret);
-}
-
-void LCON::SetLineState(unsigned int State, MsgSetLineStateCmplt_t* ret) {
-    SetLineState(State, 0, 0, ret);
-}
-
-void LCON::SetLineState(unsigned int State, unsigned int Reason, MsgSetLineStateCmplt_t* ret) {
-    SetLineState(State, Reason, 0, ret);
-}
-
-void LCON::SetLineState(unsigned int State, unsigned int Reason, unsigned int Priority,
-                        MsgSetLineStateCmplt_t* ret) {
-    MsgSetLineState_t body(State, Reason, Priority);
-    request(0x1610, &body, 0x1611, ret);
-}
-
-void LCON::StartSetLineState(MsgSetLineState_t* body) {
-    request(0x1610, body);
-}
-
-void LCON::StartSetLineState(unsigned int State, unsigned int Reason, unsigned int Priority) {
-    MsgSetLineState_t body(State, Reason, Priority);
-    request(0x1610, &body);
-}
-
-void LCON::TSPSetLineState(MsgTSPSetLineState_t* body) {
-    request(0x1612, body);
-}
-
-void LCON::TSPSetLineState(unsigned int State, unsigned int Reason) {
-    MsgTSPSetLineState_t body(State, Reason);
-    request(0x1612, &body);
-}
-
-void LCON::StopAlarm(MsgStopAlarm_t* body) {
-    request(0x1613, body);
-}
-
-void LCON::StopAlarm(unsigned int AlarmId) {
-    MsgStopAlarm_t body(AlarmId);
-    request(0x1613, &body);
-}
-
-void LCON::GetMetrics(MsgGetMetrics_t* body, MsgGetMetricsCmplt_t* ret) {
-    request(0x160A, body, 0x160B, ret);
-}
-
-void LCON::GetMetrics(unsigned int MetricsId, MsgGetMetricsCmplt_t* ret) {
-    GetMetrics(MetricsId, 1, ret);
-}
-
-void LCON::GetMetrics(unsigned int MetricsId, unsigned char Mode, MsgGetMetricsCmplt_t* ret) {
-    MsgGetMetrics_t body(MetricsId, Mode);
-    request(0x160A, &body, 0x160B, ret);
-}
-
-void LCON::SetVParm(Std_MsgSetVParm_t* body, Std_MsgSetVParmCmplt_t* ret) {
-    request(0x2F, body, 0x30, ret);
-}
-
-void LCON::SetVParm(staticList<Std_MsgSetVParm_t::Parms_t>& Parms, Std_MsgSetVParmCmplt_t* ret) {
-    SetVParm(Parms, static_cast<unsigned short>(0xFFFF), ret);
-}
-
-void LCON::SetVParm(staticList<Std_MsgSetVParm_t::Parms_t>& Parms, unsigned short Count,
-                    Std_MsgSetVParmCmplt_t* ret) {
-    Std_MsgSetVParm_t body(Count, Parms);
-    request(0x2F, &body, 0x30, ret);
-}
-
-void LCON::GetVParm(Std_MsgGetVParm_t* body, Std_MsgGetVParmCmplt_t* ret) {
-    request(0x2D, body, 0x2E, ret);
-}
-
-void LCON::GetVParm(staticList<Std_MsgGetVParm_t::Parms_t>& Parms, Std_MsgGetVParmCmplt_t* ret) {
-    GetVParm(Parms, static_cast<unsigned short>(0xFFFF), ret);
-}
-
-void LCON::GetVParm(staticList<Std_MsgGetVParm_t::Parms_t>& Parms, unsigned short Count,
-                    Std_MsgGetVParmCmplt_t* ret) {
-    Std_MsgGetVParm_t body(Count, Parms);
-    request(0x2D, &body, 0x2E, ret);
-}
-
-void LCON::SetProtocol(MsgTSPSetProtocol_t* body, MsgTSPSetProtocolCmplt_t* ret) {
-    request(0x1616, body, 0x1617, ret);
-}
-
-void LCON::SetProtocol(const staticList<char>& String, MsgTSPSetProtocolCmplt_t* ret) {
-    staticList<char> text(String);
-    if (text.length() > kSetProtocolLength) {
-        text.realloc(kSetProtocolLength);
-    }
-    MsgTSPSetProtocol_t body(text);
-    request(0x1616, &body, 0x1617, ret);
-}
-
-void LCON::ReconfigureLine(MsgReConfigureLine_t* body, MsgReConfigureLineCmplt_t* ret) {
-    request(0x1618, body, 0x1619, ret);
-}
-
-void LCON::ReconfigureLine(staticList<MsgReConfigureLine_t::Parms_t>& Parms,
-                           MsgReConfigureLineCmplt_t* ret) {
-    ReconfigureLine(Parms, 0xFFFFFFFF, ret);
-}
-
-void LCON::ReconfigureLine(staticList<MsgReConfigureLine_t::Parms_t>& Parms, unsigned int Count,
-                           MsgReConfigureLineCmplt_t* ret) {
-    MsgReConfigureLine_t body(Count, Parms);
-    request(0x1618, &body, 0x1619, ret);
 }
 
 }  // namespace tolk

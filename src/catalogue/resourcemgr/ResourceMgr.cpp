@@ -42,7 +42,7 @@ StdResource ResourceMgr::find(unsigned int type, unsigned char processor, unsign
     unsigned int count = 0xFFFFFFFF;
     CompFind_t body(CompStart, count, attrs);
     ComponentResult_t answer;
-    request(0x80003D, &body, 0x800007, &answer);
+    request(CompFind_t::MsgType, &body, ComponentResult_t::MsgType, &answer);
     return StdResource(answer.desc, queue);
 }
 
@@ -57,7 +57,7 @@ TmpInstance ResourceMgr::allocate(unsigned int type, unsigned char processor,
     unsigned int count = 0xFFFFFFFF;
     CompInstAllocate_t body(CompStart, ClustDesc, count, attrs);
     ComponentResult_t answer;
-    request(0x80003E, &body, 0x800007, &answer);
+    request(CompInstAllocate_t::MsgType, &body, ComponentResult_t::MsgType, &answer);
     TmpInstance result(answer.desc, queue);
     result.freeOnDestroy = 1;
     return result;
@@ -66,7 +66,7 @@ TmpInstance ResourceMgr::allocate(unsigned int type, unsigned char processor,
 void ResourceMgr::free(StdResource* resource) {
     CompDesc_t desc = resource->getTgtDesc();
     CompInstFree_t body(desc);
-    request(0x800041, &body);
+    request(CompInstFree_t::MsgType, &body);
 }
 
 void ResourceMgr::use(StdResource* resource, unsigned int payload) {
@@ -76,7 +76,7 @@ void ResourceMgr::use(StdResource* resource, unsigned int payload) {
     list.element(0)->Payload = payload;
     unsigned char Count = 0xFF;
     CompUse_t body(Count, list);
-    request(0x800059, &body, 0x800000, nullptr);
+    request(CompUse_t::MsgType, &body, ResultComplete_t::MsgType, nullptr);
 }
 
 void ResourceMgr::unuse(StdResource* resource) {
@@ -85,33 +85,7 @@ void ResourceMgr::unuse(StdResource* resource) {
     list.element(0)->desc = resource->getTgtDesc();
     unsigned char Count = 0xFF;
     CompUnuse_t body(Count, list);
-    request(0x80005A, &body, 0x800000, nullptr);
-}
-
-void ResourceMgr::FindAllComponents(CompFindAll_t* body, CompMultipleResult_t* ret) {
-    request(0x800062, body, 0x800063, ret);
-}
-
-void ResourceMgr::FindAllComponents(CompDesc_t& startDesc, CompDesc_t& endDesc,
-                                    staticList<CompAttr_t>& attrs, CompMultipleResult_t* ret) {
-    FindAllComponents(startDesc, endDesc, attrs, 0xFFFFFFFF, ret);
-}
-
-void ResourceMgr::FindAllComponents(CompDesc_t& startDesc, CompDesc_t& endDesc,
-                                    staticList<CompAttr_t>& attrs, unsigned int count,
-                                    CompMultipleResult_t* ret) {
-    CompFindAll_t body(startDesc, endDesc, count, attrs);
-    request(0x800062, &body, 0x800063, ret);
-}
-
-void ResourceMgr::AttrInfo(CompAttrInfo_t* body, CompAttrInfoResult_t* ret) {
-    request(0x80003A, body, 0x800006, ret);
-}
-
-void ResourceMgr::AttrInfo(CompDesc_t& theInstance, unsigned int count, unsigned int attroffset,
-                           CompAttrInfoResult_t* ret) {
-    CompAttrInfo_t body(theInstance, count, attroffset);
-    request(0x80003A, &body, 0x800006, ret);
+    request(CompUnuse_t::MsgType, &body, ResultComplete_t::MsgType, nullptr);
 }
 
 }  // namespace tolk

@@ -31,15 +31,8 @@ class ResourceMgr : public Addressable, public ResourceMgr_Bodies {
     void use(StdResource* resource, unsigned int payload);
     void unuse(StdResource* resource);
 
-    void FindAllComponents(CompFindAll_t* body, CompMultipleResult_t* ret);
-    void FindAllComponents(CompDesc_t& startDesc, CompDesc_t& endDesc,
-                           staticList<CompAttr_t>& attrs, CompMultipleResult_t* ret);
-    void FindAllComponents(CompDesc_t& startDesc, CompDesc_t& endDesc,
-                           staticList<CompAttr_t>& attrs, unsigned int count,
-                           CompMultipleResult_t* ret);
-    void AttrInfo(CompAttrInfo_t* body, CompAttrInfoResult_t* ret);
-    void AttrInfo(CompDesc_t& theInstance, unsigned int count, unsigned int attroffset,
-                  CompAttrInfoResult_t* ret);
+    // The operation families, from the schema.
+#include "catalogue/generated/resourcemgr_ops.h"
 };
 
 }  // namespace tolk
