@@ -1,10 +1,12 @@
 #include "catalogue/cluster/ClusterMgr.h"
 
+#include "catalogue/generated/values.h"
+
 namespace tolk {
 
 namespace {
 
-constexpr unsigned short kServiceInstance = 8;
+constexpr unsigned short kServiceInstance = wire::ClusterMgr::Service::INSTANCE;
 
 void append(staticList<CompAttr_t>& attrs, unsigned int key, unsigned int value) {
     unsigned int n = attrs.length();
@@ -42,9 +44,9 @@ Cluster ClusterMgr::findByTSC(unsigned int trunk, unsigned int channel) {
 
 Cluster ClusterMgr::findByTSC(unsigned int trunk, unsigned int channel,
                               staticList<CompAttr_t> attrs) {
-    append(attrs, 0, 18);
-    append(attrs, 0x1200, trunk);
-    append(attrs, 0x1201, channel);
+    append(attrs, 0, wire::TSC::Component::TYPE);
+    append(attrs, wire::TSC::Attr::TRUNK, trunk);
+    append(attrs, wire::TSC::Attr::CHANNEL, channel);
     return find(attrs);
 }
 
@@ -53,8 +55,8 @@ Cluster ClusterMgr::findByLCON(unsigned int line) {
 }
 
 Cluster ClusterMgr::findByLCON(unsigned int line, staticList<CompAttr_t> attrs) {
-    append(attrs, 0, 22);
-    append(attrs, 0x1600, line);
+    append(attrs, 0, wire::LCON::Component::TYPE);
+    append(attrs, wire::LCON::Attr::LINE, line);
     return find(attrs);
 }
 
