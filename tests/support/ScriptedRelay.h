@@ -1,6 +1,5 @@
 // A relay peer for tests: listens on loopback, accepts one connection and plays a script on it.
-#ifndef LINEPROBE_TESTS_TRANSPORT_SCRIPTEDRELAY_H
-#define LINEPROBE_TESTS_TRANSPORT_SCRIPTEDRELAY_H
+#pragma once
 
 #include <arpa/inet.h>
 #include <gtest/gtest.h>
@@ -14,15 +13,17 @@
 #include "transport/TKSFrame.h"
 #include "transport/TKSSock.h"
 
+using golden::Bytes;
+
 // A frame header as a relay writes it: type, 0, size, extra size, and the sender's own pointer
 // (which a reader ignores).
 inline Bytes frameHeader(std::uint32_t type, std::uint32_t size, std::uint32_t exSize) {
     Bytes b;
-    PutU32(b, type);
-    PutU32(b, 0);
-    PutU32(b, size);
-    PutU32(b, exSize);
-    PutU32(b, 0xDEADBEEF);
+    golden::u32(b, type);
+    golden::u32(b, 0);
+    golden::u32(b, size);
+    golden::u32(b, exSize);
+    golden::u32(b, 0xDEADBEEF);
     return b;
 }
 
@@ -131,5 +132,3 @@ class ScriptedRelay {
     int port = 0;
     std::thread worker;
 };
-
-#endif
