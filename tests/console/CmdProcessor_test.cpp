@@ -2,18 +2,18 @@
 
 #include <gtest/gtest.h>
 
-#include "CoutCapture.h"
+#include "LogCapture.h"
 #include "console/Command.h"
 
 namespace lineprobe {
 namespace {
 
-using lineprobe::testing::CoutCapture;
+using testsupport::LogCapture;
 
 TEST(CmdProcessor, RegisterTracesTheNameAndReturnsZero) {
     CmdProcessor processor(nullptr);
     Command help("help");
-    CoutCapture out;
+    LogCapture out;
 
     EXPECT_EQ(processor.RegisterCommand(&help), 0);
     EXPECT_EQ(out.Text(), "Calling CmdProcessor::RegisterCommand\ncommand name: help\n");
@@ -21,7 +21,7 @@ TEST(CmdProcessor, RegisterTracesTheNameAndReturnsZero) {
 
 TEST(CmdProcessor, NullCommandIsRefusedSilently) {
     CmdProcessor processor(nullptr);
-    CoutCapture out;
+    LogCapture out;
 
     EXPECT_EQ(processor.RegisterCommand(nullptr), -2);
     EXPECT_EQ(out.Text(), "");
@@ -31,7 +31,7 @@ TEST(CmdProcessor, DuplicateNameKeepsFirst) {
     CmdProcessor processor(nullptr);
     Command first("phone");
     Command second("phone");
-    CoutCapture out;
+    LogCapture out;
 
     EXPECT_EQ(processor.RegisterCommand(&first), 0);
     EXPECT_EQ(processor.RegisterCommand(&second), -1);
@@ -42,7 +42,7 @@ TEST(CmdProcessor, FindTracesTheWordAndMatchesExactly) {
     CmdProcessor processor(nullptr);
     Command quit("quit");
     Command trunk("trunk");
-    CoutCapture out;
+    LogCapture out;
     processor.RegisterCommand(&quit);
     processor.RegisterCommand(&trunk);
 

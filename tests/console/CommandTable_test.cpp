@@ -7,14 +7,14 @@
 #include <string>
 #include <vector>
 
-#include "CoutCapture.h"
+#include "LogCapture.h"
 #include "console/CmdProcessor.h"
 #include "console/Command.h"
 
 namespace lineprobe {
 namespace {
 
-using lineprobe::testing::CoutCapture;
+using testsupport::LogCapture;
 
 std::vector<std::string> RegisteredNames(const std::string& trace) {
     std::vector<std::string> names;
@@ -53,7 +53,7 @@ TEST(CommandTable, RegistersTheCreatedCommandsInRegistrationOrder) {
         expected[entry.registration] = std::string(entry.word);
     }
     CmdProcessor processor(nullptr);
-    CoutCapture out;
+    LogCapture out;
 
     RegisterCommands(processor, created);
 
@@ -64,25 +64,11 @@ TEST(CommandTable, RegistersTheCreatedCommandsInRegistrationOrder) {
     }
 }
 
-TEST(CommandTable, TheCommandsOfTodayKeepTheirPlaces) {
-    Command trunk("trunk");
-    Command quit("quit");
-    Command delphone("delphone");
-    Command help("help");
-    CmdProcessor processor(nullptr);
-    CoutCapture out;
-
-    RegisterCommands(processor, {&trunk, &quit, &delphone, &help});
-
-    EXPECT_EQ(RegisteredNames(out.Text()),
-              (std::vector<std::string>{"quit", "help", "delphone", "trunk"}));
-}
-
 TEST(CommandTable, UnknownWordIsRegisteredLastRatherThanLost) {
     Command extra("selftest");
     Command quit("quit");
     CmdProcessor processor(nullptr);
-    CoutCapture out;
+    LogCapture out;
 
     RegisterCommands(processor, {&extra, nullptr, &quit});
 

@@ -9,9 +9,9 @@
 #include <utility>
 #include <vector>
 
+#include "ConsoleScreen.h"
 #include "SimServer.h"
 #include "TerminalSession.h"
-#include "ViewScreen.h"
 
 namespace lineprobe::testing {
 namespace {

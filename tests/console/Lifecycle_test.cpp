@@ -5,11 +5,11 @@
 #include <string>
 #include <vector>
 
-#include "CoutCapture.h"
+#include "LogCapture.h"
 
 namespace {
 
-using lineprobe::testing::CoutCapture;
+using testsupport::LogCapture;
 
 struct OptionCase {
     const char* name;
@@ -39,7 +39,7 @@ TEST_P(ProcessCmdLineArgsTest, PrintsAndStops) {
         argv.push_back(arg.data());
     }
     argv.push_back(nullptr);
-    CoutCapture out;
+    LogCapture out;
 
     const int stoppedAt = ProcessCmdLineArgs(static_cast<int>(args.size()), argv.data());
 

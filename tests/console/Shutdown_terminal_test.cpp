@@ -10,7 +10,6 @@
 #include "ConsoleScreen.h"
 #include "SimServer.h"
 #include "TerminalSession.h"
-#include "ViewScreen.h"
 
 namespace lineprobe::testing {
 namespace {

@@ -4,8 +4,8 @@
 
 #include <string>
 
+#include "ConsoleScreen.h"
 #include "TerminalSession.h"
-#include "ViewScreen.h"
 
 namespace lineprobe::testing {
 namespace {

@@ -62,20 +62,6 @@ TEST(Msg, PrintingLeavesAByteDefinitionThatTheSecondPrintRefills) {
     EXPECT_NE(second.find("{ByteData {0x7 0x20 0xff }}"), std::string::npos);
 }
 
-TEST(Msg, TransactionIdIsCutTo24BitsAndKeepsTheTag) {
-    Msg m(0u);
-    unsigned char tag = 0x5A;
-    ASSERT_EQ(m.fieldPut(TK_FIELD_TAG, &tag), 0);
-    m.setTrans(0x1000000);
-    EXPECT_EQ(m.getTrans(), 0u);
-    unsigned char back = 0;
-    m.fieldGet(TK_FIELD_TAG, &back);
-    EXPECT_EQ(back, 0x5A);
-    m.setTrans(0x1ABCDEF);
-    EXPECT_EQ(m.getTrans(), 0xABCDEFu);
-    EXPECT_EQ(m.getMsgRef()->transTag, 0xABCDEF5Au);
-}
-
 TEST(Msg, CopyIsDeepAndHasNoDefinition) {
     std::unique_ptr<Msg> m(sample());
     text(*m);

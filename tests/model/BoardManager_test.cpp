@@ -5,6 +5,7 @@
 #include <string>
 #include <vector>
 
+#include "LogCapture.h"
 #include "SimFixture.h"
 #include "model/Board.h"
 #include "model/Guarded.h"
@@ -64,7 +65,7 @@ TEST_F(DefaultFarm, AnalogBoardIsWalkedLineByLine) {
 }
 
 TEST_F(DefaultFarm, AnalogWalkEndsOnTheRefusalWithoutLoggingIt) {
-    CaptureOut out;
+    testsupport::LogCapture out;
     BoardManager manager(3);
     EXPECT_EQ(manager.GetNumberOfTrunks(), 2);
     EXPECT_EQ(out.Text().find("UnexpectedMsg"), std::string::npos) << out.Text();
@@ -147,7 +148,7 @@ TEST_F(DefaultFarm, BoardTheMapDoesNotListGivesAnEmptyManager) {
 
 TEST_F(DefaultFarm, RefusedParameterQueriesMeanAnUnknownBoardWithFixedRouting) {
     Refuse(0x12);
-    CaptureOut out;
+    testsupport::LogCapture out;
     BoardManager manager(2);
     EXPECT_FALSE(manager.IsFlexibleRoutingEnabled());
     EXPECT_EQ(manager.GetVoiceChannelCount(), 0);

@@ -4,6 +4,7 @@
 #include <string>
 #include <vector>
 
+#include "LogCapture.h"
 #include "SimFixture.h"
 #include "framework/Addressable.h"
 #include "model/AllAlarms.h"
@@ -179,7 +180,7 @@ TEST(EventPublications, ChanStateTellsTheNumberOnceForItsText) {
     *e->pChanState = 11;
     chanState.Lock();
     chanState.SetEvent(&publisher, e);
-    CaptureOut out;
+    testsupport::LogCapture out;
     EXPECT_STREQ(chanState.ToZLG(),
                  "Channel State timestamp=12 board=1 trunk=1 channel=3 state=Unknown");
     chanState.ToZLG();
@@ -198,7 +199,7 @@ TEST(EventPublications, CallInfoSaysSoAtEveryCall) {
     *e->pInfoId = 0x2000007;
     info.Lock();
     info.SetEvent(&publisher, e);
-    CaptureOut out;
+    testsupport::LogCapture out;
     EXPECT_STREQ(info.ToZLG(), "Call Info timestamp=1 board=1 trunk=2 channel=5 state=CallerId");
     info.ToZLG();
     EXPECT_EQ(out.Text(), "received callinfo event\nreceived callinfo event\n");

@@ -6,6 +6,7 @@
 #include <stdexcept>
 #include <string>
 
+#include "LogCapture.h"
 #include "SimFixture.h"
 #include "model/BoardManager.h"
 #include "model/Guarded.h"
@@ -75,7 +76,7 @@ TEST_F(PhoneTest, FixedRoutingStartAndStopSendNothing) {
     // A refused TSC attach would print its failure line if anything were sent.
     Refuse(0x1234);
     Refuse(0x1236);
-    CaptureOut out;
+    testsupport::LogCapture out;
     EXPECT_EQ(phone.Start(), 0);
     EXPECT_EQ(phone.Stop(), 0);
     EXPECT_EQ(out.Text(), "");
@@ -98,7 +99,7 @@ TEST_F(PhoneTest, CallBetweenTwoChannels) {
 TEST_F(PhoneTest, RefusedMakeCallPrintsItsBanner) {
     Phone phone(fixedBoard, 1, 6);
     Refuse(0x1214, 0x77);
-    CaptureOut out;
+    testsupport::LogCapture out;
     EXPECT_EQ(phone.MakeCall("5551217", "5551218"), 0u);
     EXPECT_EQ(out.Text().rfind("MAKECALL FAILED\n===============\nAddressable::UnexpectedMsg", 0),
               0u)
@@ -110,7 +111,7 @@ TEST_F(PhoneTest, SilentBoardGivesTheFailureValueAndThePhoneStaysUsable) {
     Silence(0x1214);
     Silence(0x120D);
     {
-        CaptureOut out;
+        testsupport::LogCapture out;
         EXPECT_EQ(phone.MakeCall("5551218", "5551219"), 0u);
         EXPECT_EQ(out.Text().rfind("Addressable::Timeout ObjSource: ", 0), 0u) << out.Text();
         EXPECT_EQ(out.Text().find("MAKECALL FAILED"), std::string::npos);
@@ -132,7 +133,7 @@ class RefusedOperation : public PhoneTest, public ::testing::WithParamInterface<
 TEST_P(RefusedOperation, GivesItsFailureValue) {
     Phone phone(fixedBoard, 2, 1);
     Refuse(GetParam().type);
-    CaptureOut out;
+    testsupport::LogCapture out;
     EXPECT_EQ(GetParam().op(phone), GetParam().failure);
     EXPECT_NE(out.Text().find("Addressable::UnexpectedMsg"), std::string::npos) << out.Text();
 }
@@ -187,7 +188,7 @@ TEST_F(PhoneTest, AcceptedOperationsGiveTheirSuccessValues) {
 
 TEST_F(PhoneTest, FlexibleRoutingJoinsAndPartsTheVoiceResources) {
     Phone phone(flexibleBoard, 1, 2);
-    CaptureOut out;
+    testsupport::LogCapture out;
     EXPECT_EQ(phone.Start(), 0);
     EXPECT_NE(phone.GetRocCluster(), nullptr);
     EXPECT_EQ(phone.Stop(), 0);
@@ -198,7 +199,7 @@ TEST_F(PhoneTest, RefusedTscAttachDoesNotStopTheClusterSteps) {
     Phone phone(flexibleBoard, 1, 3);
     Refuse(0x1234);
     Refuse(0x800030);
-    CaptureOut out;
+    testsupport::LogCapture out;
     EXPECT_EQ(phone.Attach(), 0);
     std::string text = out.Text();
     std::size_t attach = text.find("Unexpected response msg - TSC_MsgAttach\n");
@@ -218,7 +219,7 @@ TEST_F(PhoneTest, RefusedTscDetachEndsTheParting) {
     Refuse(0x1236);
     // Had the parting gone on, the refused deactivation would have been the first failure.
     Refuse(0x800023, 0x55);
-    CaptureOut out;
+    testsupport::LogCapture out;
     EXPECT_EQ(phone.Detach(), 0);
     std::string text = out.Text();
     EXPECT_NE(text.find("CmdMsgType 0x1236"), std::string::npos) << text;
@@ -232,7 +233,7 @@ TEST_F(PhoneTest, ChannelTheBoardLacksIsNoPhone) {
 TEST_F(PhoneTest, SilentJoiningStopsAndReports) {
     Phone phone(flexibleBoard, 1, 5);
     Silence(0x800032);
-    CaptureOut out;
+    testsupport::LogCapture out;
     EXPECT_EQ(phone.Start(), -1);
     EXPECT_NE(out.Text().find("Phone::Attach - Addressable::Timeout"), std::string::npos)
         << out.Text();

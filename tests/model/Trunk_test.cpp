@@ -5,6 +5,7 @@
 #include <memory>
 #include <string>
 
+#include "LogCapture.h"
 #include "SimFixture.h"
 #include "model/Guarded.h"
 
@@ -50,7 +51,7 @@ TEST_F(TrunkTest, ServiceChangesTheLineState) {
 TEST_F(TrunkTest, InServiceAgainIsReportedNotThrown) {
     Trunk trunk(1, 2);
     trunk.PutInService();
-    CaptureOut out;
+    testsupport::LogCapture out;
     EXPECT_NO_THROW(trunk.PutInService());
     EXPECT_EQ(out.Text(), "Trunk already In Service\n");
 }
@@ -59,11 +60,11 @@ TEST_F(TrunkTest, OtherRefusalsOfServicePrintTheException) {
     Trunk trunk(1, 2);
     Refuse(0x1610, 0x42);
     {
-        CaptureOut out;
+        testsupport::LogCapture out;
         trunk.PutInService();
         EXPECT_EQ(out.Text(), "");
     }
-    CaptureOut out;
+    testsupport::LogCapture out;
     trunk.PutOutOfService();
     EXPECT_EQ(out.Text().rfind("Addressable::UnexpectedMsg", 0), 0u) << out.Text();
 }
@@ -84,7 +85,7 @@ TEST_F(TrunkTest, RefusedAlarmLeavesTheTrunkUsable) {
     EXPECT_EQ(trunk.StopTransmitAlarm(kTransmitRAI), 0);
     Refuse(kSendAlarm);
     {
-        CaptureOut out;
+        testsupport::LogCapture out;
         EXPECT_EQ(trunk.StartTransmitAlarm(kTransmitRAI), -1);
         EXPECT_NE(out.Text().find("Addressable::UnexpectedMsg"), std::string::npos);
     }
@@ -137,7 +138,7 @@ TEST_F(TrunkTest, UnreadableAlarmsMeanNoStatusButNoException) {
     Trunk trunk(1, 1);
     Refuse(kGetAlarms);
     EXPECT_THROW(TrunkStatus{&trunk}, tolk::Addressable::UnexpectedMsg);
-    CaptureOut out;
+    testsupport::LogCapture out;
     EXPECT_EQ(TrunkStatus::TryCreate(&trunk), nullptr);
     EXPECT_EQ(out.Text().rfind("TrunkStatus - Addressable::UnexpectedMsg", 0), 0u) << out.Text();
 }

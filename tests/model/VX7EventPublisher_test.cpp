@@ -4,6 +4,7 @@
 
 #include <thread>
 
+#include "LogCapture.h"
 #include "RecordingObserver.h"
 #include "SimFixture.h"
 #include "model/AllAlarms.h"
@@ -75,7 +76,7 @@ TEST_F(Publisher, RefusedSubscriptionLeavesNothingBehind) {
 TEST_F(Publisher, RefusedClusterSearchIsAFailedAttachNotAnException) {
     VX7EventPublisher publisher(1, 1, 4);
     Refuse(kClusterFind);
-    CaptureOut out;
+    testsupport::LogCapture out;
     EXPECT_FALSE(publisher.Attach(first, &callState));
     EXPECT_NE(out.Text().find("VX7EventPublisher::Attach - "), std::string::npos) << out.Text();
     EXPECT_EQ(publisher.ObserverCount(callState), 0);
@@ -130,7 +131,7 @@ TEST_F(Publisher, SilentCancellationIsPrintedAndTheCountStays) {
     VX7EventPublisher publisher(1, 1, 7);
     ASSERT_TRUE(publisher.Attach(first, &callState));
     Silence(kCancelxEvts);
-    CaptureOut out;
+    testsupport::LogCapture out;
     EXPECT_EQ(publisher.Detach(first, callState), 0);
     std::string text = out.Text();
     EXPECT_EQ(text.rfind("UnSubscribe: TSC Component Timeout Exception.  Ignoring\n"

@@ -13,6 +13,7 @@
 #include <sstream>
 #include <vector>
 
+#include "BoardEvents.h"
 #include "catalogue/generated/cluster_bodies.h"
 #include "catalogue/generated/clustermgr_bodies.h"
 #include "catalogue/generated/lcon_bodies.h"
@@ -36,6 +37,9 @@ tolk::LCON_Bodies::MsgGetLineState_t getLine;
 tolk::LCON_Bodies::MsgGetDiagMode_t getDiag;
 tolk::TSC_Bodies::MsgGetChanState_t getChan;
 
+using testsupport::BoardEvents;
+using testsupport::cd;
+using testsupport::setText;
 using tolk::Addressable;
 using tolk::CompDesc_t;
 using Std = tolk::StdResource_Bodies;
@@ -45,59 +49,11 @@ using Cl = tolk::Cluster_Bodies;
 using Tsc = tolk::TSC_Bodies;
 using Lcon = tolk::LCON_Bodies;
 
-CompDesc_t cd(const farm::Address& a) {
-    return CompDesc_t(a.instance, a.board, a.processor, a.component, a.node);
-}
-
-void setText(tolk::staticList<char>& l, const char* s) {
-    unsigned int n = static_cast<unsigned int>(std::strlen(s)) + 1;
-    l.realloc(n);
-    std::memcpy(l.data(), s, n);
-}
-
 // A proxy whose waits can be shortened, to see silence without waiting five seconds.
 class Proxy : public Addressable {
   public:
     using Addressable::Addressable;
     void setResponseTimeout(unsigned int ms) { ResponseTimeout = ms; }
-};
-
-// Events as they reach a registered callback, for the test to wait on.
-struct Inbox {
-    std::mutex lock;
-    std::condition_variable cv;
-    std::vector<std::vector<std::uint32_t>> words;  // first words of each event body
-
-    static Inbox& get() {
-        static Inbox box;
-        return box;
-    }
-    static void take(Addressable*, tolk::Msg* m) {
-        std::vector<std::uint32_t> w;
-        // Big-endian words; a short last word is padded with zero bytes.
-        const unsigned char* p = tkMsgBody(m->getMsgRef());
-        for (unsigned int off = 0; off < m->getSize() && w.size() < 6; off += 4) {
-            std::uint32_t v = 0;
-            for (unsigned int i = 0; i < 4; ++i) {
-                v = (v << 8) | (off + i < m->getSize() ? p[off + i] : 0u);
-            }
-            w.push_back(v);
-        }
-        delete m;
-        Inbox& box = get();
-        std::lock_guard<std::mutex> g(box.lock);
-        box.words.push_back(std::move(w));
-        box.cv.notify_all();
-    }
-    std::vector<std::vector<std::uint32_t>> waitFor(std::size_t n) {
-        std::unique_lock<std::mutex> g(lock);
-        cv.wait_for(g, std::chrono::seconds(5), [&] { return words.size() >= n; });
-        return words;
-    }
-    void clear() {
-        std::lock_guard<std::mutex> g(lock);
-        words.clear();
-    }
 };
 
 class EmulationTest : public testing::Test {
@@ -110,7 +66,7 @@ class EmulationTest : public testing::Test {
         ASSERT_TRUE(startBuiltinEmulation(&error)) << error;
     }
     static void TearDownTestSuite() { stopBuiltinEmulation(); }
-    void SetUp() override { Inbox::get().clear(); }
+    void SetUp() override { BoardEvents::get().clear(); }
 
     // The refusal a request got, or 0xFFFFFFFF if none came.
     static std::uint32_t refusal(Addressable& a, std::uint32_t type, tolk::MsgBody* body,
@@ -178,37 +134,26 @@ TEST_F(EmulationTest, ResourceManagerFindsAnyChpOfTheBoard) {
     EXPECT_EQ(res.desc.board, 1);
 }
 
-struct ParmCase {
-    unsigned int board;
-    farm::Address target;
-    std::uint32_t parm;
-    std::uint32_t value;
-};
-
-void PrintTo(const ParmCase& p, std::ostream* os) {
-    *os << "parm 0x" << std::hex << p.parm << " of board " << std::dec << p.board;
+TEST_F(EmulationTest, GetParmAnswersWhatTheFarmSays) {
+    struct Case {
+        farm::Address target;
+        std::uint32_t parm, value;
+    };
+    for (const Case& c :
+         {Case{farm::lconAddress(1, 1), 0x1601, 1}, Case{farm::lconAddress(1, 2), 0x1602, 4},
+          Case{farm::lconAddress(2, 1), 0x1602, 5}, Case{farm::lconAddress(3, 2), 0x1601, 4},
+          Case{farm::channelComponentAddress(1, 1, 1, farm::kCHP), 0x1313, 0},
+          Case{farm::channelComponentAddress(2, 1, 7, farm::kCHP), 0x1313, 1}}) {
+        Addressable a(cd(c.target));
+        Std::MsgGetParm_t q;
+        q.Num = c.parm;
+        Std::MsgGetParmCmplt_t r;
+        a.request(0x12, &q, 0x13, &r);
+        EXPECT_EQ(r.Num, c.parm);
+        EXPECT_EQ(r.Val, c.value) << "parm 0x" << std::hex << c.parm << " of board " << std::dec
+                                  << int(c.target.board);
+    }
 }
-
-class EmulationParm : public EmulationTest, public testing::WithParamInterface<ParmCase> {};
-
-TEST_P(EmulationParm, GetParmAnswersWhatTheFarmSays) {
-    Addressable a(cd(GetParam().target));
-    Std::MsgGetParm_t q;
-    q.Num = GetParam().parm;
-    Std::MsgGetParmCmplt_t r;
-    a.request(0x12, &q, 0x13, &r);
-    EXPECT_EQ(r.Num, GetParam().parm);
-    EXPECT_EQ(r.Val, GetParam().value);
-}
-
-INSTANTIATE_TEST_SUITE_P(
-    DefaultFarm, EmulationParm,
-    testing::Values(ParmCase{1, farm::lconAddress(1, 1), 0x1601, 1},
-                    ParmCase{1, farm::lconAddress(1, 2), 0x1602, 4},
-                    ParmCase{2, farm::lconAddress(2, 1), 0x1602, 5},
-                    ParmCase{3, farm::lconAddress(3, 2), 0x1601, 4},
-                    ParmCase{1, farm::channelComponentAddress(1, 1, 1, farm::kCHP), 0x1313, 0},
-                    ParmCase{2, farm::channelComponentAddress(2, 1, 7, farm::kCHP), 0x1313, 1}));
 
 TEST_F(EmulationTest, UnknownParameterIsRefusedNamingIt) {
     Addressable a(cd(farm::lconAddress(1, 1)));
@@ -230,7 +175,7 @@ TEST_F(EmulationTest, UnknownParameterIsRefusedNamingIt) {
 
 TEST_F(EmulationTest, SubscribedCallStateEventsFollowAMakeCall) {
     Addressable tsc(cd(farm::channelComponentAddress(1, 1, 3, farm::kTSC)));
-    tsc.asyncRegisterEvtGroup(0x1230, &Inbox::take);
+    tsc.asyncRegisterEvtGroup(0x1230, &BoardEvents::take);
     Std::MsgDetectxEvts_t sub;
     sub.RetAddr = tsc.getMsgQueue()->getHostDesc();
     sub.List.realloc(18);
@@ -248,7 +193,7 @@ TEST_F(EmulationTest, SubscribedCallStateEventsFollowAMakeCall) {
     tsc.request(0x1214, &mk, 0x1215, &done);
     EXPECT_NE(done.CallId, 0u);
 
-    auto got = Inbox::get().waitFor(4);
+    auto got = BoardEvents::get().waitFor(4);
     ASSERT_EQ(got.size(), 4u);
     const std::uint32_t states[] = {5, 15, 17, 2};
     for (int i = 0; i < 4; ++i) {
@@ -267,7 +212,7 @@ TEST_F(EmulationTest, SubscribedCallStateEventsFollowAMakeCall) {
     rel.CallId = done.CallId;
     rel.Reason = 14;
     tsc.request(0x121C, &rel);
-    got = Inbox::get().waitFor(6);
+    got = BoardEvents::get().waitFor(6);
     ASSERT_EQ(got.size(), 6u);
     EXPECT_EQ(got[4][4], 9u);  // Idle
     EXPECT_EQ(got[5][4], 0u);  // Null
@@ -283,7 +228,7 @@ TEST_F(EmulationTest, SubscribedCallStateEventsFollowAMakeCall) {
 
 TEST_F(EmulationTest, SaturationBurstSendsEveryEventToTheLinesSubscriber) {
     Addressable lcon(cd(farm::lconAddress(3, 1)));
-    lcon.asyncRegisterEvtGroup(0x1600, &Inbox::take);
+    lcon.asyncRegisterEvtGroup(0x1600, &BoardEvents::take);
     Std::MsgDetectEvt_t sub;
     sub.RetAddr = lcon.getMsgQueue()->getHostDesc();
     sub.EvtType = 0x1600;
@@ -291,7 +236,7 @@ TEST_F(EmulationTest, SaturationBurstSendsEveryEventToTheLinesSubscriber) {
     lcon.request(0x16, &sub, 0x17, nullptr, lcon.getId());
 
     EXPECT_EQ(builtinControl("ferr 3 1 300"), "ok 300");
-    auto got = Inbox::get().waitFor(300);
+    auto got = BoardEvents::get().waitFor(300);
     ASSERT_EQ(got.size(), 300u);
     for (const auto& w : got) {
         ASSERT_EQ(w.size(), 3u);
@@ -472,67 +417,6 @@ TEST_F(EmulationTest, ControlCallRingsAChannelAndAnswerConnectsIt) {
     tsc.request(0x121C, &rel);
 }
 
-TEST_F(EmulationTest, SupervisedTransferThroughTheChannelsTsc) {
-    Addressable tsc(cd(farm::channelComponentAddress(1, 2, 9, farm::kTSC)));
-    tsc.asyncRegisterEvtGroup(0x1230, &Inbox::take);
-    Std::MsgDetectEvt_t sub;
-    sub.RetAddr = tsc.getMsgQueue()->getHostDesc();
-    sub.EvtType = 0x1230;  // the group number takes every call state
-    sub.EvtGroup = 0x1230;
-    tsc.request(0x16, &sub, 0x17, nullptr, tsc.getId());
-
-    Tsc::MsgMakeCall_t mk;
-    setText(mk.DestAddr, "8005551000");
-    setText(mk.OrigAddr, "5551242");
-    Tsc::MsgMakeCallCmplt_t call;
-    tsc.request(0x1214, &mk, 0x1215, &call);
-    ASSERT_EQ(Inbox::get().waitFor(4).size(), 4u);
-
-    Tsc::MsgInitTransfer_t init;
-    init.CallId = call.CallId;
-    setText(init.DestAddr, "8005552000");
-    setText(init.OrigAddr, "5551242");
-    Tsc::MsgInitTransferCmplt_t consult;
-    tsc.request(0x1212, &init, 0x1213, &consult);
-    EXPECT_NE(consult.CallId, 0u);
-    EXPECT_NE(consult.CallId, call.CallId);
-    EXPECT_EQ(refusal(tsc, 0x1212, &init, 0x1213), kErrBadState);  // one at a time
-
-    Tsc::MsgCompleteTransfer_t done;
-    done.CallId = call.CallId;
-    done.ConCallId = consult.CallId;
-    tsc.request(0x1207, &done);  // one-way: silence is success
-
-    auto got = Inbox::get().waitFor(11);
-    ASSERT_EQ(got.size(), 11u);
-    // {call id, state, reason} from the fifth event on.
-    const std::uint32_t want[][3] = {{call.CallId, 13, 0},    {consult.CallId, 5, 0},
-                                     {consult.CallId, 15, 0}, {consult.CallId, 17, 0},
-                                     {consult.CallId, 2, 0},  {consult.CallId, 0, 25},
-                                     {call.CallId, 0, 25}};
-    for (int i = 0; i < 7; ++i) {
-        SCOPED_TRACE(i);
-        ASSERT_EQ(got[4 + i].size(), 6u);
-        EXPECT_EQ(got[4 + i][1], 0x1230u + want[i][1]);
-        EXPECT_EQ(got[4 + i][3], want[i][0]);
-        EXPECT_EQ(got[4 + i][4], want[i][1]);
-        EXPECT_EQ(got[4 + i][5], want[i][2]);
-    }
-    Tsc::MsgGetCallState_t q;
-    q.CallId = 0;
-    Tsc::MsgGetCallStateCmplt_t cs;
-    tsc.request(0x120D, &q, 0x120E, &cs);
-    EXPECT_EQ(cs.CallState, 0u);
-    Tsc::MsgCancelTransfer_t cancel;
-    cancel.CallId = call.CallId;
-    EXPECT_EQ(refusal(tsc, 0x1203, &cancel, 0), kErrNoSuchCall);
-
-    Std::MsgCancelEvt_t off;
-    off.Type = 0x1230;
-    tsc.request(0x1A, &off, 0x1B, nullptr, tsc.getId());
-    EXPECT_NE(builtinControl("stats").find("subscriptions=0"), std::string::npos);
-}
-
 // What each further request of the program gets from a board in its first state: the answer
 // of the given type (refusal 0), or MsgError_t with the given code.
 struct Exchange {
@@ -591,6 +475,11 @@ INSTANTIATE_TEST_SUITE_P(
         Exchange{"InitTransferWithoutCall", tscOf(1, 1, 20), 0x1212,
                  with<Tsc::MsgInitTransfer_t>([](auto& b) { b.CallId = 0; }), 0x1213,
                  kErrNoSuchCall},
+        Exchange{"CompleteTransferWithoutCall", tscOf(1, 1, 20), 0x1207,
+                 with<Tsc::MsgCompleteTransfer_t>([](auto& b) { b.CallId = 0; }), 0,
+                 kErrNoSuchCall},
+        Exchange{"CancelTransferWithoutCall", tscOf(1, 1, 20), 0x1203,
+                 with<Tsc::MsgCancelTransfer_t>([](auto& b) { b.CallId = 0; }), 0, kErrNoSuchCall},
         Exchange{"DialWithoutCall", tscOf(1, 1, 20), 0x1224,
                  with<Tsc::MsgDial_t>([](auto& b) { setText(b.DigitString, "12"); }), 0x1225,
                  kErrNoSuchCall},

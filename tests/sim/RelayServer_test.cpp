@@ -21,6 +21,7 @@
 #include <string>
 #include <thread>
 
+#include "BoardEvents.h"
 #include "catalogue/generated/lcon_bodies.h"
 #include "catalogue/generated/stdresource_bodies.h"
 #include "catalogue/generated/tsc_bodies.h"
@@ -35,61 +36,16 @@ namespace {
 
 // Bodies without fields, for the requests that carry none.
 tolk::LCON_Bodies::MsgGetLineState_t getLine;
-tolk::LCON_Bodies::MsgGetDiagMode_t getDiag;
 tolk::TSC_Bodies::MsgGetChanState_t getChan;
 
+using testsupport::BoardEvents;
+using testsupport::cd;
+using testsupport::Event;
 using tolk::Addressable;
 using tolk::CompDesc_t;
 using Std = tolk::StdResource_Bodies;
 using Tsc = tolk::TSC_Bodies;
 using Lcon = tolk::LCON_Bodies;
-
-CompDesc_t cd(const farm::Address& a) {
-    return CompDesc_t(a.instance, a.board, a.processor, a.component, a.node);
-}
-
-struct Events {
-    std::mutex lock;
-    std::condition_variable cv;
-    std::vector<std::pair<std::uint32_t, std::vector<std::uint32_t>>>
-        got;  // source instance, words
-
-    static Events& get() {
-        static Events e;
-        return e;
-    }
-    static void take(Addressable* a, tolk::Msg* m) {
-        std::vector<std::uint32_t> w;
-        // Big-endian words; a short last word is padded with zero bytes.
-        const unsigned char* p = tkMsgBody(m->getMsgRef());
-        for (unsigned int off = 0; off < m->getSize() && w.size() < 6; off += 4) {
-            std::uint32_t v = 0;
-            for (unsigned int i = 0; i < 4; ++i) {
-                v = (v << 8) | (off + i < m->getSize() ? p[off + i] : 0u);
-            }
-            w.push_back(v);
-        }
-        std::uint32_t src = a->getTgtDesc().instance;
-        delete m;
-        Events& e = get();
-        std::lock_guard<std::mutex> g(e.lock);
-        e.got.emplace_back(src, std::move(w));
-        e.cv.notify_all();
-    }
-    // Waits until an event satisfies `pred`.
-    template <class P>
-    bool waitFor(P pred) {
-        std::unique_lock<std::mutex> g(lock);
-        return cv.wait_for(g, std::chrono::seconds(5), [&] {
-            for (auto& e : got) {
-                if (pred(e.first, e.second)) {
-                    return true;
-                }
-            }
-            return false;
-        });
-    }
-};
 
 // A plain TCP client for raw frames.
 class RawClient {
@@ -145,6 +101,12 @@ class RawClient {
         EXPECT_TRUE(tksEncodeMessageFrame(block, frame));
         tkMsgFree(block);
         return frame;
+    }
+    // Sends the open and reads the whole assigned-address frame: true when it came.
+    bool opened() {
+        send(open());
+        return read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES).size() ==
+               TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES;
     }
     // Reads n bytes; fewer if the server closed.
     std::vector<unsigned char> read(std::size_t n) {
@@ -274,14 +236,15 @@ TEST_F(RelayTest, ClientsGetTheirOwnAddressesAndAnswers) {
 
 TEST_F(RelayTest, ControlAlarmReachesTheSubscriber) {
     Addressable lcon(cd(farm::lconAddress(1, 2)));
-    lcon.asyncRegisterEvtGroup(0x1600, &Events::take);
+    lcon.asyncRegisterEvtGroup(0x1600, &BoardEvents::take);
     Std::MsgDetectEvt_t sub;
     sub.RetAddr = lcon.getMsgQueue()->getHostDesc();
     sub.EvtType = 0x1600;
     sub.EvtGroup = 0;
     lcon.request(0x16, &sub, 0x17, nullptr, lcon.getId());
     EXPECT_EQ(server->control("alarm 1 2 red on"), "ok");
-    EXPECT_TRUE(Events::get().waitFor([](std::uint32_t, const std::vector<std::uint32_t>& w) {
+    EXPECT_TRUE(BoardEvents::get().waitUntil([](const Event& e) {
+        const auto& w = e.words;
         // Label, alarm, then the state byte at the top of the third word.
         return w.size() == 3 && w[0] == 0x1600 && w[1] == 0x1601 && (w[2] >> 24) == 1;
     }));
@@ -292,7 +255,7 @@ TEST_F(RelayTest, FarEndCallBetweenTwoChannelsOfTwoClients) {
     Addressable caller(cd(farm::channelComponentAddress(1, 1, 1, farm::kTSC)));
     Addressable called(cd(farm::channelComponentAddress(1, 1, 23, farm::kTSC)));
     for (Addressable* a : {&caller, &called}) {
-        a->asyncRegisterEvtGroup(0x1230, &Events::take);
+        a->asyncRegisterEvtGroup(0x1230, &BoardEvents::take);
         Std::MsgDetectEvt_t sub;
         sub.RetAddr = a->getMsgQueue()->getHostDesc();
         sub.EvtType = 0x1230;
@@ -300,32 +263,29 @@ TEST_F(RelayTest, FarEndCallBetweenTwoChannelsOfTwoClients) {
         a->request(0x16, &sub, 0x17, nullptr, a->getId());
     }
     Tsc::MsgMakeCall_t mk;
-    mk.DestAddr.realloc(8);
-    std::memcpy(mk.DestAddr.data(), "5551234", 8);
-    mk.OrigAddr.realloc(8);
-    std::memcpy(mk.OrigAddr.data(), "5551212", 8);
+    testsupport::setText(mk.DestAddr, "5551234");
+    testsupport::setText(mk.OrigAddr, "5551212");
     Tsc::MsgMakeCallCmplt_t done;
     caller.request(0x1214, &mk, 0x1215, &done);
 
     std::uint16_t calledInst = called.getTgtDesc().instance;
     std::uint16_t callerInst = caller.getTgtDesc().instance;
-    ASSERT_TRUE(Events::get().waitFor([&](std::uint32_t src, const std::vector<std::uint32_t>& w) {
-        return src == calledInst && w.size() == 6 && w[4] == 11;  // Offered
-    }));
-    std::uint32_t farCall = 0;
-    {
-        std::lock_guard<std::mutex> g(Events::get().lock);
-        for (auto& e : Events::get().got) {
-            if (e.first == calledInst && e.second[4] == 11) {
-                farCall = e.second[3];
-            }
-        }
-    }
+    Event offered;
+    ASSERT_TRUE(BoardEvents::get().waitUntil(
+        [&](const Event& e) {
+            const auto& w = e.words;
+            const auto src = e.source;
+            return src == calledInst && w.size() == 6 && w[4] == 11;  // Offered
+        },
+        &offered));
+    std::uint32_t farCall = offered.words[3];
     EXPECT_NE(farCall, done.CallId);
     Tsc::MsgAnswerCall_t ans;
     ans.CallId = farCall;
     called.request(0x1201, &ans);
-    EXPECT_TRUE(Events::get().waitFor([&](std::uint32_t src, const std::vector<std::uint32_t>& w) {
+    EXPECT_TRUE(BoardEvents::get().waitUntil([&](const Event& e) {
+        const auto& w = e.words;
+        const auto src = e.source;
         return src == callerInst && w.size() == 6 && w[3] == done.CallId && w[4] == 2;
     }));
 }
@@ -352,8 +312,7 @@ TEST_F(RelayTest, MalformedFrameClosesOnlyThatConnection) {
 TEST_F(RelayTest, OversizeAndUnknownFramesAreRefused) {
     for (std::uint32_t type : {std::uint32_t{4242}, std::uint32_t{TKS_FRAME_MESSAGE}}) {
         RawClient c(port);
-        c.send(c.open());
-        c.read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+        ASSERT_TRUE(c.opened());
         msg_t m;
         m.type = type;
         std::vector<unsigned char> header(TKS_FRAME_HEADER_SIZE);
@@ -410,9 +369,7 @@ TEST_F(RelayTest, DropClosesEveryConnectionAndNewOnesAreServedAfterwards) {
     std::vector<std::unique_ptr<RawClient>> clients;
     for (int i = 0; i < 3; ++i) {
         clients.push_back(std::make_unique<RawClient>(port));
-        clients.back()->send(clients.back()->open());
-        ASSERT_EQ(clients.back()->read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES).size(),
-                  TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+        ASSERT_TRUE(clients.back()->opened());
     }
     ASSERT_TRUE(waitConnections(3));
     EXPECT_EQ(server->control("drop"), "ok dropped 3");
@@ -423,24 +380,19 @@ TEST_F(RelayTest, DropClosesEveryConnectionAndNewOnesAreServedAfterwards) {
     EXPECT_EQ(server->control("drop"), "ok dropped 0");
 
     RawClient later(port);
-    later.send(later.open());
-    EXPECT_EQ(later.read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES).size(),
-              TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+    EXPECT_TRUE(later.opened());
 }
 
 TEST_F(RelayTest, OutOfDescriptorsAWaitingConnectionIsRefusedAndTheOthersServed) {
     RawClient served(port);
-    served.send(served.open());
-    ASSERT_EQ(served.read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES).size(),
-              TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+    ASSERT_TRUE(served.opened());
     ASSERT_TRUE(waitConnections(1));
 
     // The server has logged before, so that writing its log needs no new descriptor (a
     // sanitizer's first check of the stream's type opens a pipe).
     {
         RawClient bad(port);
-        bad.send(bad.open());
-        bad.read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+        ASSERT_TRUE(bad.opened());
         bad.send(std::vector<unsigned char>{0, 0, 0x03, 0xE9, 0, 0, 0, 0, 0, 0, 0, 12, 0, 0, 0, 0,
                                             0, 0, 0,    0,    1, 2, 3, 4, 5, 6, 7, 8,  9, 0, 1, 2});
         ASSERT_TRUE(bad.closedByServer());
@@ -468,15 +420,12 @@ TEST_F(RelayTest, OutOfDescriptorsAWaitingConnectionIsRefusedAndTheOthersServed)
     // The loop is not left spinning on the listening socket, and serves new connections.
     EXPECT_EQ(server->control("stats").rfind("ok stats", 0), 0u);
     RawClient later(port);
-    later.send(later.open());
-    EXPECT_EQ(later.read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES).size(),
-              TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+    EXPECT_TRUE(later.opened());
 }
 
 TEST_F(RelayTest, CloseIsAcknowledged) {
     RawClient c(port);
-    c.send(c.open());
-    c.read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+    ASSERT_TRUE(c.opened());
     msg_t m;
     m.type = TKS_FRAME_CLOSE;
     c.send(tksEncodeFrame(m));
@@ -503,9 +452,7 @@ TEST_F(RelayTest, IdleConnectionsDoNotLockOutAClientThatOpens) {
         ASSERT_TRUE(idle.back()->connected);
     }
     RawClient late(port);
-    late.send(late.open());
-    ASSERT_EQ(late.read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES).size(),
-              TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+    ASSERT_TRUE(late.opened());
 
     // Every idle one is closed in time (the oldest first, to make room), the open one stays.
     for (auto& c : idle) {
@@ -537,9 +484,7 @@ TEST_F(RelayTest, QueuedOutputOfAllClientsIsCappedByCuttingTheWorstReader) {
     std::vector<std::unique_ptr<RawClient>> c;
     for (int i = 0; i < 3; ++i) {
         c.push_back(std::make_unique<RawClient>(port, 4096));
-        c.back()->send(c.back()->open());
-        ASSERT_EQ(c.back()->read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES).size(),
-                  TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+        ASSERT_TRUE(c.back()->opened());
     }
     // Batches of pipelined requests whose answers nobody reads. What the kernel holds varies,
     // so each client goes on until the relay itself holds its share: 4.5 MiB for the first,
@@ -592,21 +537,20 @@ TEST_F(RelayTest, TraceNamesEachRoutedMessageOnOneLine) {
     o.trace = true;
     restart(o);
     RawClient c(port);
-    c.send(c.open());
-    ASSERT_EQ(c.read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES).size(),
-              TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
+    ASSERT_TRUE(c.opened());
     c.send(RawClient::request(farm::lconAddress(1, 2), Lcon::MsgGetLineState_t::MsgType));
     ASSERT_EQ(c.read(TKS_FRAME_HEADER_SIZE).size(), TKS_FRAME_HEADER_SIZE);
 
     Addressable lcon(cd(farm::lconAddress(1, 2)));
-    lcon.asyncRegisterEvtGroup(0x1600, &Events::take);
+    lcon.asyncRegisterEvtGroup(0x1600, &BoardEvents::take);
     Std::MsgDetectEvt_t sub;
     sub.RetAddr = lcon.getMsgQueue()->getHostDesc();
     sub.EvtType = 0x1600;
     sub.EvtGroup = 0;
     lcon.request(0x16, &sub, 0x17, nullptr, lcon.getId());
     EXPECT_EQ(server->control("alarm 1 2 yellow on"), "ok");
-    ASSERT_TRUE(Events::get().waitFor([](std::uint32_t, const std::vector<std::uint32_t>& w) {
+    ASSERT_TRUE(BoardEvents::get().waitUntil([](const Event& e) {
+        const auto& w = e.words;
         return w.size() == 3 && w[1] == 0x1602;
     }));
     // The request and its answer, then the subscription's event, each whole on its line.

@@ -25,9 +25,6 @@ namespace lineprobe::testing {
 namespace {
 
 const std::string FARM = LINEPROBE_FARMS_DIR "/default.toml";
-constexpr int PHONE_ROW0 = 12;
-constexpr int TRUNK_ROW0 = 24;
-constexpr int COL0 = 1;
 
 // A reply is awaited for up to 5000 ms; the prompt may take longer by the time it takes to
 // type and draw on a loaded machine.
@@ -124,7 +121,8 @@ class FaultRun : public ::testing::Test {
         ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
         ASSERT_TRUE(Type({"phone 1 1 1", {}, 8, false}, "open"));
         ASSERT_TRUE(Type({"trunk 1 1", {}, 12, false}, "open"));
-        ASSERT_TRUE(session.WaitForTextAt(TRUNK_ROW0 + 1, COL0 + 8, "InService")) << session.Dump();
+        ASSERT_TRUE(session.WaitForTextAt(TRUNK_ROW0 + 1, WINDOW_COL0 + 8, "InService"))
+            << session.Dump();
     }
 
     void Control(const std::string& line) {
@@ -151,7 +149,7 @@ class FaultRun : public ::testing::Test {
     // take and that the process lives.
     ::testing::AssertionResult Type(const Command& c, const std::string& state) {
         const auto bound = REPLY_TIMEOUT * c.requests + SLACK;
-        const TimedRunner::Outcome done = commands.Run(c.line, bound + std::chrono::seconds(10));
+        const CommandRunner::Outcome done = commands.Run(c.line, bound + std::chrono::seconds(10));
         if (done.took > slowest) {
             slowest = done.took;
             slowestWhat = c.line + " (" + state + ")";
@@ -172,7 +170,7 @@ class FaultRun : public ::testing::Test {
 
     SimServer sim;
     TerminalSession session;
-    TimedRunner commands;
+    CommandRunner commands;
     bool full;
     std::chrono::milliseconds slowest{0};
     std::string slowestWhat;
@@ -308,8 +306,9 @@ TEST_F(FaultRun, RefusedSilentAndDroppedRelay) {
     while (!sameSessionWorks && Clock::now() - look < std::chrono::seconds(3)) {
         for (int row = PHONE_ROW0 + 1; row < PHONE_ROW0 + 10; ++row) {
             const std::string text = session.Row(row);
-            sameSessionWorks = sameSessionWorks || (text.compare(COL0 + 1, 5, "1.1.9") == 0 &&
-                                                    text.compare(COL0 + 47, 4, "Null") == 0);
+            sameSessionWorks =
+                sameSessionWorks || (text.compare(WINDOW_COL0 + 1, 5, "1.1.9") == 0 &&
+                                     text.compare(WINDOW_COL0 + 47, 4, "Null") == 0);
         }
     }
 
@@ -318,15 +317,15 @@ TEST_F(FaultRun, RefusedSilentAndDroppedRelay) {
     // call and out of service.
     TerminalSession again(ThroughRelay(sim));
     ASSERT_TRUE(again.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << again.Dump();
-    TimedRunner commandsAgain(again);
+    CommandRunner commandsAgain(again);
     ASSERT_TRUE(commandsAgain.Run("trunk 1 1", std::chrono::seconds(30)).returned) << again.Dump();
     ASSERT_TRUE(commandsAgain.Run("phone 1 1 3", std::chrono::seconds(30)).returned)
         << again.Dump();
-    ASSERT_TRUE(again.WaitForTextAt(TRUNK_ROW0 + 1, COL0 + 8, "InService")) << again.Dump();
+    ASSERT_TRUE(again.WaitForTextAt(TRUNK_ROW0 + 1, WINDOW_COL0 + 8, "InService")) << again.Dump();
     Control("call 1 1 3 5557777");
-    EXPECT_TRUE(again.WaitForTextAt(PHONE_ROW0 + 1, COL0 + 47, "Offered")) << again.Dump();
+    EXPECT_TRUE(again.WaitForTextAt(PHONE_ROW0 + 1, WINDOW_COL0 + 47, "Offered")) << again.Dump();
     Control("alarm 1 1 red on");
-    EXPECT_TRUE(again.WaitForTextAt(TRUNK_ROW0 + 1, COL0 + 54, "X")) << again.Dump();
+    EXPECT_TRUE(again.WaitForTextAt(TRUNK_ROW0 + 1, WINDOW_COL0 + 54, "X")) << again.Dump();
 
     phase("restarted");
     std::printf("fault run phases:%s\n", phases.c_str());

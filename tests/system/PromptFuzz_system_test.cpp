@@ -191,8 +191,7 @@ TEST(PromptFuzz, RandomLinesNeitherCrashNorBreakTheLayout) {
                 << "row " << row << " changed after the lines:\n"
                 << last << session.Dump();
         }
-        ASSERT_EQ(TimedRunner::Trimmed(screen[RESULT_ROW]), "  Unrecgnized Command")
-            << last << session.Dump();
+        ASSERT_EQ(Trimmed(screen[RESULT_ROW]), "  Unrecgnized Command") << last << session.Dump();
     }
     const double took = std::chrono::duration<double>(Clock::now() - start).count();
     EXPECT_TRUE(session.StillRunning());
@@ -212,7 +211,7 @@ TEST(PromptBoardNumbers, ATrunkViewOfANumberPastTheBoardsIsRefused) {
     options.unsetEnv = {"REMOTE_TKHOST", "VX7_FARM", "CORVO_ORVANE_DIR"};
     TerminalSession session(options);
     ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
-    TimedRunner commands(session);
+    CommandRunner commands(session);
     // 257 and -255 are board 1 of the built-in farm when cut to eight bits.
     for (const char* line : {"trunk 257 1", "trunk -255 1"}) {
         ASSERT_TRUE(commands.Run(line, std::chrono::seconds(30)).returned) << session.Dump();

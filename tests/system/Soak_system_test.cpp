@@ -26,9 +26,6 @@ namespace {
 
 const std::string FARM = LINEPROBE_FARMS_DIR "/big33.toml";
 constexpr int VIEWS = 10;
-constexpr int PHONE_ROW0 = 12;
-constexpr int TRUNK_ROW0 = 24;
-constexpr int COL0 = 1;
 // Memory the process may gain once the views are open and the storm has run 10 s: room
 // for allocator noise, far below what a leak of one block per event would add.
 constexpr long RSS_GROWTH_BOUND_KIB = 1024;
@@ -91,22 +88,22 @@ std::string Field(const std::string& row, int col, std::size_t length) {
 // What a trunk row should read; empty when it does.
 std::string TrunkMismatch(const std::string& row, const TrunkExpect& want) {
     std::string why;
-    const std::string state = Field(row, COL0 + 8, 15);
+    const std::string state = Field(row, WINDOW_COL0 + 8, 15);
     const std::string wantState = want.inService ? "InService" : "Out of Service";
     if (state != wantState) {
         why += " state '" + state + "' want '" + wantState + "'";
     }
     for (std::size_t i = 0; i < ALARMS.size(); ++i) {
-        const bool marked = row[static_cast<std::size_t>(COL0 + ALARMS[i].col)] == 'X';
+        const bool marked = row[static_cast<std::size_t>(WINDOW_COL0 + ALARMS[i].col)] == 'X';
         if (marked != (want.alarm[i] != ALARMS[i].inverted)) {
             why += std::string(" ") + ALARMS[i].name + (want.alarm[i] ? " on" : " off");
         }
     }
-    if (Field(row, COL0 + 85, 4) != std::to_string(want.bpv)) {
-        why += " bpv '" + Field(row, COL0 + 85, 4) + "' want " + std::to_string(want.bpv);
+    if (Field(row, WINDOW_COL0 + 85, 4) != std::to_string(want.bpv)) {
+        why += " bpv '" + Field(row, WINDOW_COL0 + 85, 4) + "' want " + std::to_string(want.bpv);
     }
-    if (Field(row, COL0 + 92, 4) != std::to_string(want.ferr)) {
-        why += " ferr '" + Field(row, COL0 + 92, 4) + "' want " + std::to_string(want.ferr);
+    if (Field(row, WINDOW_COL0 + 92, 4) != std::to_string(want.ferr)) {
+        why += " ferr '" + Field(row, WINDOW_COL0 + 92, 4) + "' want " + std::to_string(want.ferr);
     }
     return why;
 }
@@ -130,7 +127,7 @@ TEST(Soak, TenPhoneAndTenTrunkViewsUnderAnEventStorm) {
 
     // Phones on trunk 2 and trunk views of trunk 1, so that a line taken out of service
     // ends no call the phones' rows are expected to show.
-    TimedRunner commands(session);
+    CommandRunner commands(session);
     for (int board = 0; board < VIEWS; ++board) {
         const std::string b = std::to_string(board);
         ASSERT_TRUE(commands.Run("phone " + b + " 2 1", std::chrono::seconds(30)).returned)
@@ -140,7 +137,8 @@ TEST(Soak, TenPhoneAndTenTrunkViewsUnderAnEventStorm) {
             << session.Dump();
         ASSERT_EQ(commands.Result(), "trunk view creaed successfully") << session.Dump();
     }
-    ASSERT_TRUE(session.WaitForTextAt(TRUNK_ROW0 + 9, COL0 + 8, "InService")) << session.Dump();
+    ASSERT_TRUE(session.WaitForTextAt(TRUNK_ROW0 + 9, WINDOW_COL0 + 8, "InService"))
+        << session.Dump();
 
     std::vector<TrunkExpect> trunks(VIEWS);
     std::vector<CallExpect> phones(VIEWS, CallExpect::Null);
@@ -168,7 +166,7 @@ TEST(Soak, TenPhoneAndTenTrunkViewsUnderAnEventStorm) {
             CallExpect& call = phones[static_cast<std::size_t>(view)];
             // A released phone is used again once its row shows the call gone.
             if (call == CallExpect::Releasing &&
-                Field(session.Row(PHONE_ROW0 + 1 + view), COL0 + 47, 20) == "Null") {
+                Field(session.Row(PHONE_ROW0 + 1 + view), WINDOW_COL0 + 47, 20) == "Null") {
                 call = CallExpect::Null;
             }
             if (call == CallExpect::Null) {
@@ -237,17 +235,17 @@ TEST(Soak, TenPhoneAndTenTrunkViewsUnderAnEventStorm) {
             const std::string& phoneRow = screen[static_cast<std::size_t>(PHONE_ROW0 + 1 + view)];
             const CallExpect call = phones[static_cast<std::size_t>(view)];
             const std::string want = CallText(call);
-            if (Field(phoneRow, COL0 + 47, 20) != want) {
+            if (Field(phoneRow, WINDOW_COL0 + 47, 20) != want) {
                 mismatch += "phone " + std::to_string(view) + ".2.1: '" +
-                            Field(phoneRow, COL0 + 47, 20) + "' want '" + want + "'\n";
+                            Field(phoneRow, WINDOW_COL0 + 47, 20) + "' want '" + want + "'\n";
             }
             // An offered call came in; a far-end hang-up ends it normally.
             const char* reason = call == CallExpect::Offered        ? "IncomingCall"
                                  : call == CallExpect::Disconnected ? "Normal"
                                                                     : nullptr;
-            if (reason != nullptr && Field(phoneRow, COL0 + 70, 25) != reason) {
+            if (reason != nullptr && Field(phoneRow, WINDOW_COL0 + 70, 25) != reason) {
                 mismatch += "phone " + std::to_string(view) + ".2.1 reason: '" +
-                            Field(phoneRow, COL0 + 70, 25) + "' want '" + reason + "'\n";
+                            Field(phoneRow, WINDOW_COL0 + 70, 25) + "' want '" + reason + "'\n";
             }
         }
         if (!mismatch.empty()) {
@@ -258,7 +256,7 @@ TEST(Soak, TenPhoneAndTenTrunkViewsUnderAnEventStorm) {
     EXPECT_EQ(mismatch, "") << session.Dump();
 
     // The prompt still answers, once every line typed during the storm has run.
-    const TimedRunner::Outcome answer = commands.Run("bogus", std::chrono::seconds(60));
+    const CommandRunner::Outcome answer = commands.Run("bogus", std::chrono::seconds(60));
     ASSERT_TRUE(answer.returned) << session.Dump();
     EXPECT_EQ(commands.Result(), "Unrecgnized Command");
     EXPECT_TRUE(session.StillRunning());

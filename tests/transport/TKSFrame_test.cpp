@@ -8,6 +8,8 @@
 
 namespace {
 
+using golden::Bytes;
+
 class MemorySource : public TKSByteSource {
   public:
     explicit MemorySource(Bytes b) : bytes(std::move(b)) {}
@@ -72,11 +74,11 @@ TEST(TKSFrame, MessageFrameIsGolden) {
                     0x00, 0x38, 0x00, 0x00, 0x00, 0x02, 0x00, 0x00, 0x00, 0x00};
     golden.insert(golden.end(), kSampleHeaderWords.begin(), kSampleHeaderWords.end());
     golden.insert(golden.end(), {0x00, 0x00, 0x00, 0x02, 0xAB, 0xAC});
-    ExpectBytes(out, golden);
+    EXPECT_TRUE(golden::SameBytes(out, golden));
     EXPECT_EQ(78u, out.size());
 
     msg_t m = tksMakeMessageFrame(b);
-    ExpectBytes(tksEncodeFrame(m), golden);
+    EXPECT_TRUE(golden::SameBytes(tksEncodeFrame(m), golden));
     free_msg(m);
     tkMsgFree(b);
 }
@@ -86,7 +88,7 @@ TEST(TKSFrame, EmptyBodyMakesA76ByteFrame) {
     Bytes out;
     ASSERT_TRUE(tksEncodeMessageFrame(b, out));
     EXPECT_EQ(76u, out.size());
-    ExpectBytes(Bytes(out.begin() + 12, out.begin() + 16), {0, 0, 0, 0});
+    EXPECT_TRUE(golden::SameBytes(Bytes(out.begin() + 12, out.begin() + 16), {0, 0, 0, 0}));
     tkMsgFree(b);
 }
 
@@ -115,14 +117,15 @@ TEST(TKSFrame, OpenAndAssignedBodiesAreGolden) {
     req.addr.instance = 0x0506;
     req.maxRetMsgSize = 512;
     req.depth = 5;
-    Bytes open(TKS_OPEN_BODY_BYTES);
-    tksEncodeOpen(req, open.data());
-    ExpectBytes(
-        open, {0, 0, 0, 1, 0, 0, 0, 2, 0, 0, 0, 3, 0, 0, 0, 4, 0, 0, 5, 6, 0, 0, 2, 0, 0, 0, 0, 5});
+    const Bytes open =
+        golden::WrittenInto(TKS_OPEN_BODY_BYTES, [&](std::uint8_t* p) { tksEncodeOpen(req, p); });
+    EXPECT_TRUE(golden::SameBytes(open, {0, 0, 0, 1, 0, 0, 0, 2, 0, 0, 0, 3, 0, 0,
+                                         0, 4, 0, 0, 5, 6, 0, 0, 2, 0, 0, 0, 0, 5}));
 
-    Bytes assigned(TKS_ASSIGNED_BODY_BYTES);
-    tksEncodeAssigned(req.addr, assigned.data());
-    ExpectBytes(assigned, {0, 0, 0, 1, 0, 0, 0, 2, 0, 0, 0, 3, 0, 0, 0, 4, 0, 0, 5, 6});
+    Bytes assigned = golden::WrittenInto(TKS_ASSIGNED_BODY_BYTES,
+                                         [&](std::uint8_t* p) { tksEncodeAssigned(req.addr, p); });
+    EXPECT_TRUE(
+        golden::SameBytes(assigned, {0, 0, 0, 1, 0, 0, 0, 2, 0, 0, 0, 3, 0, 0, 0, 4, 0, 0, 5, 6}));
     msg_t m;
     m.type = TKS_FRAME_ASSIGNED;
     m.size = TKS_ASSIGNED_BODY_BYTES;
@@ -138,20 +141,19 @@ TEST(TKSFrame, OpenAndAssignedBodiesAreGolden) {
 TEST(TKSFrame, CloseFramesAreHeadersOnly) {
     msg_t m;
     m.type = TKS_FRAME_CLOSE;
-    ExpectBytes(tksEncodeFrame(m),
-                {0, 0, 0x07, 0xD0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0});
+    EXPECT_TRUE(golden::SameBytes(
+        tksEncodeFrame(m), {0, 0, 0x07, 0xD0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0}));
     m.type = TKS_FRAME_CLOSE_ACK;
-    ExpectBytes(tksEncodeFrame(m),
-                {0, 0, 0x07, 0xD1, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0});
+    EXPECT_TRUE(golden::SameBytes(
+        tksEncodeFrame(m), {0, 0, 0x07, 0xD1, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0}));
 }
 
 TEST(TKSFrame, WordSwapIsBigEndian) {
     unsigned int words[2] = {0x01020304, 0xA0B0C0D0};
-    unsigned char wire[8];
-    TKS_htonU32(wire, words, 8);
-    ExpectBytes(Bytes(wire, wire + 8), {1, 2, 3, 4, 0xA0, 0xB0, 0xC0, 0xD0});
+    Bytes wire = golden::WrittenInto(8, [&](std::uint8_t* p) { TKS_htonU32(p, words, 8); });
+    EXPECT_TRUE(golden::SameBytes(wire, {1, 2, 3, 4, 0xA0, 0xB0, 0xC0, 0xD0}));
     unsigned int back[2] = {0, 0};
-    TKS_ntohU32(back, wire, 8);
+    TKS_ntohU32(back, wire.data(), 8);
     EXPECT_EQ(words[0], back[0]);
     EXPECT_EQ(words[1], back[1]);
 }
@@ -182,11 +184,11 @@ INSTANTIATE_TEST_SUITE_P(Boundaries, TKSFrameLimit,
 
 TEST(TKSFrameRead, OversizeFrameIsConsumedThenRefused) {
     Bytes wire;
-    PutU32(wire, TKS_FRAME_MESSAGE);
-    PutU32(wire, 0);
-    PutU32(wire, 102401);
-    PutU32(wire, 3);
-    PutU32(wire, 0);
+    golden::u32(wire, TKS_FRAME_MESSAGE);
+    golden::u32(wire, 0);
+    golden::u32(wire, 102401);
+    golden::u32(wire, 3);
+    golden::u32(wire, 0);
     wire.insert(wire.end(), 102401 + 3, 0x11);
     TKMsg32Bit* b = sampleBlock(1);
     Bytes good;

@@ -83,8 +83,8 @@ TEST(RemoteQueue, OpenSendsTheRequestedAddressAndTakesTheAssignedOne) {
     EXPECT_LT(Clock::now() - t0, 4s);
     relay.join();
     EXPECT_TRUE(closed.load());
-    ExpectBytes(openBody, {0, 0, 0, 1, 0, 0, 0, 2, 0, 0, 0, 3, 0, 0,
-                           0, 4, 0, 0, 5, 6, 0, 0, 2, 0, 0, 0, 0, 5});
+    EXPECT_TRUE(golden::SameBytes(openBody, {0, 0, 0, 1, 0, 0, 0, 2, 0, 0, 0, 3, 0, 0,
+                                             0, 4, 0, 0, 5, 6, 0, 0, 2, 0, 0, 0, 0, 5}));
 }
 
 TEST(RemoteQueue, RequestTravelsAsAFrameAndTheReplyComesBack) {
@@ -137,7 +137,7 @@ TEST(RemoteQueue, RequestTravelsAsAFrameAndTheReplyComesBack) {
                     0x00, 0x00, 0x00,
                     // body size and body
                     0x00, 0x00, 0x00, 0x03, 0x01, 0x02, 0x03};
-    ExpectBytes(seen, golden);
+    EXPECT_TRUE(golden::SameBytes(seen, golden));
 }
 
 // What the relay sends after the open, then a good event: the good one must arrive.
@@ -169,7 +169,7 @@ Bytes countTooLarge() {
     Bytes b = frameHeader(TKS_FRAME_MESSAGE, 56, 2);
     Bytes words(52, 0);
     b.insert(b.end(), words.begin(), words.end());
-    PutU32(b, 100000);  // body size word far above the bytes that follow
+    golden::u32(b, 100000);  // body size word far above the bytes that follow
     b.insert(b.end(), {9, 9});
     return b;
 }

@@ -11,7 +11,7 @@
 #include <string>
 #include <thread>
 
-#include "../ViewScreen.h"
+#include "ConsoleScreen.h"
 #include "SimServer.h"
 #include "TerminalSession.h"
 

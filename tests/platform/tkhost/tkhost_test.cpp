@@ -8,31 +8,16 @@
 #include <string>
 #include <vector>
 
+#include "Golden.h"
 #include "platform/tkhost/tkhost_switch.h"
 
 namespace {
 
-using Bytes = std::vector<unsigned char>;
+using golden::Bytes;
 
-std::string hex(const unsigned char* p, std::size_t n) {
-    std::string s;
-    char buf[4];
-    for (std::size_t i = 0; i < n; ++i) {
-        std::snprintf(buf, sizeof buf, "%02X ", p[i]);
-        s += buf;
-    }
-    return s;
-}
-
-void ExpectBytes(const unsigned char* actual, const Bytes& golden) {
-    for (std::size_t i = 0; i < golden.size(); ++i) {
-        if (actual[i] != golden[i]) {
-            ADD_FAILURE() << "first difference at offset " << i
-                          << "\n  actual: " << hex(actual, golden.size())
-                          << "\n  golden: " << hex(golden.data(), golden.size());
-            return;
-        }
-    }
+// The first golden.size() bytes at p against golden.
+::testing::AssertionResult BytesAt(const unsigned char* p, const Bytes& golden) {
+    return golden::SameBytes(Bytes(p, p + golden.size()), golden);
 }
 
 struct Block {
@@ -67,8 +52,9 @@ TEST(TkMsgBlock, HeaderLayoutIsGolden) {
     ASSERT_EQ(TK_OK, tkMsgFieldPut(b.m, TK_FIELD_TYPE, &type));
     ASSERT_EQ(TK_OK, tkMsgFieldPut(b.m, TK_FIELD_SRC, &src));
     ASSERT_EQ(TK_OK, tkMsgFieldPut(b.m, TK_FIELD_TGT, &tgt));
-    ExpectBytes(b.raw(), {0x5A, 0x56, 0x34, 0x12, 0x04, 0x03, 0x02, 0x01, 0x22, 0x11, 0x33, 0x44,
-                          0x88, 0x77, 0x99, 0xAA, 0x66, 0x55, 0xCC, 0xBB, 0x03, 0x00, 0x00, 0x00});
+    EXPECT_TRUE(
+        BytesAt(b.raw(), {0x5A, 0x56, 0x34, 0x12, 0x04, 0x03, 0x02, 0x01, 0x22, 0x11, 0x33, 0x44,
+                          0x88, 0x77, 0x99, 0xAA, 0x66, 0x55, 0xCC, 0xBB, 0x03, 0x00, 0x00, 0x00}));
 }
 
 TEST(TkMsgBlock, TransactionIdKeepsTagAndLosesTopBits) {
@@ -123,7 +109,7 @@ TEST(TkMsgBlock, ReallocateKeepsPrefixAndZeroesTheRest) {
     EXPECT_EQ(2u, m->size);
     ASSERT_EQ(TK_OK, tkMsgReallocate(6, &m));
     EXPECT_EQ(77u, m->type);
-    ExpectBytes(tkMsgBody(m), {0x01, 0x02, 0x00, 0x00, 0x00, 0x00});
+    EXPECT_TRUE(BytesAt(tkMsgBody(m), {0x01, 0x02, 0x00, 0x00, 0x00, 0x00}));
     TKMsg32Bit* before = m;
     EXPECT_NE(TK_OK, tkMsgReallocate(0xFFFFFFFFu, &m));
     EXPECT_EQ(before, m);
@@ -150,7 +136,7 @@ TEST_P(TkVarFieldScalar, WritesBigEndianAndReadsBack) {
     EXPECT_EQ(3u + c.wire.size(), offset);
     Bytes expected(16, 0);
     std::copy(c.wire.begin(), c.wire.end(), expected.begin() + 3);
-    ExpectBytes(b.body(), expected);
+    EXPECT_TRUE(BytesAt(b.body(), expected));
 
     unsigned char back[4] = {0xEE, 0xEE, 0xEE, 0xEE};
     offset = 3;
@@ -185,7 +171,7 @@ TEST(TkVarField, ZeroOffsetComesBackZero) {
     unsigned int offset = 0;
     ASSERT_EQ(TK_OK, tkMsgVarFieldPut(b.m, 1, &offset, 0x380000u, &v));
     EXPECT_EQ(0u, offset);
-    ExpectBytes(b.body(), {0x01, 0x02, 0x03, 0x04, 0x00});
+    EXPECT_TRUE(BytesAt(b.body(), {0x01, 0x02, 0x03, 0x04, 0x00}));
     std::uint32_t back = 0;
     ASSERT_EQ(TK_OK, tkMsgVarFieldGet(b.m, 1, &offset, 0x380000u, &back));
     EXPECT_EQ(0u, offset);
@@ -201,7 +187,7 @@ TEST(TkVarField, SeveralFieldsInOneCallArePacked) {
               tkMsgVarFieldPut(b.m, 5, &offset, 0x280000u, &instance, 0x200000u, &board, 0x200000u,
                                &processor, 0x200000u, &component, 0x200000u, &node));
     EXPECT_EQ(8u, offset);
-    ExpectBytes(b.body(), {0x00, 0x00, 0x01, 0x02, 0x03, 0x04, 0x05, 0x06, 0x00, 0x00});
+    EXPECT_TRUE(BytesAt(b.body(), {0x00, 0x00, 0x01, 0x02, 0x03, 0x04, 0x05, 0x06, 0x00, 0x00}));
 }
 
 struct CountCase {
@@ -293,7 +279,7 @@ TEST(TkVarField, ExactFitAtTheEndIsWritten) {
     std::uint32_t v = 0x01020304;
     unsigned int offset = 2;
     EXPECT_EQ(TK_OK, tkMsgVarFieldPut(b.m, 1, &offset, 0x380000u, &v));
-    ExpectBytes(b.body(), {0, 0, 1, 2, 3, 4});
+    EXPECT_TRUE(BytesAt(b.body(), {0, 0, 1, 2, 3, 4}));
 }
 
 class TkSwitch : public ::testing::Test {

@@ -27,12 +27,6 @@ Bytes addr(unsigned instance, unsigned board, unsigned component) {
     return b;
 }
 
-TEST(TKCompDescBytes, InstanceInHostOrder) {
-    const Bytes little = {0x34, 0x12, 5, 0, 1, 22, 0, 0};
-    const Bytes big = {0x12, 0x34, 5, 0, 1, 22, 0, 0};
-    EXPECT_EQ(addr(0x1234, 5, 22), std::endian::native == std::endian::little ? little : big);
-}
-
 class DeviceMap : public ::testing::Test {
   protected:
     void SetUp() override { use(""); }
@@ -253,33 +247,6 @@ TEST_F(DeviceMap, DefaultFlexibleBoardHasOneVoiceAuPerChannelWithoutR2) {
     }
 }
 
-// The media list the board manager makes from a voice AU: the component type of each attribute
-// that answered, but CLUSTERADDR, in the order asked.
-std::vector<int> mediaTypes(const VoiceAu& au) {
-    const int types[8] = {7, 0, 8, 8, 5, 10, 66, 41};
-    std::vector<int> out;
-    for (int i = 0; i < 8; ++i) {
-        if (au.statuses[i] == 0 && i != 1) {
-            out.push_back(types[i]);
-        }
-    }
-    return out;
-}
-
-TEST_F(DeviceMap, FlexibleFarmGivesTheMediaItHas) {
-    use(kFarms + "/flexible.toml");
-    auto voices = voiceWalk(findBoard(7).at(0));
-    ASSERT_EQ(voices.size(), 5u);  // groups of 4 and 1
-    for (unsigned v = 0; v < voices.size(); ++v) {
-        SCOPED_TRACE(v + 1);
-        EXPECT_EQ(voices[v].status, UM_PARTIAL);
-        EXPECT_EQ(mediaTypes(voices[v]), (std::vector<int>{7, 5, 41}));
-        EXPECT_EQ(voices[v].statuses[1], 0u);
-        EXPECT_EQ(voices[v].values[1], addr(0x2000 + v + 1, 7, 2));
-    }
-    EXPECT_TRUE(voiceWalk(findBoard(8).at(0)).empty());
-}
-
 TEST_F(DeviceMap, BoardWithAllMediaAnswersWhole) {
     const std::string path = ::testing::TempDir() + "allmedia_farm.toml";
     std::ofstream(path) << "system_name = \"m\"\n[[board]]\nlogical_id = 9\nname = \"n\"\n"
@@ -289,7 +256,9 @@ TEST_F(DeviceMap, BoardWithAllMediaAnswersWhole) {
     auto voices = voiceWalk(findBoard(9).at(0));
     ASSERT_EQ(voices.size(), 2u);
     EXPECT_EQ(voices[1].status, UM_SUCCESS);
-    EXPECT_EQ(mediaTypes(voices[1]), (std::vector<int>{7, 8, 8, 5, 10, 66, 41}));
+    for (uint32_t status : voices[1].statuses) {
+        EXPECT_EQ(status, 0u);
+    }
     EXPECT_EQ(voices[1].values[6], addr(2, 9, 66));
 }
 

@@ -23,15 +23,3 @@ class SimFixture : public ::testing::Test {
   private:
     std::vector<unsigned int> overridden;
 };
-
-// Standard output of the code in between, as the log would get it.
-class CaptureOut {
-  public:
-    CaptureOut();
-    ~CaptureOut();
-    std::string Text();
-
-  private:
-    bool taken = false;
-    std::string text;
-};

@@ -54,19 +54,3 @@ void SimFixture::Silence(unsigned int type) {
     Control(line);
     overridden.push_back(type);
 }
-
-CaptureOut::CaptureOut() {
-    testing::internal::CaptureStdout();
-}
-
-CaptureOut::~CaptureOut() {
-    Text();
-}
-
-std::string CaptureOut::Text() {
-    if (!taken) {
-        text = testing::internal::GetCapturedStdout();
-        taken = true;
-    }
-    return text;
-}
