@@ -1,5 +1,7 @@
 #!/usr/bin/env python3
-"""The value lines of the schemas: what catgen.py writes into values.h, and what it refuses.
+"""The value lines of the schemas: what catgen.py writes into values.h, and what it refuses;
+and that the relay dissector takes the descriptor layout, the element types, the event carrier
+and the components from the schemas rather than from numbers of its own.
 
 Usage: catgen_values_test.py CATGEN_DIR
 """
@@ -20,6 +22,42 @@ value LineState IN_SERVICE 0x100
 value InfoId CALLER_ID 0x2000007
 """
 
+# A layout and types unlike the real ones, so that a decoder with numbers of its own shows.
+ODD_WIRE = """\
+type S8    0  1  "char"           s8  scalar  signed
+type W16   3  2  "unsigned short" w16 scalar run hex
+type U32   9  4  "unsigned int"   u32 scalar run
+type TXT  12  1  "char"           txt run text
+other 8 "unsigned int"
+bits type  24 4
+bits count  8 8
+"""
+
+ODD = """\
+class StdResource
+msg 0x33 MsgEvtDetected_t EvtGroup:u32 Data:txt[]
+msg 0x34 MsgProbe_t A:s8 B:w16 N:u32 C:w16[N] D:dcv(N)
+class LCON
+value Component TYPE 41
+class ClusterMgr
+value Service INSTANCE 9
+"""
+
+ODD_LUA = [
+    "local EVENT_TYPE = 0x33",
+    "local TYPE_MASK, TYPE_SHIFT = 0xF000000, 24",
+    "local COUNT_MASK, COUNT_SHIFT = 0xFF00, 8",
+    "local WIDTH = {[0]=1, [3]=2, [9]=4, [12]=1}",
+    "local OTHER_WIDTH = 8",
+    "local SIGNED = {[0]=true}",
+    'local COMPONENTS = {[41]="LCON"}',
+    'ProtoField.int8("vx7relay.StdResource.MsgProbe_t.A", "A", base.DEC)',
+    'ProtoField.uint16("vx7relay.StdResource.MsgProbe_t.B", "B", base.HEX)',
+    '{label="C", k="run", ref=3, shape="numbers", w=2,',
+    '{label="Data", k="run", ref=nil, shape="text", w=1,',
+    'name="ClusterMgr", component=0, instance=9,',
+]
+
 BAD = {
     "value before any class": "value LineState IN_SERVICE 0x160F\nclass LCON\n",
     "twice in LCON": "class LCON\nvalue A X 1\nvalue A X 2\n",
@@ -30,11 +68,17 @@ BAD = {
 }
 
 
-def run(catgen, text, out):
+def run(catgen, text, out, wire_text=None):
     schema = os.path.join(out, "t.schema")
     with open(schema, "w", encoding="utf-8") as f:
         f.write(text)
-    return subprocess.run([sys.executable, catgen, out, schema], capture_output=True, text=True)
+    wire = os.path.join(os.path.dirname(os.path.dirname(catgen)), "wire.schema")
+    if wire_text is not None:
+        wire = os.path.join(out, "odd_wire.schema")
+        with open(wire, "w", encoding="utf-8") as f:
+            f.write(wire_text)
+    cmd = [sys.executable, catgen, out, "--wire", wire, schema]
+    return subprocess.run(cmd, capture_output=True, text=True)
 
 
 def main(argv):
@@ -65,6 +109,15 @@ def main(argv):
             r = run(catgen, text, out)
             if r.returncode != 1 or why not in r.stderr or "t.schema:" not in r.stderr:
                 failures.append(f"{why}: exit {r.returncode}, {r.stderr.strip()!r}")
+    with tempfile.TemporaryDirectory() as out:
+        r = run(catgen, ODD, out, ODD_WIRE)
+        if r.returncode != 0:
+            failures.append(f"schema on an odd wire refused: {r.stderr.strip()}")
+        else:
+            lua = open(os.path.join(out, "catalogue", "generated", "vx7relay.lua"), encoding="utf-8").read()
+            failures += [f"dissector lacks {want!r}" for want in ODD_LUA if want not in lua]
+            if "@" in lua:
+                failures.append("dissector keeps a placeholder of its template")
     for f in failures:
         print(f)
     return 1 if failures else 0

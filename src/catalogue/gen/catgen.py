@@ -460,7 +460,7 @@ def main(argv):
     write_if_changed(os.path.join(outdir, "index.h"), ih)
     write_if_changed(os.path.join(outdir, "index.cpp"), isrc)
     schemas = [os.path.basename(p) for p in argv[2:]]
-    write_if_changed(os.path.join(outdir, "vx7relay.lua"), luagen.dissector(classes, schemas))
+    write_if_changed(os.path.join(outdir, "vx7relay.lua"), luagen.dissector(classes, schemas, WIRE))
     return 0
 
 

@@ -28,6 +28,7 @@ class Wire:
         self.types = []  # (name, code, width, ctype)
         self.other = None  # (width, ctype)
         self.bits = {}  # part -> (shift, bits)
+        self.flags = {}  # name -> set of the type line's flags
         self.schema = None
 
     def code(self, name):
@@ -44,6 +45,18 @@ def width(name):
     return WIRE.width(name)
 
 
+TYPE_FLAGS = ("scalar", "run", "signed", "hex", "text")
+
+
+def type_word_and_flags(tok, where):
+    """The schema word and the flags behind a type line's C type, in any order."""
+    flags = {t for t in tok if t in TYPE_FLAGS}
+    words = [t for t in tok if t not in TYPE_FLAGS]
+    if len(words) > 1 or ({"scalar", "run"} & flags and not words):
+        raise SchemaError(f"{where}: a type has at most one word, and needs it for scalar or run")
+    return (words[0] if words else None), flags
+
+
 def parse_wire(path):
     """Reads the wire schema into WIRE, SCALARS and RUNS."""
     import shlex
@@ -56,12 +69,12 @@ def parse_wire(path):
             continue
         try:
             if tok[0] == "type":
-                name, code, w, ctype, word, flags = tok[1], int(tok[2]), int(tok[3]), tok[4], None, []
-                if len(tok) > 5:
-                    word, flags = tok[5], tok[6:]
+                name, code, w, ctype = tok[1], int(tok[2]), int(tok[3]), tok[4]
+                word, flags = type_word_and_flags(tok[5:], where)
                 if any(t[0] == name or t[1] == code for t in WIRE.types):
                     raise SchemaError(f"{where}: type {name} or code {code} twice")
                 WIRE.types.append((name, code, w, ctype))
+                WIRE.flags[name] = flags
                 if "scalar" in flags:
                     SCALARS[word] = (ctype, name)
                 if "run" in flags:
