@@ -2,8 +2,9 @@
 
 catgen.py calls dissector(classes, schemas, wire) with the classes and the wire schema it has
 read; the result is the text of one Lua file. The descriptor layout, the element types' widths
-and the numbers that pick a table come from there too, never from numbers of its own. Bodies are decoded from the same field tables as the C++ bodies, so a
-schema change changes the decoder. Hand-written shapes that the decoder cannot delimit are shown
+and the numbers that pick a table come from there too, never from numbers of its own. Bodies
+are decoded from the same field tables as the C++ bodies, so a schema change changes the
+decoder. Hand-written shapes that the decoder cannot delimit are shown
 as the bytes left in the body, with their length, and decoding of that body stops there.
 """
 
