@@ -45,7 +45,8 @@ struct MetricsInterval {
         return i->readMsg(m, off);
     }
     static unsigned int size(const BodyDesc& d, void* const* refs, unsigned int idx) {
-        return interval(d, refs, idx) ? 8 : 0;
+        // Every field of the interval record is a fixed number: its least size is its size.
+        return interval(d, refs, idx) ? Interval::kMinWireSize : 0;
     }
     static void print(const BodyDesc& d, void* const* refs, unsigned int idx, std::ostream* os) {
         ValueWord w = *static_cast<ValueWord*>(refs[idx]);
@@ -82,8 +83,10 @@ struct MetricsInterval {
 // `Count` keeps the caller's value.
 template <class Outer>
 struct MetricsList {
-    using Long = staticList<typename Outer::Metrics_Type_0x1616_t>;
-    using Short = staticList<typename Outer::Metrics_Type_default_t>;
+    using LongRecord = typename Outer::Metrics_Type_0x1616_t;
+    using ShortRecord = typename Outer::Metrics_Type_default_t;
+    using Long = staticList<LongRecord>;
+    using Short = staticList<ShortRecord>;
 
     static bool isLong(void* const* refs) {
         return *static_cast<const unsigned int*>(refs[0]) == kIntervalMetrics;
@@ -113,12 +116,12 @@ struct MetricsList {
             auto* l = new Long();
             owned.adopt(w, l);
             *w = reinterpret_cast<ValueWord>(l);
-            return getBodies(m, off, *l, capCount(m, off, count, 12));
+            return getBodies(m, off, *l, capCount(m, off, count, LongRecord::kMinWireSize));
         }
         auto* l = new Short();
         owned.adopt(w, l);
         *w = reinterpret_cast<ValueWord>(l);
-        return getBodies(m, off, *l, capCount(m, off, count, 8));
+        return getBodies(m, off, *l, capCount(m, off, count, ShortRecord::kMinWireSize));
     }
     static unsigned int size(const BodyDesc&, void* const* refs, unsigned int idx) {
         ValueWord w = *static_cast<ValueWord*>(refs[idx]);
