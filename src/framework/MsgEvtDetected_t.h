@@ -1,15 +1,16 @@
 #pragma once
 
+#include "catalogue/generated/values.h"
 #include "framework/MsgBody.h"
 #include "framework/staticList.h"
 
 namespace tolk {
 
-// Carrier of every event (type 0x20): the group word, then the event's bytes to the end of the
+// Carrier of every event: the group word, then the event's bytes to the end of the
 // body. The dispatcher reads the group from it and falls back on it for an unknown group.
 class MsgEvtDetected_t : public MsgBody {
   public:
-    static constexpr unsigned int Type = 0x20;
+    static constexpr unsigned int Type = wire::StdResource::MsgType::MsgEvtDetected_t;
 
     MsgEvtDetected_t() = default;
     MsgEvtDetected_t(const MsgEvtDetected_t& other) = default;

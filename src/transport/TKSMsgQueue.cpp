@@ -9,13 +9,14 @@
 #include <iostream>
 #include <vector>
 
+#include "catalogue/generated/values.h"
 #include "transport/TKSLocalMsgQueue.h"
 #include "transport/TKSRemoteMsgQueue.h"
 
 namespace {
 
-constexpr unsigned int TYPE_ERROR = 0;
-constexpr unsigned int TYPE_RESOURCE_ERROR = 0x800001;
+constexpr unsigned int TYPE_ERROR = tolk::wire::StdResource::MsgType::MsgError_t;
+constexpr unsigned int TYPE_RESOURCE_ERROR = tolk::wire::StdResource::MsgType::RESOURCE_ERROR;
 constexpr unsigned int PICKUP_RECHECK_MS = 50;
 
 const char* chooseHost(const char* remoteHost) {

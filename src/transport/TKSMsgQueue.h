@@ -36,7 +36,8 @@ class TKSMsgQueue : public TKSRunnable {
     TKSMsgQueue& operator=(const TKSMsgQueue&) = delete;
 
     // Sends msg's block (taken over in every outcome) and waits up to timeoutMs for the reply:
-    // same transaction id, type 0, 0x800001 or retMsgType, from msg's target unless anySource.
+    // same transaction id, an error answer (MsgError_t or a service's RESOURCE_ERROR) or
+    // retMsgType, from msg's target unless anySource.
     // Returns a handle on the reply (the caller owns the block) or an empty handle on time-out.
     // timeoutMs 0 sends and returns a new empty message of size 0 at once.
     TKSMsgRef request(TKSMsgRef& msg, unsigned int timeoutMs, unsigned int retMsgType,

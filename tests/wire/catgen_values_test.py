@@ -98,6 +98,7 @@ def main(argv):
                 ("inline constexpr unsigned int STARTUP = 2;", lcon),
                 ("inline constexpr unsigned int IN_SERVICE = 0x100;", tsc),
                 ("inline constexpr unsigned int CALLER_ID = 0x2000007;", tsc),
+                ("inline constexpr unsigned int MsgGetLineState_t = 0x1608;", lcon),
             ):
                 if want not in where:
                     failures.append(f"values.h lacks {want!r} in its class")

@@ -9,9 +9,10 @@ What counts as a literal, in code (comments do not count, string literals do):
   - any number the schemas declare from 0x1000 up, in hex or in decimal (below, numbers are
     mostly sizes, counts, error codes and ids of the emulation's own, 256 above all, and
     would drown the rest);
-  - a declared message type or event group of any size written in hex as a case label or as
-    the first argument of a request, a registration or a lookup (the standard operations have
-    numbers below 0x100 that are too common to look for anywhere else).
+  - a declared message type or event group of any size written in hex as a case label, as
+    the first argument of a request, a registration or a lookup, or as the value given to a
+    name that says it is a type (the standard operations have numbers below 0x100 that are too
+    common to look for anywhere else).
 """
 
 import os
@@ -29,7 +30,8 @@ ALLOWED = []
 
 NUMBER = re.compile(r"(?<![\w.])(0[xX][0-9A-Fa-f]+|[0-9]+)(?:[uU][lL]{0,2}|[lL]{1,2}[uU]?)?(?![\w.])")
 CALL_FIRST_ARG = re.compile(
-    r"(?:\bcase\s+|\b\w*(?:request|Request|Register\w*|Lookup|lookup|Msg|Evt)\w*\s*\(\s*)$")
+    r"(?:\bcase\s+|\b\w*(?:request|Request|Register\w*|Lookup|lookup|Msg|Evt)\w*\s*\(\s*"
+    r"|\b\w*(?:Type|TYPE)\w*\s*(?:=|\{)\s*)$")
 
 
 def schema_numbers(paths):
@@ -126,6 +128,10 @@ def self_test():
         "constexpr unsigned int IN_SERVICE = 0x160Fu;": 1,
         "if (state == 5647) {": 1,
         "request(0x16, body, 0x17, ret);": 1,
+        "static constexpr unsigned int Type = 0x20;": 1,
+        "constexpr unsigned int TYPE_EVENT{0x20};": 1,
+        "unsigned int evtType = 0x16;": 1,
+        "unsigned int mask = 0x20;": 0,
         "    case 0x20: return x;": 1,
         "std::uint32_t nextCallId_ = 0x100;": 0,
         "id = 33554439UL;": 1,

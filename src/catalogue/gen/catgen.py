@@ -32,8 +32,8 @@ Output (deterministic, no timestamps), in <outdir>/catalogue/generated/: wire.h,
 codes, their widths and the descriptor helpers; for each class <name>_bodies.{h,cpp} (fields,
 constructors and a field table; cat::Body does the rest) and <name>_ops.{h,cpp} (the
 operations, written by opgen.py); index.{h,cpp} listing every body; values.h with the named
-values as tolk::wire::<Class>::<Group>::<NAME> (header only: layers below the catalogue
-include it); and
+values as tolk::wire::<Class>::<Group>::<NAME> and the bodies' message types as
+tolk::wire::<Class>::MsgType::<Body> (header only: layers below the catalogue include it); and
 <outdir>/catalogue/generated/vx7relay.lua, the Wireshark decoder of the relay protocol
 (written by luagen.py from the same tables).
 """

@@ -201,13 +201,24 @@ def parse_value(cls, tok, where):
     cls.values.append((group, name, number, where))
 
 
+# values.h names the message type of every body in this group of its class; a value line may
+# add types that have no body.
+MSG_TYPES = "MsgType"
+
+
 def values_header(classes):
     g = "generated from " + " ".join(sorted({c.schema for c in classes})) + " by catgen.py; do not edit"
     out = [f"// {g}", "#pragma once", "", "namespace tolk::wire {", ""]
     for c in classes:
-        if not c.values:
+        msgs = [(b.name, b.number) for b in c.bodies if b.role == "msg"]
+        if not c.values and not msgs:
             continue
         out.append(f"namespace {c.name} {{")
+        if msgs:
+            # The message types of the class's bodies, for layers that cannot include the bodies.
+            out.append(f"namespace {MSG_TYPES} {{")
+            out += [f"inline constexpr unsigned int {n} = 0x{t:X};" for n, t in msgs]
+            out.append(f"}}  // namespace {MSG_TYPES}")
         groups = []
         for v in c.values:
             if v[0] not in groups:
