@@ -7,6 +7,7 @@
 #include "AllocCounter.h"
 #include "catalogue/generated/stdresource_bodies.h"
 #include "catalogue/generated/tsc_bodies.h"
+#include "catalogue/generated/values.h"
 #include "framework/Msg.h"
 #include "platform/tkhost/tkhost.h"
 
@@ -47,8 +48,8 @@ void BM_Marshal_DetectxEvts18(benchmark::State& state) {
     staticList<tolk::StdResource_Bodies::MsgDetectxEvts_t::List_t> list;
     list.realloc(18);
     for (unsigned int i = 0; i < 18; ++i) {
-        list[i]->EvtType = 0x1230 + i;
-        list[i]->EvtGroup = 0x1230;
+        list[i]->EvtType = tolk::wire::TSC::EvtType::CALL_STATE_FIRST + i;
+        list[i]->EvtGroup = tolk::wire::TSC::EvtType::CALL_STATE_FIRST;
     }
     tolk::StdResource_Bodies::MsgDetectxEvts_t body(addr, count, list);
     tolk::StdResource_Bodies::MsgDetectxEvts_t back;

@@ -3,6 +3,7 @@
 #include <benchmark/benchmark.h>
 
 #include "AllocCounter.h"
+#include "catalogue/generated/wire.h"
 #include "framework/Marshal.h"
 #include "framework/Msg.h"
 
@@ -11,33 +12,33 @@ namespace {
 class Scalars20 : public tolk::MsgBody {
   public:
     unsigned int writeMsg(tolk::Msg* m, unsigned int off) override {
-        off = tolk::putFirst(m, off, 0x380000, &w[0]);
+        off = tolk::putFirst(m, off, tolk::wire::pack(tolk::wire::U32), &w[0]);
         for (int i = 1; i < 10; ++i) {
-            off = tolk::putField(m, off, 0x380000, &w[i]);
+            off = tolk::putField(m, off, tolk::wire::pack(tolk::wire::U32), &w[i]);
         }
         for (int i = 0; i < 5; ++i) {
-            off = tolk::putField(m, off, 0x280000, &h[i]);
+            off = tolk::putField(m, off, tolk::wire::pack(tolk::wire::U16), &h[i]);
         }
         for (int i = 0; i < 5; ++i) {
-            off = tolk::putField(m, off, 0x200000, &b[i]);
+            off = tolk::putField(m, off, tolk::wire::pack(tolk::wire::U8), &b[i]);
         }
         len = bytes.length();
-        off = tolk::putField(m, off, 0x280000, &len);
-        return tolk::putList(m, off, 4, bytes, false);
+        off = tolk::putField(m, off, tolk::wire::pack(tolk::wire::U16), &len);
+        return tolk::putList(m, off, tolk::wire::U8, bytes, false);
     }
     unsigned int readMsg(tolk::Msg* m, unsigned int off) override {
-        off = tolk::getFirst(m, off, 0x380000, &w[0]);
+        off = tolk::getFirst(m, off, tolk::wire::pack(tolk::wire::U32), &w[0]);
         for (int i = 1; i < 10; ++i) {
-            off = tolk::getField(m, off, 0x380000, &w[i]);
+            off = tolk::getField(m, off, tolk::wire::pack(tolk::wire::U32), &w[i]);
         }
         for (int i = 0; i < 5; ++i) {
-            off = tolk::getField(m, off, 0x280000, &h[i]);
+            off = tolk::getField(m, off, tolk::wire::pack(tolk::wire::U16), &h[i]);
         }
         for (int i = 0; i < 5; ++i) {
-            off = tolk::getField(m, off, 0x200000, &b[i]);
+            off = tolk::getField(m, off, tolk::wire::pack(tolk::wire::U8), &b[i]);
         }
-        off = tolk::getField(m, off, 0x280000, &len);
-        return tolk::getList(m, off, 4, bytes, len, false);
+        off = tolk::getField(m, off, tolk::wire::pack(tolk::wire::U16), &len);
+        return tolk::getList(m, off, tolk::wire::U8, bytes, len, false);
     }
     unsigned int GetByteSize() override { return 40 + 10 + 5 + 2 + bytes.length(); }
 

@@ -12,7 +12,9 @@
 #include <thread>
 #include <vector>
 
+#include "catalogue/generated/lcon_bodies.h"
 #include "catalogue/generated/stdresource_bodies.h"
+#include "catalogue/generated/values.h"
 #include "framework/Msg.h"
 #include "platform/farm/ActiveFarm.h"
 #include "platform/farm/Addresses.h"
@@ -144,8 +146,9 @@ void BM_Sim_RequestReply(benchmark::State& state) {
         if (!c) {
             c = clients[static_cast<std::size_t>(state.thread_index())].get();
             tolk::StdResource_Bodies::MsgGetParm_t q;
-            q.Num = 0x1601;
-            req = c->frame(0x12, &q, farm::lconAddress(1, 1), 100 + state.thread_index());
+            q.Num = tolk::wire::LCON::Parm::TRUNK_TYPE;
+            req = c->frame(tolk::StdResource_Bodies::MsgGetParm_t::MsgType, &q,
+                           farm::lconAddress(1, 1), 100 + state.thread_index());
         }
         c->sendAll(req);
         benchmark::DoNotOptimize(c->readFrame());
@@ -165,9 +168,10 @@ void BM_Sim_EventsToOneSubscriber(benchmark::State& state) {
     Client c(server.server->port());
     tolk::StdResource_Bodies::MsgDetectEvt_t sub;
     sub.RetAddr = tolk::CompDesc_t(c.addr);
-    sub.EvtType = 0x1600;
+    sub.EvtType = tolk::LCON_Bodies::Evt_0x1600_t::EvtGroup_;
     sub.EvtGroup = 0;
-    c.sendAll(c.frame(0x16, &sub, farm::lconAddress(1, 1), 7));
+    c.sendAll(c.frame(tolk::StdResource_Bodies::MsgDetectEvt_t::MsgType, &sub,
+                      farm::lconAddress(1, 1), 7));
     c.readFrame();
     const std::int64_t n = state.range(0);
     for (auto _ : state) {

@@ -12,14 +12,15 @@
 #include <thread>
 
 #include "EchoPeers.h"
+#include "catalogue/generated/values.h"
 #include "platform/tkhost/tkhost.h"
 #include "transport/TKSMsgQueue.h"
 #include "transport/TKSSock.h"
 
 namespace {
 
-constexpr unsigned int kCommand = 0x1214;
-constexpr unsigned int kCompletion = 0x1215;
+constexpr unsigned int kCommand = tolk::wire::TSC::MsgType::MsgMakeCall_t;
+constexpr unsigned int kCompletion = tolk::wire::TSC::MsgType::MsgMakeCallCmplt_t;
 
 bool readAll(int fd, void* p, std::size_t n) {
     auto* c = static_cast<char*>(p);

@@ -6,6 +6,7 @@
 #include <cstring>
 #include <sstream>
 
+#include "catalogue/generated/wire.h"
 #include "framework/CompAttr_t.h"
 #include "framework/CompDesc_t.h"
 #include "framework/Marshal.h"
@@ -22,17 +23,17 @@ class CountedWords : public tolk::MsgBody {
   public:
     unsigned int writeMsg(Msg* m, unsigned int off) override {
         count = words.length();
-        off = tolk::putFirst(m, off, 0x380000, &count);
-        return tolk::putList(m, off, 7, words, false);
+        off = tolk::putFirst(m, off, tolk::wire::pack(tolk::wire::U32), &count);
+        return tolk::putList(m, off, tolk::wire::U32, words, false);
     }
     unsigned int readMsg(Msg* m, unsigned int off) override {
-        off = tolk::getFirst(m, off, 0x380000, &count);
+        off = tolk::getFirst(m, off, tolk::wire::pack(tolk::wire::U32), &count);
         // Counts the list may hold but no message carries only cost time here: fold them down
         // and keep the impossible ones, which must be refused.
         if (count <= staticList<unsigned int>::MaxBytes / 4) {
             count %= 2048;
         }
-        return tolk::getList(m, off, 7, words, count, false);
+        return tolk::getList(m, off, tolk::wire::U32, words, count, false);
     }
     unsigned int GetByteSize() override { return 4 + 4 * words.length(); }
     void toStream(std::ostream* os) const override {
@@ -46,17 +47,17 @@ class AddrAndAttrs : public tolk::MsgBody {
   public:
     unsigned int writeMsg(Msg* m, unsigned int off) override {
         off = addr.writeMsg(m, off);
-        off = tolk::putFixed(m, off, 10, 128, name, false);
+        off = tolk::putFixed(m, off, tolk::wire::CHAR, 128, name, false);
         n = static_cast<unsigned char>(shorts.length());
-        off = tolk::putField(m, off, 0x200000, &n);
-        off = tolk::putList(m, off, 5, shorts, false);
+        off = tolk::putField(m, off, tolk::wire::pack(tolk::wire::U8), &n);
+        off = tolk::putList(m, off, tolk::wire::U16, shorts, false);
         return tolk::putBodies(m, off, attrs);
     }
     unsigned int readMsg(Msg* m, unsigned int off) override {
         off = addr.readMsg(m, off);
-        off = tolk::getFixed(m, off, 10, 128, name, false);
-        off = tolk::getField(m, off, 0x200000, &n);
-        off = tolk::getList(m, off, 5, shorts, n, false);
+        off = tolk::getFixed(m, off, tolk::wire::CHAR, 128, name, false);
+        off = tolk::getField(m, off, tolk::wire::pack(tolk::wire::U8), &n);
+        off = tolk::getList(m, off, tolk::wire::U16, shorts, n, false);
         return tolk::getTrailingBodies(m, off, attrs);
     }
     unsigned int GetByteSize() override {

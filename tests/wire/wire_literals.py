@@ -2,7 +2,7 @@
 """Fails when a number the schemas declare (a message type, an event group, a named value) is
 written as a literal in the sources instead of being taken from the generated headers.
 
-Usage: wire_literals.py SRC_DIR SCHEMA...   check SRC_DIR, list what it finds, exit 1 if any
+Usage: wire_literals.py DIR... SCHEMA...    check the DIRs, list what it finds, exit 1 if any
        wire_literals.py --self-test          check the scanner against planted literals
 
 What counts as a literal, in code (comments do not count, string literals do):
@@ -162,11 +162,13 @@ def main(argv):
     if len(argv) < 3:
         print(__doc__, file=sys.stderr)
         return 2
-    declared, types = schema_numbers(argv[2:])
+    schemas = [a for a in argv[1:] if a.endswith(".schema")]
+    dirs = [a for a in argv[1:] if not a.endswith(".schema")]
+    declared, types = schema_numbers(schemas)
     if len(declared) < 50:
         print(f"only {len(declared)} numbers read from the schemas: wrong arguments?")
         return 2
-    found = scan_tree(argv[1], declared, types)
+    found = [f for d in dirs for f in scan_tree(d, declared, types)]
     for f in found:
         print(f)
     print(f"{len(found)} wire literals outside the schemas ({len(declared)} numbers declared)")
