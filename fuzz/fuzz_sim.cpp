@@ -6,6 +6,7 @@
 #include <sstream>
 #include <string>
 
+#include "catalogue/generated/values.h"
 #include "platform/farm/ActiveFarm.h"
 #include "platform/farm/Addresses.h"
 #include "platform/tkhost/tkhost.h"
@@ -13,15 +14,70 @@
 
 namespace {
 
+namespace wire = tolk::wire;
+
 // Types the model sends, so that most inputs reach a real handler.
 constexpr std::uint32_t kTypes[] = {
-    0x02,     0x08,     0x0A,     0x12,     0x14,     0x16,     0x18,     0x1A,     0x1C,
-    0x1E,     0x2D,     0x800053, 0x80001E, 0x80001D, 0x80003D, 0x80003E, 0x800059, 0x80005A,
-    0x800032, 0x800030, 0x80001B, 0x800023, 0x800036, 0x800027, 0x800057, 0x1214,   0x1201,
-    0x1200,   0x120A,   0x121C,   0x121D,   0x120D,   0x120F,   0x121F,   0x1246,   0x1224,
-    0x1222,   0x1234,   0x1236,   0x1242,   0x1244,   0x124E,   0x1608,   0x1610,   0x1602,
-    0x1606,   0x1604,   0x160E,   0x160C,   0x1613,   0x1417,   0x1415,   0x1211,   0x121E,
-    0x1202,   0x1212,   0x1207,   0x1203,   0x122D};
+    wire::StdResource::MsgType::MsgComtest_t,
+    wire::StdResource::MsgType::MsgSetParm_t,
+    wire::StdResource::MsgType::MsgSetxParms_t,
+    wire::StdResource::MsgType::MsgGetParm_t,
+    wire::StdResource::MsgType::MsgGetxParms_t,
+    wire::StdResource::MsgType::MsgDetectEvt_t,
+    wire::StdResource::MsgType::MsgDetectxEvts_t,
+    wire::StdResource::MsgType::MsgCancelEvt_t,
+    wire::StdResource::MsgType::MsgCancelxEvts_t,
+    wire::StdResource::MsgType::MsgCancelAllEvts_t,
+    wire::StdResource::MsgType::MsgGetVParm_t,
+    wire::ClusterMgr::MsgType::ClusterFind_t,
+    wire::ClusterMgr::MsgType::ClusterCompByAttr_t,
+    wire::ClusterMgr::MsgType::ClusterByComp_t,
+    wire::ResourceMgr::MsgType::CompFind_t,
+    wire::ResourceMgr::MsgType::CompInstAllocate_t,
+    wire::ResourceMgr::MsgType::CompUse_t,
+    wire::ResourceMgr::MsgType::CompUnuse_t,
+    wire::Cluster::MsgType::ClusterSlotInfo_t,
+    wire::Cluster::MsgType::ClusterSlotAssign_t,
+    wire::Cluster::MsgType::ClusterActivate_t,
+    wire::Cluster::MsgType::ClusterDeactivate_t,
+    wire::Cluster::MsgType::ClusterSlotUnassign_t,
+    wire::Cluster::MsgType::ClusterCompInfo_t,
+    wire::Cluster::MsgType::ClusterUnlock_t,
+    wire::TSC::MsgType::MsgMakeCall_t,
+    wire::TSC::MsgType::MsgAnswerCall_t,
+    wire::TSC::MsgType::MsgAcceptCall_t,
+    wire::TSC::MsgType::MsgDropCall_t,
+    wire::TSC::MsgType::MsgReleaseCall_t,
+    wire::TSC::MsgType::MsgRejectCall_t,
+    wire::TSC::MsgType::MsgGetCallState_t,
+    wire::TSC::MsgType::MsgGetChanState_t,
+    wire::TSC::MsgType::MsgSetChanState_t,
+    wire::TSC::MsgType::MsgResetLineDevice_t,
+    wire::TSC::MsgType::MsgDial_t,
+    wire::TSC::MsgType::MsgSendISDN_t,
+    wire::TSC::MsgType::MsgAttach_t,
+    wire::TSC::MsgType::MsgDetach_t,
+    wire::TSC::MsgType::MsgSetAlarmMask_t,
+    wire::TSC::MsgType::MsgGetAlarmMask_t,
+    wire::TSC::MsgType::MsgTxRxSignalingGet_t,
+    wire::LCON::MsgType::MsgGetLineState_t,
+    wire::LCON::MsgType::MsgSetLineState_t,
+    wire::LCON::MsgType::MsgGetAlarms_t,
+    wire::LCON::MsgType::MsgGetFaults_t,
+    wire::LCON::MsgType::MsgGetDiagMode_t,
+    wire::LCON::MsgType::MsgSetDiagMode_t,
+    wire::LCON::MsgType::MsgSendAlarm_t,
+    wire::LCON::MsgType::MsgStopAlarm_t,
+    wire::CAS::MsgType::MsgMatchCondition_t,
+    wire::CAS::MsgType::MsgDial_t,
+    wire::TSC::MsgType::MsgHoldCall_t,
+    wire::TSC::MsgType::MsgRetrieveCall_t,
+    wire::TSC::MsgType::MsgBlindTransferCall_t,
+    wire::TSC::MsgType::MsgInitTransfer_t,
+    wire::TSC::MsgType::MsgCompleteTransfer_t,
+    wire::TSC::MsgType::MsgCancelTransfer_t,
+    wire::TSC::MsgType::MsgProceedCall_t,
+};
 
 sim::Emulation& emulation() {
     static std::ostringstream log;
@@ -77,7 +133,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
             return 0;
         }
         b->type = type;
-        b->transTag = 0x1234u << 8;
+        b->transTag = 0x123400u;
         b->srcBoard = 0xFF;
         b->srcInstance = 1;
         b->tgtInstance = tgt.instance;
