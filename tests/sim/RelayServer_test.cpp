@@ -22,6 +22,7 @@
 #include <thread>
 
 #include "BoardEvents.h"
+#include "RawClient.h"
 #include "catalogue/generated/lcon_bodies.h"
 #include "catalogue/generated/stdresource_bodies.h"
 #include "catalogue/generated/tsc_bodies.h"
@@ -46,116 +47,6 @@ using tolk::CompDesc_t;
 using Std = tolk::StdResource_Bodies;
 using Tsc = tolk::TSC_Bodies;
 using Lcon = tolk::LCON_Bodies;
-
-// A plain TCP client for raw frames.
-class RawClient {
-  public:
-    // A receive buffer of rcvbuf bytes (0: the system's) keeps what the kernel holds for a
-    // client that does not read small against what the server queues.
-    explicit RawClient(int port, int rcvbuf = 0) {
-        fd = ::socket(AF_INET, SOCK_STREAM, 0);
-        if (rcvbuf > 0) {
-            setsockopt(fd, SOL_SOCKET, SO_RCVBUF, &rcvbuf, sizeof rcvbuf);
-        }
-        sockaddr_in sa{};
-        sa.sin_family = AF_INET;
-        sa.sin_port = htons(static_cast<std::uint16_t>(port));
-        sa.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-        connected = ::connect(fd, reinterpret_cast<sockaddr*>(&sa), sizeof sa) == 0;
-        timeval tv{5, 0};
-        setsockopt(fd, SOL_SOCKET, SO_RCVTIMEO, &tv, sizeof tv);
-    }
-    ~RawClient() {
-        if (fd >= 0) {
-            ::close(fd);
-        }
-    }
-    void send(const std::vector<unsigned char>& bytes) {
-        ASSERT_EQ(::send(fd, bytes.data(), bytes.size(), MSG_NOSIGNAL),
-                  static_cast<ssize_t>(bytes.size()));
-    }
-    std::vector<unsigned char> open() {
-        unsigned char body[TKS_OPEN_BODY_BYTES];
-        TKSOpenRequest req;
-        req.maxRetMsgSize = 512;
-        req.depth = 5;
-        tksEncodeOpen(req, body);
-        msg_t m;
-        m.type = TKS_FRAME_OPEN;
-        m.size = sizeof body;
-        m.body = body;
-        return tksEncodeFrame(m);
-    }
-    // A message frame of a request without a body.
-    static std::vector<unsigned char> request(const farm::Address& to, std::uint32_t type) {
-        TKMsg32Bit* block = nullptr;
-        EXPECT_EQ(tkMsgAllocate(0, &block), 0);
-        block->type = type;
-        block->transTag = 0x4200;
-        block->tgtInstance = to.instance;
-        block->tgtBoard = to.board;
-        block->tgtProcessor = to.processor;
-        block->tgtComponent = to.component;
-        block->tgtNode = to.node;
-        std::vector<unsigned char> frame;
-        EXPECT_TRUE(tksEncodeMessageFrame(block, frame));
-        tkMsgFree(block);
-        return frame;
-    }
-    // Sends the open and reads the whole assigned-address frame: true when it came.
-    bool opened() {
-        send(open());
-        return read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES).size() ==
-               TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES;
-    }
-    // Reads n bytes; fewer if the server closed.
-    std::vector<unsigned char> read(std::size_t n) {
-        std::vector<unsigned char> out(n);
-        std::size_t got = 0;
-        while (got < n) {
-            ssize_t r = ::recv(fd, out.data() + got, n - got, 0);
-            if (r <= 0) {
-                break;
-            }
-            got += static_cast<std::size_t>(r);
-        }
-        out.resize(got);
-        return out;
-    }
-    bool closedByServer() {
-        char c;
-        return ::recv(fd, &c, 1, 0) == 0;
-    }
-    int fd = -1;
-    bool connected = false;
-};
-
-// The server's log, written on its thread and read by the test while it runs.
-class LockedLog : public std::streambuf {
-  public:
-    std::string text() {
-        std::lock_guard<std::mutex> g(lock_);
-        return text_;
-    }
-
-  protected:
-    int_type overflow(int_type c) override {
-        if (c != traits_type::eof()) {
-            std::lock_guard<std::mutex> g(lock_);
-            text_.push_back(static_cast<char>(c));
-        }
-        return c;
-    }
-    std::streamsize xsputn(const char* p, std::streamsize n) override {
-        std::lock_guard<std::mutex> g(lock_);
-        text_.append(p, static_cast<std::size_t>(n));
-        return n;
-    }
-
-  private:
-    std::mutex lock_;
-    std::string text_;
-};
 
 class RelayTest : public testing::Test {
   protected:
