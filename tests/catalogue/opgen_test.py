@@ -7,9 +7,13 @@ import tempfile
 import unittest
 
 sys.dont_write_bytecode = True
-sys.path.insert(0, os.path.join(os.path.dirname(__file__), "..", "..", "src", "catalogue", "gen"))
+CATALOGUE = os.path.join(os.path.dirname(__file__), "..", "..", "src", "catalogue")
+sys.path.insert(0, os.path.join(CATALOGUE, "gen"))
 import catgen  # noqa: E402
 import opgen  # noqa: E402
+
+# The field types of the schemas come from the wire schema, as in the build.
+catgen.parse_wire(os.path.join(CATALOGUE, "wire.schema"))
 
 HEAD = "class X\nmsg 0x10 MsgDo_t Id:u32 Count:u32 Ids:u32[Count] Name:char[8]\nmsg 0x11 MsgDoCmplt_t\n"
 
