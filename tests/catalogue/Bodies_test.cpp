@@ -10,7 +10,7 @@
 #include <set>
 #include <string>
 
-#include "Golden.h"
+#include "BodyGolden.h"
 #include "catalogue/generated/cas_bodies.h"
 #include "catalogue/generated/cluster_bodies.h"
 #include "catalogue/generated/index.h"

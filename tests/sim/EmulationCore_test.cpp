@@ -6,44 +6,26 @@
 #include <gtest/gtest.h>
 
 #include <chrono>
-#include <condition_variable>
 #include <cstring>
 #include <functional>
 #include <memory>
-#include <mutex>
 #include <sstream>
 #include <vector>
 
-#include "BoardEvents.h"
-#include "catalogue/generated/cluster_bodies.h"
-#include "catalogue/generated/clustermgr_bodies.h"
-#include "catalogue/generated/lcon_bodies.h"
-#include "catalogue/generated/resourcemgr_bodies.h"
 #include "catalogue/generated/stdresource_bodies.h"
 #include "catalogue/generated/tsc_bodies.h"
-#include "framework/Addressable.h"
 #include "framework/Msg.h"
 #include "platform/farm/ActiveFarm.h"
 #include "platform/farm/Addresses.h"
 #include "platform/farm/FarmParser.h"
 #include "platform/tkhost/tkhost.h"
-#include "sim/Builtin.h"
 #include "sim/ErrorCodes.h"
 
 namespace sim {
 namespace {
 
-using testsupport::BoardEvents;
-using testsupport::cd;
-using testsupport::setText;
-using tolk::Addressable;
 using tolk::CompDesc_t;
 using Std = tolk::StdResource_Bodies;
-using Rm = tolk::ResourceMgr_Bodies;
-using Cm = tolk::ClusterMgr_Bodies;
-using Cl = tolk::Cluster_Bodies;
-using Tsc = tolk::TSC_Bodies;
-using Lcon = tolk::LCON_Bodies;
 
 TKMsg32Bit* block(std::uint32_t type, const farm::Address& tgt, std::uint32_t trans,
                   const std::vector<unsigned char>& body) {

@@ -1,5 +1,9 @@
 #pragma once
 
+// Golden bytes of message bodies: a body's bytes as a sender writes them, with a canary
+// behind the size it claims, and a message made of given bytes for readers. The byte
+// builders and the comparison are the shared ones of Golden.h.
+
 #include <gtest/gtest.h>
 
 #include <cstdint>
@@ -10,13 +14,12 @@
 #include <string>
 #include <vector>
 
+#include "Golden.h"
 #include "framework/Msg.h"
 #include "framework/MsgBody.h"
 #include "platform/tkhost/tkhost.h"
 
 namespace golden {
-
-using Bytes = std::vector<std::uint8_t>;
 
 inline std::uint8_t* bodyOf(tolk::Msg& m) {
     return reinterpret_cast<std::uint8_t*>(m.getMsgRef()) + TK_MSG_HEADER_SIZE;
@@ -56,54 +59,6 @@ inline std::string text(const tolk::MsgBody& b) {
     std::ostringstream os;
     b.toStream(&os);
     return os.str();
-}
-
-inline std::string hex(const Bytes& b) {
-    std::string s;
-    char buf[4];
-    for (std::uint8_t c : b) {
-        std::snprintf(buf, sizeof buf, "%02x ", c);
-        s += buf;
-    }
-    return s;
-}
-
-// Both byte strings in hex and the offset of the first difference.
-inline ::testing::AssertionResult SameBytes(const Bytes& actual, const Bytes& expected) {
-    if (actual == expected) {
-        return ::testing::AssertionSuccess();
-    }
-    std::size_t i = 0;
-    while (i < actual.size() && i < expected.size() && actual[i] == expected[i]) {
-        ++i;
-    }
-    return ::testing::AssertionFailure()
-           << "first difference at offset " << i << " (actual " << actual.size()
-           << " bytes, expected " << expected.size() << ")\n  actual:   " << hex(actual)
-           << "\n  expected: " << hex(expected);
-}
-
-// Big-endian helpers for writing golden bytes out readably.
-inline void u32(Bytes& b, std::uint32_t v) {
-    b.push_back(static_cast<std::uint8_t>(v >> 24));
-    b.push_back(static_cast<std::uint8_t>(v >> 16));
-    b.push_back(static_cast<std::uint8_t>(v >> 8));
-    b.push_back(static_cast<std::uint8_t>(v));
-}
-inline void u16(Bytes& b, std::uint16_t v) {
-    b.push_back(static_cast<std::uint8_t>(v >> 8));
-    b.push_back(static_cast<std::uint8_t>(v));
-}
-inline void u8(Bytes& b, std::uint8_t v) {
-    b.push_back(v);
-}
-inline void zeros(Bytes& b, std::size_t n) {
-    b.insert(b.end(), n, 0);
-}
-inline void chars(Bytes& b, const char* s, std::size_t fixed) {
-    std::size_t n = std::strlen(s);
-    b.insert(b.end(), s, s + n);
-    zeros(b, fixed - n);
 }
 
 }  // namespace golden
