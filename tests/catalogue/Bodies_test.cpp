@@ -380,7 +380,11 @@ TEST_P(EveryBody, WritesWhatItSizesAndReadsItBack) {
 
 TEST_P(EveryBody, SurvivesEveryPrefixAndHostileCounts) {
     Bytes full = encodeCanaried(*readFrom(pattern(200))).bytes;
-    for (std::size_t n = 0; n < full.size(); ++n) {
+    // Every prefix that ends in the leading fields or in the tail; in between lies a run of
+    // like elements, where a cut every 13th byte lands, element after element, at each offset
+    // of one.
+    constexpr std::size_t kEdge = 256;
+    for (std::size_t n = 0; n < full.size(); n += n < kEdge || n + kEdge >= full.size() ? 1 : 13) {
         std::string t = text(*readFrom(Bytes(full.begin(), full.begin() + static_cast<long>(n))));
         ASSERT_EQ(t.substr(0, 1), "{");
     }

@@ -25,11 +25,6 @@ inline std::uint8_t* bodyOf(tolk::Msg& m) {
     return reinterpret_cast<std::uint8_t*>(m.getMsgRef()) + TK_MSG_HEADER_SIZE;
 }
 
-inline Bytes bytesOf(tolk::Msg& m) {
-    const std::uint8_t* p = bodyOf(m);
-    return Bytes(p, p + m.getSize());
-}
-
 // A message whose body is exactly these bytes.
 inline std::unique_ptr<tolk::Msg> msgOf(const Bytes& b) {
     auto m = std::make_unique<tolk::Msg>(static_cast<unsigned int>(b.size()));
@@ -39,31 +34,11 @@ inline std::unique_ptr<tolk::Msg> msgOf(const Bytes& b) {
     return m;
 }
 
-struct Encoded {
-    Bytes bytes;
-    unsigned int size;     // GetByteSize
-    unsigned int written;  // writeMsg's result
-};
-
-// Sizes the message by GetByteSize and writes the body into it, as a sender does.
-inline Encoded encode(tolk::MsgBody& body) {
-    Encoded e;
-    e.size = body.GetByteSize();
-    tolk::Msg m(e.size);
-    e.written = body.writeMsg(&m, 0);
-    e.bytes = bytesOf(m);
-    return e;
-}
-
 inline std::string text(const tolk::MsgBody& b) {
     std::ostringstream os;
     b.toStream(&os);
     return os.str();
 }
-
-}  // namespace golden
-
-namespace golden {
 
 // Filled into a message before a body writes it; the byte behind the body must keep it.
 inline constexpr std::uint8_t kCanary = 0xA5;
@@ -75,8 +50,9 @@ struct Canaried {
     bool canaryKept;       // the byte behind GetByteSize is untouched
 };
 
-// As encode, into a message one byte longer than GetByteSize and filled with the canary, so
-// that a body writing past its size, or leaving a gap, shows in the bytes.
+// Sizes the message by GetByteSize and writes the body into it, as a sender does, but one byte
+// longer and filled with the canary, so that a body writing past its size, or leaving a gap,
+// shows in the bytes.
 inline Canaried encodeCanaried(tolk::MsgBody& body) {
     Canaried c;
     c.size = body.GetByteSize();

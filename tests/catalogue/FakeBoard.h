@@ -10,7 +10,9 @@
 #include <cstring>
 #include <deque>
 #include <functional>
+#include <map>
 #include <mutex>
+#include <set>
 #include <thread>
 #include <vector>
 
@@ -35,60 +37,21 @@ struct Answer {
 // What the services and components of a board answer: the shared completions of the
 // services, nothing to a one-way command, else the command's number + 1.
 inline std::vector<Answer> boardAnswer(const Sent& s, std::vector<std::uint8_t> body = {}) {
-    switch (s.type) {
-        case 0x800059:
-        case 0x80005A:
-        case 0x80001B:
-        case 0x800023:
-        case 0x800030:
-        case 0x800036:
-        case 0x800054:
-        case 0x800055:
-        case 0x800056:
-            return {{0x800000, body}};
-        case 0x80003D:
-        case 0x80003E:
-        case 0x80001E:
-            return {{0x800007, body}};
-        case 0x800053:
-        case 0x80001D:
-        case 0x800020:
-            return {{0x80002C, body}};
-        case 0x800032:
-            return {{0x800033, body}};
-        case 0x80003A:
-            return {{0x800006, body}};
-        case 0x800027:
-            return {{0x800028, body}};
-        case 0x00:
-        case 0x01:
-        case 0x06:
-        case 0x1200:
-        case 0x1201:
-        case 0x1202:
-        case 0x1203:
-        case 0x1204:
-        case 0x1207:
-        case 0x120A:
-        case 0x1211:
-        case 0x121A:
-        case 0x121B:
-        case 0x121C:
-        case 0x121D:
-        case 0x121E:
-        case 0x122D:
-        case 0x1612:
-        case 0x1613:
-        case 0x140D:
-        case 0x800041:
-        case 0x80001F:
-        case 0x800025:
-        case 0x800024:
-        case 0x800052:
-            return {};
-        default:
-            return {{s.type + 1, body}};
+    static const std::map<unsigned int, unsigned int> kShared = {
+        {0x800059, 0x800000}, {0x80005A, 0x800000}, {0x80001B, 0x800000}, {0x800023, 0x800000},
+        {0x800030, 0x800000}, {0x800036, 0x800000}, {0x800054, 0x800000}, {0x800055, 0x800000},
+        {0x800056, 0x800000}, {0x80003D, 0x800007}, {0x80003E, 0x800007}, {0x80001E, 0x800007},
+        {0x800053, 0x80002C}, {0x80001D, 0x80002C}, {0x800020, 0x80002C}, {0x800032, 0x800033},
+        {0x80003A, 0x800006}, {0x800027, 0x800028}};
+    static const std::set<unsigned int> kOneWay = {
+        0x00,   0x01,   0x06,     0x1200,   0x1201,   0x1202,   0x1203,  0x1204, 0x1207,
+        0x120A, 0x1211, 0x121A,   0x121B,   0x121C,   0x121D,   0x121E,  0x122D, 0x1612,
+        0x1613, 0x140D, 0x800041, 0x80001F, 0x800025, 0x800024, 0x800052};
+    if (kOneWay.count(s.type) != 0) {
+        return {};
     }
+    auto shared = kShared.find(s.type);
+    return {{shared != kShared.end() ? shared->second : s.type + 1, std::move(body)}};
 }
 
 class FakeBoard {

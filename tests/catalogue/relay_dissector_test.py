@@ -256,57 +256,56 @@ def malformed_segments():
     return [("c", cut_open), ("c", short), ("c", oversize)]
 
 
+def on1(comp, inst):
+    return dict(node=0, board=1, processor=1, component=comp, instance=inst)
+
+
+LCON_1, CLUSTER_1, RMGR_1 = on1(22, 1), on1(2, 33), on1(0, 5)
+LCON_ALARMS = "vx7relay.LCON.MsgGetAlarmsCmplt_t.AlarmInfo_t."
+LCON_VPARMS = "vx7relay.LCON.Std_MsgGetVParmCmplt_t.Parms_t."
+
+# One message for each shape of field that the exchange with vx7sim does not show: type,
+# target, body, the name it must be decoded as, and fields (a list: every value of the field).
+SHAPES = [
+    ("counted element bodies", 0x1603, LCON_1, struct.pack(">IIBIB", 2, 0x1A, 1, 0x1B, 0),
+     "MsgGetAlarmsCmplt_t",
+     {LCON_ALARMS + "Type": ["26", "27"], LCON_ALARMS + "State": ["1", "0"]}),
+    # A LCON's own 0x2E, with values shaped by their descriptors: one u32, three u16.
+    ("descriptor-shaped values", 0x2E, LCON_1,
+     struct.pack(">HIII", 2, 4, 0x380000, 77)
+     + struct.pack(">II3H", 5, 0x280000 | (2 << 11), 1, 2, 3),
+     "Std_MsgGetVParmCmplt_t",
+     {LCON_VPARMS + "Parm": ["4", "5"], LCON_VPARMS + "Val": ["77", "1", "2", "3"]}),
+    ("counted addresses", 0x800028, CLUSTER_1,
+     compdesc(CLUSTER_1) + bytes([2]) + compdesc(on1(18, 33)) + compdesc(on1(20, 33)),
+     "ClusterCompInfoResult_t", {"vx7relay.compdesc.component": ["2", "18", "20"],
+                                 "vx7relay.Cluster.ClusterCompInfoResult_t.count": ["2"]}),
+    ("counted attributes", 0x80003D, RMGR_1, compdesc(on1(18, 0)) + struct.pack(">IIi", 1, 3, -2),
+     "CompFind_t", {"vx7relay.compattr.key": ["3"], "vx7relay.compattr.value": ["-2"]}),
+    ("a u16 run counted by a field of another name", 0x800030, CLUSTER_1,
+     compdesc(CLUSTER_1) + struct.pack(">IBBBHH", 7, 2, 0, 0xFF, 5, 6),
+     "ClusterSlotAssign_t", {"vx7relay.Cluster.ClusterSlotAssign_t.slotIds": ["5", "6"]}),
+    ("characters to the end of the body", 0x13, TSC_1_1_1,
+     struct.pack(">III", 4, 1, 5) + b"hello", "MsgGetParmCmplt_t",
+     {"vx7relay.StdResource.MsgGetParmCmplt_t.Text": ["hello"]}),
+    # A hand-written shape that the decoder does not follow is shown as bytes.
+    ("a KVSet as bytes", 0x1201, TSC_1_1_1, struct.pack(">II", 9, 2) + bytes(12),
+     "MsgAnswerCall_t", {"vx7relay.TSC.MsgAnswerCall_t.CallId": ["9"],
+                         "vx7relay.TSC.MsgAnswerCall_t.KVSet": [":".join(["00"] * 12)]}),
+]
+
+
 def shape_segments():
-    """One message for each shape of field that the exchange with vx7sim does not show."""
     me = dict(node=0, board=0, processor=0, component=0, instance=9)
-    on1 = lambda comp, inst: dict(node=0, board=1, processor=1, component=comp, instance=inst)
-    lcon, cluster, rmgr = on1(22, 1), on1(2, 33), on1(0, 5)
-    msgs = [
-        # counted element bodies
-        (0x1603, lcon, struct.pack(">IIBIB", 2, 0x1A, 1, 0x1B, 0)),
-        # a LCON's own 0x2E, with values shaped by their descriptors: one u32, three u16
-        (0x2E, lcon, struct.pack(">HIII", 2, 4, 0x380000, 77)
-         + struct.pack(">II3H", 5, 0x280000 | (2 << 11), 1, 2, 3)),
-        # counted addresses
-        (0x800028, cluster, compdesc(cluster) + bytes([2]) + compdesc(on1(18, 33))
-         + compdesc(on1(20, 33))),
-        # counted attributes, at the resource manager
-        (0x80003D, rmgr, compdesc(on1(18, 0)) + struct.pack(">IIi", 1, 3, -2)),
-        # a u16 run counted by a field of another name
-        (0x800030, cluster, compdesc(cluster) + struct.pack(">IBBBHH", 7, 2, 0, 0xFF, 5, 6)),
-        # characters to the end of the body
-        (0x13, TSC_1_1_1, struct.pack(">III", 4, 1, 5) + b"hello"),
-        # a hand-written shape the decoder does not follow: shown as bytes
-        (0x1201, TSC_1_1_1, struct.pack(">II", 9, 2) + bytes(12)),
-    ]
-    return [("c", message(t, 5000 + i, me, tgt, body)) for i, (t, tgt, body) in enumerate(msgs)]
+    return [("c", message(t, 5000 + i, me, tgt, body))
+            for i, (_, t, tgt, body, _, _) in enumerate(SHAPES)]
 
 
 def check_shapes(frames):
     check(not [f for f in frames if "vx7relay.malformed" in f], "a good shape marked malformed")
-    names = [one(f, "vx7relay.msg.name") for f in frames]
-    check(names == ["MsgGetAlarmsCmplt_t", "Std_MsgGetVParmCmplt_t", "ClusterCompInfoResult_t",
-                    "CompFind_t", "ClusterSlotAssign_t", "MsgGetParmCmplt_t",
-                    "MsgAnswerCall_t"], f"shapes decoded as {names}")
-    if len(frames) != 7:
-        return
-    alarms, vparm, info, find, slots, parm, answer = frames
-    p = "vx7relay.LCON.MsgGetAlarmsCmplt_t.AlarmInfo_t."
-    check(alarms.get(p + "Type") == ["26", "27"], f"alarm types {alarms.get(p + 'Type')}")
-    check(alarms.get(p + "State") == ["1", "0"], "alarm states")
-    p = "vx7relay.LCON.Std_MsgGetVParmCmplt_t.Parms_t."
-    check(vparm.get(p + "Parm") == ["4", "5"], "descriptor-shaped: Parm")
-    check(vparm.get(p + "Val") == ["77", "1", "2", "3"],
-          f"descriptor-shaped values {vparm.get(p + 'Val')}")
-    check(info.get("vx7relay.compdesc.component") == ["2", "18", "20"], "counted addresses")
-    check(info.get("vx7relay.Cluster.ClusterCompInfoResult_t.count") == ["2"], "address count")
-    check(find.get("vx7relay.compattr.key") == ["3"], "attribute key")
-    check(find.get("vx7relay.compattr.value") == ["-2"], "attribute value")
-    check(slots.get("vx7relay.Cluster.ClusterSlotAssign_t.slotIds") == ["5", "6"], "slot ids")
-    check(one(parm, "vx7relay.StdResource.MsgGetParmCmplt_t.Text") == "hello", "trailing text")
-    check(one(answer, "vx7relay.TSC.MsgAnswerCall_t.CallId") == "9", "CallId before a KVSet")
-    check(one(answer, "vx7relay.TSC.MsgAnswerCall_t.KVSet") == ":".join(["00"] * 12),
-          f"KVSet bytes {one(answer, 'vx7relay.TSC.MsgAnswerCall_t.KVSet')}")
+    check(len(frames) == len(SHAPES), f"{len(frames)} of {len(SHAPES)} shapes decoded")
+    for f, (what, _, _, _, name, fields) in zip(frames, SHAPES):
+        expect(f, what, {"vx7relay.msg.name": name, **fields})
 
 
 RANDOM_FRAMES = 300
@@ -362,86 +361,56 @@ def one(fr, name):
     return v[0] if v else None
 
 
-def by_name(frames, msg):
-    return [f for f in frames if one(f, "vx7relay.msg.name") == msg]
+def expect(fr, what, fields):
+    """Each field shows the wanted value (a list: every value it takes, in order)."""
+    for name, want in fields.items():
+        got = fr.get(name) if isinstance(want, list) else one(fr, name)
+        check(got == want, f"{what}: {name} is {got!r}, not {want!r}")
+
+
+def only(frames, what, field, value):
+    got = [f for f in frames if one(f, field) == value]
+    check(len(got) == 1, f"{len(got)} {what} decoded")
+    return got[0] if got else {}
 
 
 def check_session(frames, seen):
-    opens = [f for f in frames if one(f, "vx7relay.type") == str(OPEN)]
-    check(len(opens) == 1, f"{len(opens)} open frames decoded")
-    if opens:
-        o = opens[0]
-        check(one(o, "vx7relay.open.max_reply_size") == "512", "open: largest reply size")
-        check(one(o, "vx7relay.open.depth") == "5", "open: queue depth")
-        check(one(o, "vx7relay.open.instance") == "0", "open: instance")
-    asg = [f for f in frames if one(f, "vx7relay.type") == str(ASSIGNED)]
-    check(len(asg) == 1, f"{len(asg)} assigned-address frames decoded")
     me = seen["assigned"]
-    if asg:
-        for k, v in me.items():
-            check(one(asg[0], f"vx7relay.assigned.{k}") == str(v), f"assigned address: {k}")
-
-    det = by_name(frames, "MsgDetectEvt_t")
-    check(len(det) == 1, "the subscription to a TSC is not decoded as MsgDetectEvt_t")
-    if det:
-        d = det[0]
-        check(one(d, "vx7relay.StdResource.MsgDetectEvt_t.EvtGroup") == str(CALL_STATE_GROUP),
-              "subscription: EvtGroup")
-        check(one(d, "vx7relay.compdesc.instance") == str(me["instance"]),
-              "subscription: RetAddr instance")
-
-    mc = by_name(frames, "MsgMakeCall_t")
-    check(len(mc) == 1, f"{len(mc)} MsgMakeCall_t decoded (split across two segments)")
-    if mc:
-        m = mc[0]
-        p = "vx7relay.TSC.MsgMakeCall_t."
-        check(one(m, p + "DestAddr") == "5551234", f"MakeCall DestAddr {one(m, p + 'DestAddr')}")
-        check(one(m, p + "OrigAddr") == "5551212", "MakeCall OrigAddr")
-        check(one(m, p + "CallProgress") == "1", "MakeCall CallProgress")
-        check(one(m, "vx7relay.msg.trans") == str(MAKECALL_TRANS), "MakeCall transaction id")
-        check(one(m, "vx7relay.msg.type") == "0x00001214",
-              f"MakeCall type {one(m, 'vx7relay.msg.type')}")
-        for k, v in TSC_1_1_1.items():
-            check(one(m, f"vx7relay.msg.tgt.{k}") == str(v), f"MakeCall target {k}")
-        for k, v in me.items():
-            check(one(m, f"vx7relay.msg.src.{k}") == str(v), f"MakeCall source {k}")
-        check("vx7relay.malformed" not in m, "a good MakeCall is marked malformed")
-
-    cp = by_name(frames, "MsgMakeCallCmplt_t")
-    check(len(cp) == 1, f"{len(cp)} MsgMakeCallCmplt_t decoded")
-    if cp:
-        check(one(cp[0], "vx7relay.TSC.MsgMakeCallCmplt_t.CallId") == str(seen["callid"]),
-              "completion CallId")
-        check(one(cp[0], "vx7relay.msg.trans") == str(MAKECALL_TRANS), "completion trans")
-
-    err = by_name(frames, "MsgError_t")
-    check(len(err) == 1, f"{len(err)} MsgError_t decoded")
-    if err:
-        e = err[0]
-        p = "vx7relay.StdResource.MsgError_t."
-        check(one(e, p + "ErrorMsg") == str(0x12), "refusal ErrorMsg")
-        check(one(e, p + "ErrorCode") == str(REFUSAL_CODE), "refusal ErrorCode")
-        check(one(e, p + "Data_ErrorMsg_0x12_t.Num") == str(PARM_NUM), "refusal Data Num")
-        check(one(e, p + "Data_ErrorMsg_0x12_t.Val") == "0", "refusal Data Val")
-        check(one(e, "vx7relay.msg.trans") == str(GETPARM_TRANS), "refusal trans")
-
+    expect(only(frames, "open frames", "vx7relay.type", str(OPEN)), "open",
+           {"vx7relay.open.max_reply_size": "512", "vx7relay.open.depth": "5",
+            "vx7relay.open.instance": "0"})
+    expect(only(frames, "assigned-address frames", "vx7relay.type", str(ASSIGNED)), "assigned",
+           {f"vx7relay.assigned.{k}": str(v) for k, v in me.items()})
+    # The subscription to a TSC is the standard one.
+    expect(only(frames, "MsgDetectEvt_t", "vx7relay.msg.name", "MsgDetectEvt_t"), "subscription",
+           {"vx7relay.StdResource.MsgDetectEvt_t.EvtGroup": str(CALL_STATE_GROUP),
+            "vx7relay.compdesc.instance": str(me["instance"])})
+    p = "vx7relay.TSC.MsgMakeCall_t."
+    expect(only(frames, "MsgMakeCall_t (split across two segments)", "vx7relay.msg.name",
+                "MsgMakeCall_t"), "MakeCall",
+           {p + "DestAddr": "5551234", p + "OrigAddr": "5551212", p + "CallProgress": "1",
+            "vx7relay.msg.trans": str(MAKECALL_TRANS), "vx7relay.msg.type": "0x00001214",
+            **{f"vx7relay.msg.tgt.{k}": str(v) for k, v in TSC_1_1_1.items()},
+            **{f"vx7relay.msg.src.{k}": str(v) for k, v in me.items()}})
+    expect(only(frames, "MsgMakeCallCmplt_t", "vx7relay.msg.name", "MsgMakeCallCmplt_t"),
+           "completion", {"vx7relay.TSC.MsgMakeCallCmplt_t.CallId": str(seen["callid"]),
+                          "vx7relay.msg.trans": str(MAKECALL_TRANS)})
+    p = "vx7relay.StdResource.MsgError_t."
+    expect(only(frames, "MsgError_t", "vx7relay.msg.name", "MsgError_t"), "refusal",
+           {p + "ErrorMsg": str(0x12), p + "ErrorCode": str(REFUSAL_CODE),
+            p + "Data_ErrorMsg_0x12_t.Num": str(PARM_NUM), p + "Data_ErrorMsg_0x12_t.Val": "0",
+            "vx7relay.msg.trans": str(GETPARM_TRANS)})
     evs = [f for f in frames if one(f, "vx7relay.msg.event") == "EvtCallState_t"]
     check(len(evs) >= 1, "no EvtCallState_t decoded")
-    if evs:
-        group, typ, stamp, callid, state, reason = seen["event"][:6]
-        v = evs[0]
-        p = "vx7relay.TSC.EvtCallState_t."
-        check(one(v, "vx7relay.msg.name") == "MsgEvtDetected_t", "event carrier name")
-        check(one(v, "vx7relay.msg.event_group") == "0x00001230", "event group")
-        check(one(v, p + "EvtGroup") == str(group), "event EvtGroup")
-        check(one(v, p + "CallId") == str(callid), "event CallId")
-        check(one(v, p + "CallState") == str(state), "event CallState")
-        check(one(v, p + "Reason") == str(reason), "event Reason")
-        check(one(v, p + "Timestamp") == str(stamp), "event Timestamp")
-        check(one(v, "vx7relay.msg.trans") == str(SUBSCRIPTION_ID), "event trans")
-    check(len([f for f in frames if one(f, "vx7relay.type") == str(CLOSE)]) == 1, "close")
-    check(len([f for f in frames if one(f, "vx7relay.type") == str(CLOSE_ACK)]) == 1,
-          "close acknowledged")
+    group, typ, stamp, callid, state, reason = seen["event"][:6]
+    p = "vx7relay.TSC.EvtCallState_t."
+    expect(evs[0] if evs else {}, "event",
+           {"vx7relay.msg.name": "MsgEvtDetected_t", "vx7relay.msg.event_group": "0x00001230",
+            p + "EvtGroup": str(group), p + "CallId": str(callid), p + "CallState": str(state),
+            p + "Reason": str(reason), p + "Timestamp": str(stamp),
+            "vx7relay.msg.trans": str(SUBSCRIPTION_ID)})
+    only(frames, "close frames", "vx7relay.type", str(CLOSE))
+    only(frames, "close acknowledgements", "vx7relay.type", str(CLOSE_ACK))
     bad = [f for f in frames if "vx7relay.malformed" in f]
     check(not bad, f"{len(bad)} frames of the good session marked malformed")
 
@@ -496,7 +465,8 @@ def main(argv):
             f.write(p.out)
         check(not decode(tshark, lua, moved), "port 7000 decoded without the preference")
         frames = decode(tshark, lua, moved, ["-o", "vx7relay.port:7000"])
-        check(len(by_name(frames, "MsgMakeCall_t")) == 1, "port preference not honoured")
+        only(frames, "MakeCall on port 7000 with the preference", "vx7relay.msg.name",
+             "MsgMakeCall_t")
 
     for f in failures:
         print("FAILED:", f)

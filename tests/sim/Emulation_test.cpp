@@ -105,23 +105,6 @@ TEST_F(EmulationTest, ClusterSearchFindsTheChannelClusterAndItsTsc) {
     EXPECT_EQ(tsc.desc, cd(farm::channelComponentAddress(1, 2, 5, farm::kTSC)));
 }
 
-TEST_F(EmulationTest, SearchesForWhatDoesNotExistAreRefused) {
-    Addressable cm(cd(farm::clusterMgrAddress(3)));
-    Cm::ClusterFind_t find;
-    find.CompStart = CompDesc_t(0xFFFF, 3, 1, 255, 0);
-    find.attr.realloc(2);
-    *find.attr[0] = tolk::CompAttr_t(0, 22);
-    *find.attr[1] = tolk::CompAttr_t(0x1600, 3);  // the analog board has two lines
-    EXPECT_EQ(refusal(cm, 0x800053, &find, 0x80002C), kErrNoSuchCluster);
-
-    // A channel's cluster holds no line control.
-    Addressable cm2(cd(farm::clusterMgrAddress(2)));
-    Cm::ClusterCompByAttr_t lcon;
-    lcon.ClustDesc = cd(farm::channelClusterAddress(2, 1, 1));
-    lcon.CompType = 22;
-    EXPECT_EQ(refusal(cm2, 0x80001E, &lcon, 0x800007), kErrNoSuchComponent);
-}
-
 TEST_F(EmulationTest, ResourceManagerFindsAnyChpOfTheBoard) {
     Addressable rm(cd(farm::resourceMgrAddress(1)));
     Rm::CompFind_t find;
@@ -418,7 +401,7 @@ TEST_F(EmulationTest, ControlCallRingsAChannelAndAnswerConnectsIt) {
 }
 
 // What each further request of the program gets from a board in its first state: the answer
-// of the given type (refusal 0), or MsgError_t with the given code.
+// of the given type (refusal 0), or MsgError_t with the given code. Bodies start all zeros.
 struct Exchange {
     const char* name;
     farm::Address target;
@@ -430,6 +413,22 @@ struct Exchange {
 
 void PrintTo(const Exchange& x, std::ostream* os) {
     *os << x.name;
+}
+
+template <typename B>
+Exchange ask(
+    const char* name, farm::Address target, std::uint32_t answerType, std::uint32_t refusal,
+    std::function<void(B&)> fill = [](B&) {}) {
+    return Exchange{name,
+                    target,
+                    B::MsgType,
+                    [fill] {
+                        auto b = std::make_unique<B>();
+                        fill(*b);
+                        return std::unique_ptr<tolk::MsgBody>(std::move(b));
+                    },
+                    answerType,
+                    refusal};
 }
 
 class EmulationExchange : public EmulationTest, public testing::WithParamInterface<Exchange> {};
@@ -445,78 +444,66 @@ TEST_P(EmulationExchange, IsAnsweredAsABoardWould) {
     }
 }
 
-template <typename B>
-std::function<std::unique_ptr<tolk::MsgBody>()> with(std::function<void(B&)> fill) {
-    return [fill] {
-        auto b = std::make_unique<B>();
-        fill(*b);
-        return std::unique_ptr<tolk::MsgBody>(std::move(b));
-    };
-}
-
 farm::Address tscOf(unsigned board, int trunk, int channel) {
     return farm::channelComponentAddress(board, trunk, channel, farm::kTSC);
+}
+
+void claim(Rm::CompUse_t& b, const farm::Address& what) {
+    b.List.realloc(1);
+    b.List[0]->desc = cd(what);
+    b.Count = 1;
 }
 
 INSTANTIATE_TEST_SUITE_P(
     DefaultFarm, EmulationExchange,
     testing::Values(
-        Exchange{"HoldWithoutCall", tscOf(1, 1, 20), 0x1211,
-                 with<Tsc::MsgHoldCall_t>([](auto& b) { b.CallId = 0; }), 0, kErrNoSuchCall},
-        Exchange{"RetrieveWithoutCall", tscOf(1, 1, 20), 0x121E,
-                 with<Tsc::MsgRetrieveCall_t>([](auto& b) { b.CallId = 0; }), 0, kErrNoSuchCall},
-        Exchange{"AcceptWithoutCall", tscOf(1, 1, 20), 0x1200,
-                 with<Tsc::MsgAcceptCall_t>([](auto& b) { b.CallId = 0; }), 0, kErrNoSuchCall},
-        Exchange{"RejectWithoutCall", tscOf(1, 1, 20), 0x121D,
-                 with<Tsc::MsgRejectCall_t>([](auto& b) { b.CallId = 0; }), 0, kErrNoSuchCall},
-        Exchange{"BlindTransferWithoutCall", tscOf(1, 1, 20), 0x1202,
-                 with<Tsc::MsgBlindTransferCall_t>([](auto& b) { b.CallId = 0; }), 0,
-                 kErrNoSuchCall},
-        Exchange{"InitTransferWithoutCall", tscOf(1, 1, 20), 0x1212,
-                 with<Tsc::MsgInitTransfer_t>([](auto& b) { b.CallId = 0; }), 0x1213,
-                 kErrNoSuchCall},
-        Exchange{"CompleteTransferWithoutCall", tscOf(1, 1, 20), 0x1207,
-                 with<Tsc::MsgCompleteTransfer_t>([](auto& b) { b.CallId = 0; }), 0,
-                 kErrNoSuchCall},
-        Exchange{"CancelTransferWithoutCall", tscOf(1, 1, 20), 0x1203,
-                 with<Tsc::MsgCancelTransfer_t>([](auto& b) { b.CallId = 0; }), 0, kErrNoSuchCall},
-        Exchange{"DialWithoutCall", tscOf(1, 1, 20), 0x1224,
-                 with<Tsc::MsgDial_t>([](auto& b) { setText(b.DigitString, "12"); }), 0x1225,
-                 kErrNoSuchCall},
-        Exchange{"IsdnOnACasLine", tscOf(1, 1, 20), 0x1222,
-                 with<Tsc::MsgSendISDN_t>([](auto& b) { b.CallId = 0; }), 0x1223, kErrNotSupported},
-        Exchange{"IsdnWithoutCallOnACcsLine", tscOf(2, 1, 20), 0x1222,
-                 with<Tsc::MsgSendISDN_t>([](auto& b) { b.CallId = 0; }), 0x1223, kErrNoSuchCall},
-        Exchange{"ChannelStateOfNoMeaning", tscOf(1, 1, 20), 0x121F,
-                 with<Tsc::MsgSetChanState_t>([](auto& b) { b.State = 99; }), 0x1220,
-                 kErrBadParameter},
-        Exchange{"ChannelBackInService", tscOf(1, 1, 20), 0x121F,
-                 with<Tsc::MsgSetChanState_t>([](auto& b) { b.State = 256; }), 0x1220, 0},
-        Exchange{"ResetLineDevice", tscOf(1, 1, 21), 0x1246,
-                 with<Tsc::MsgResetLineDevice_t>([](auto&) {}), 0x1247, 0},
-        Exchange{"AttachOnAFixedBoard", tscOf(1, 1, 20), 0x1234,
-                 with<Tsc::MsgAttach_t>([](auto&) {}), 0x1235, kErrNotSupported},
-        Exchange{"DetachWhatIsNotAttached", tscOf(2, 1, 20), 0x1236,
-                 with<Tsc::MsgDetach_t>([](auto&) {}), 0x1237, kErrBadState},
-        Exchange{"StopAnAlarmNotSent", farm::lconAddress(1, 1), 0x1613,
-                 with<Lcon::MsgStopAlarm_t>([](auto& b) { b.AlarmId = 0x160C; }), 0, kErrBadState},
-        Exchange{"ClaimAComponentThatIsThere", farm::resourceMgrAddress(1), 0x800059,
-                 with<Rm::CompUse_t>([](auto& b) {
-                     b.List.realloc(1);
-                     b.List[0]->desc = cd(tscOf(1, 1, 1));
-                     b.Count = 1;
-                 }),
-                 0x800000, 0},
-        Exchange{"ClaimAComponentThatIsNot", farm::resourceMgrAddress(1), 0x800059,
-                 with<Rm::CompUse_t>([](auto& b) {
-                     b.List.realloc(1);
-                     b.List[0]->desc = cd(tscOf(1, 1, 30));
-                     b.Count = 1;
-                 }),
-                 0x800000, kErrNoSuchComponent},
-        Exchange{"ClusterOfATsc", farm::clusterMgrAddress(1), 0x80001D,
-                 with<Cm::ClusterByComp_t>([](auto& b) { b.desc = cd(tscOf(1, 2, 3)); }), 0x80002C,
-                 0}),
+        ask<Tsc::MsgHoldCall_t>("HoldWithoutCall", tscOf(1, 1, 20), 0, kErrNoSuchCall),
+        ask<Tsc::MsgRetrieveCall_t>("RetrieveWithoutCall", tscOf(1, 1, 20), 0, kErrNoSuchCall),
+        ask<Tsc::MsgAcceptCall_t>("AcceptWithoutCall", tscOf(1, 1, 20), 0, kErrNoSuchCall),
+        ask<Tsc::MsgRejectCall_t>("RejectWithoutCall", tscOf(1, 1, 20), 0, kErrNoSuchCall),
+        ask<Tsc::MsgBlindTransferCall_t>("BlindTransferWithoutCall", tscOf(1, 1, 20), 0,
+                                         kErrNoSuchCall),
+        ask<Tsc::MsgInitTransfer_t>("InitTransferWithoutCall", tscOf(1, 1, 20), 0x1213,
+                                    kErrNoSuchCall),
+        ask<Tsc::MsgCompleteTransfer_t>("CompleteTransferWithoutCall", tscOf(1, 1, 20), 0,
+                                        kErrNoSuchCall),
+        ask<Tsc::MsgCancelTransfer_t>("CancelTransferWithoutCall", tscOf(1, 1, 20), 0,
+                                      kErrNoSuchCall),
+        ask<Tsc::MsgDial_t>("DialWithoutCall", tscOf(1, 1, 20), 0x1225, kErrNoSuchCall,
+                            [](auto& b) { setText(b.DigitString, "12"); }),
+        ask<Tsc::MsgSendISDN_t>("IsdnOnACasLine", tscOf(1, 1, 20), 0x1223, kErrNotSupported),
+        ask<Tsc::MsgSendISDN_t>("IsdnWithoutCallOnACcsLine", tscOf(2, 1, 20), 0x1223,
+                                kErrNoSuchCall),
+        ask<Tsc::MsgSetChanState_t>("ChannelStateOfNoMeaning", tscOf(1, 1, 20), 0x1220,
+                                    kErrBadParameter, [](auto& b) { b.State = 99; }),
+        ask<Tsc::MsgSetChanState_t>("ChannelBackInService", tscOf(1, 1, 20), 0x1220, 0,
+                                    [](auto& b) { b.State = 256; }),
+        ask<Tsc::MsgResetLineDevice_t>("ResetLineDevice", tscOf(1, 1, 21), 0x1247, 0),
+        ask<Tsc::MsgAttach_t>("AttachOnAFixedBoard", tscOf(1, 1, 20), 0x1235, kErrNotSupported),
+        ask<Tsc::MsgDetach_t>("DetachWhatIsNotAttached", tscOf(2, 1, 20), 0x1237, kErrBadState),
+        ask<Lcon::MsgStopAlarm_t>("StopAnAlarmNotSent", farm::lconAddress(1, 1), 0, kErrBadState,
+                                  [](auto& b) { b.AlarmId = 0x160C; }),
+        ask<Rm::CompUse_t>("ClaimAComponentThatIsThere", farm::resourceMgrAddress(1), 0x800000, 0,
+                           [](auto& b) { claim(b, tscOf(1, 1, 1)); }),
+        ask<Rm::CompUse_t>("ClaimAComponentThatIsNot", farm::resourceMgrAddress(1), 0x800000,
+                           kErrNoSuchComponent, [](auto& b) { claim(b, tscOf(1, 1, 30)); }),
+        ask<Cm::ClusterByComp_t>("ClusterOfATsc", farm::clusterMgrAddress(1), 0x80002C, 0,
+                                 [](auto& b) { b.desc = cd(tscOf(1, 2, 3)); }),
+        // The analog board has two lines, and a channel's cluster holds no line control.
+        ask<Cm::ClusterFind_t>("NoClusterOfALineTheBoardLacks", farm::clusterMgrAddress(3),
+                               0x80002C, kErrNoSuchCluster,
+                               [](auto& b) {
+                                   b.CompStart = CompDesc_t(0xFFFF, 3, 1, 255, 0);
+                                   b.attr.realloc(2);
+                                   *b.attr[0] = tolk::CompAttr_t(0, 22);
+                                   *b.attr[1] = tolk::CompAttr_t(0x1600, 3);
+                               }),
+        ask<Cm::ClusterCompByAttr_t>("NoLineControlInAChannelsCluster", farm::clusterMgrAddress(2),
+                                     0x800007, kErrNoSuchComponent,
+                                     [](auto& b) {
+                                         b.ClustDesc = cd(farm::channelClusterAddress(2, 1, 1));
+                                         b.CompType = 22;
+                                     })),
     [](const testing::TestParamInfo<Exchange>& i) { return std::string(i.param.name); });
 
 }  // namespace
