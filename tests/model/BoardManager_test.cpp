@@ -15,60 +15,55 @@ namespace {
 
 using vx7diag::BoardManager;
 
+std::vector<unsigned int> MediaTypes(BoardManager& manager, unsigned int trunk,
+                                     unsigned int channel) {
+    vx7diag::MediaList media = manager.GetMediaResources(trunk, channel);
+    std::vector<unsigned int> types;
+    for (unsigned int i = 0; i < media.length(); ++i) {
+        types.push_back(media.element(i)->ComponentType);
+    }
+    return types;
+}
+
 class DefaultFarm : public SimFixture {
   protected:
     static void SetUpTestSuite() { UseFarm(""); }
 };
 
-TEST_F(DefaultFarm, DigitalBoardWithFixedRouting) {
-    BoardManager manager(1);
-    ASSERT_NE(manager.GetBoard(), nullptr);
-    EXPECT_EQ(manager.GetBoardName(), "VX7/T1-2");
-    EXPECT_EQ(manager.GetSerialNumber(), "VX7-0001");
-    EXPECT_EQ(manager.GetBoardType(), BoardManager::DIGITAL_BOARD);
-    EXPECT_EQ(manager.GetNumberOfTrunks(), 2);
-    for (unsigned int trunk : {1u, 2u}) {
-        EXPECT_EQ(manager.GetNumChannelsOnTrunk(trunk), 24);
-        EXPECT_EQ(manager.GetTrunkType(trunk), 1);
-        EXPECT_EQ(manager.GetSignalingType(trunk), 4);
-    }
-    EXPECT_FALSE(manager.IsFlexibleRoutingEnabled());
-    EXPECT_FALSE(manager.IsFlexibleRoutingEnabled(1, 1));
-    EXPECT_EQ(manager.GetVoiceChannelCount(), 0);
-    for (unsigned int trunk : {1u, 2u, 64u}) {
-        for (unsigned int channel : {1u, 24u, 31u}) {
-            EXPECT_EQ(manager.GetTelephonyVoiceChannel(trunk, channel), nullptr);
-            EXPECT_EQ(manager.GetMediaResources(trunk, channel).length(), 0u);
-        }
-    }
-}
-
-TEST_F(DefaultFarm, UnknownTrunkHasNoChannelsAndNoTypes) {
-    BoardManager manager(1);
-    for (unsigned int trunk : {0u, 3u, 64u, 65u}) {
-        EXPECT_EQ(manager.GetNumChannelsOnTrunk(trunk), 0);
-        EXPECT_EQ(manager.GetTrunkType(trunk), -1);
-        EXPECT_EQ(manager.GetSignalingType(trunk), -1);
-    }
-}
-
-TEST_F(DefaultFarm, AnalogBoardIsWalkedLineByLine) {
-    BoardManager manager(3);
-    EXPECT_EQ(manager.GetBoardType(), BoardManager::ANALOG_BOARD);
-    EXPECT_EQ(manager.GetNumberOfTrunks(), 2);
-    for (unsigned int trunk : {1u, 2u}) {
-        EXPECT_EQ(manager.GetNumChannelsOnTrunk(trunk), 4);
-        EXPECT_EQ(manager.GetTrunkType(trunk), 4);
-        EXPECT_EQ(manager.GetSignalingType(trunk), 4);
-    }
-    EXPECT_EQ(manager.GetNumChannelsOnTrunk(3), 0);
-}
-
-TEST_F(DefaultFarm, AnalogWalkEndsOnTheRefusalWithoutLoggingIt) {
+TEST_F(DefaultFarm, BoardsAreWalkedTrunkByTrunk) {
     testsupport::LogCapture out;
-    BoardManager manager(3);
-    EXPECT_EQ(manager.GetNumberOfTrunks(), 2);
+    BoardManager digital(1);
+    ASSERT_NE(digital.GetBoard(), nullptr);
+    EXPECT_EQ(digital.GetBoardName(), "VX7/T1-2");
+    EXPECT_EQ(digital.GetSerialNumber(), "VX7-0001");
+    EXPECT_EQ(digital.GetBoardType(), BoardManager::DIGITAL_BOARD);
+    BoardManager analog(3);
+    EXPECT_EQ(analog.GetBoardType(), BoardManager::ANALOG_BOARD);
+    // The analog walk ends on the board's refusal, which is no failure to log.
     EXPECT_EQ(out.Text().find("UnexpectedMsg"), std::string::npos) << out.Text();
+
+    struct Case {
+        BoardManager* manager;
+        unsigned int trunk;
+        int channels, trunkType, signaling;
+    };
+    for (Case c :
+         {Case{&digital, 1, 24, 1, 4}, Case{&digital, 2, 24, 1, 4}, Case{&digital, 0, 0, -1, -1},
+          Case{&digital, 3, 0, -1, -1}, Case{&digital, 65, 0, -1, -1}, Case{&analog, 1, 4, 4, 4},
+          Case{&analog, 2, 4, 4, 4}, Case{&analog, 3, 0, -1, -1}}) {
+        SCOPED_TRACE(std::to_string(c.manager->GetBoardType()) + " trunk " +
+                     std::to_string(c.trunk));
+        EXPECT_EQ(c.manager->GetNumberOfTrunks(), 2);
+        EXPECT_EQ(c.manager->GetNumChannelsOnTrunk(c.trunk), c.channels);
+        EXPECT_EQ(c.manager->GetTrunkType(c.trunk), c.trunkType);
+        EXPECT_EQ(c.manager->GetSignalingType(c.trunk), c.signaling);
+    }
+    // Fixed routing: no voice resources to look up on any line.
+    EXPECT_FALSE(digital.IsFlexibleRoutingEnabled());
+    EXPECT_FALSE(digital.IsFlexibleRoutingEnabled(1, 1));
+    EXPECT_EQ(digital.GetVoiceChannelCount(), 0);
+    EXPECT_EQ(digital.GetTelephonyVoiceChannel(1, 1), nullptr);
+    EXPECT_TRUE(MediaTypes(digital, 1, 24).empty());
 }
 
 // The walk's end is told from a failure by the answer: only a refusal means "no such line".
@@ -104,35 +99,24 @@ TEST_F(DefaultFarm, FlexibleRoutingMapsVoiceChannelsInOrder) {
         EXPECT_EQ(got.board, expected.board);
         EXPECT_EQ(got.component, expected.component);
     }
+    for (auto [trunk, channel] : std::vector<std::pair<unsigned int, unsigned int>>{
+             {1, 0}, {1, 24}, {1, 32}, {2, 1}, {0, 1}, {0xFFFFFFFF, 0xFFFFFFFF}}) {
+        EXPECT_EQ(manager.GetTelephonyVoiceChannel(trunk, channel), nullptr)
+            << trunk << "." << channel;
+        EXPECT_TRUE(MediaTypes(manager, trunk, channel).empty());
+    }
 }
 
 TEST_F(DefaultFarm, PartialVoiceAUGivesMediaInTableOrder) {
     BoardManager manager(2);
-    vx7diag::MediaList media = manager.GetMediaResources(1, 5);
     // SIGDET, SIGBUF_DTMF, SIGBUF_MF, TONEGEN, CALLANALYSIS, CALLERID: no R2 MF on this board.
-    std::vector<unsigned int> types;
-    for (unsigned int i = 0; i < media.length(); ++i) {
-        types.push_back(media.element(i)->ComponentType);
-    }
-    EXPECT_EQ(types, (std::vector<unsigned int>{7, 8, 8, 5, 10, 41}));
-    ASSERT_EQ(media.length(), 6u);
+    EXPECT_EQ(MediaTypes(manager, 1, 5), (std::vector<unsigned int>{7, 8, 8, 5, 10, 41}));
     EXPECT_EQ(manager.GetTelephonyVoiceChannel(1, 5)->GetMediaCount(), 6);
+    vx7diag::MediaList media = manager.GetMediaResources(1, 5);
+    ASSERT_EQ(media.length(), 6u);
     farm::Address sigdet = farm::mediaAddress(2, 5, farm::Media::SigDet);
     EXPECT_EQ(media.element(0)->InstDesc.instance, sigdet.instance);
     EXPECT_EQ(media.element(0)->InstDesc.component, sigdet.component);
-}
-
-TEST_F(DefaultFarm, VoiceLookupsOutsideTheChannelsFindNothing) {
-    BoardManager manager(2);
-    struct Case {
-        unsigned int trunk, channel;
-    };
-    for (Case c : {Case{1, 0}, Case{1, 24}, Case{1, 31}, Case{1, 32}, Case{2, 1}, Case{65, 1},
-                   Case{0, 1}, Case{0xFFFFFFFF, 0xFFFFFFFF}}) {
-        EXPECT_EQ(manager.GetTelephonyVoiceChannel(c.trunk, c.channel), nullptr)
-            << c.trunk << "." << c.channel;
-        EXPECT_EQ(manager.GetMediaResources(c.trunk, c.channel).length(), 0u);
-    }
 }
 
 TEST_F(DefaultFarm, BoardTheMapDoesNotListGivesAnEmptyManager) {
@@ -143,7 +127,7 @@ TEST_F(DefaultFarm, BoardTheMapDoesNotListGivesAnEmptyManager) {
     EXPECT_EQ(manager.GetNumberOfTrunks(), 0);
     EXPECT_EQ(manager.GetBoardType(), 0);
     EXPECT_FALSE(manager.IsFlexibleRoutingEnabled());
-    EXPECT_EQ(manager.GetMediaResources(1, 1).length(), 0u);
+    EXPECT_TRUE(MediaTypes(manager, 1, 1).empty());
 }
 
 TEST_F(DefaultFarm, RefusedParameterQueriesMeanAnUnknownBoardWithFixedRouting) {
@@ -155,34 +139,15 @@ TEST_F(DefaultFarm, RefusedParameterQueriesMeanAnUnknownBoardWithFixedRouting) {
     EXPECT_EQ(manager.GetTelephonyVoiceChannel(1, 1), nullptr);
 }
 
-class GapsFarm : public SimFixture {
-  protected:
-    static void SetUpTestSuite() { UseFarm("gaps.toml"); }
-    static void TearDownTestSuite() { UseFarm(""); }
-};
-
-TEST_F(GapsFarm, BoardsKeepTheirLogicalNumbers) {
-    BoardManager edge(32);
-    EXPECT_EQ(edge.GetSerialNumber(), "GAP-0032");
-    EXPECT_EQ(edge.GetNumChannelsOnTrunk(1), 30);
-    BoardManager zero(0);
-    EXPECT_EQ(zero.GetSerialNumber(), "GAP-0000");
-    EXPECT_EQ(zero.GetSignalingType(1), 6);
-    BoardManager missing(1);
-    EXPECT_EQ(missing.GetBoard(), nullptr);
-}
-
-}  // namespace
-
-namespace {
-
 class FlexibleFarm : public SimFixture {
   protected:
     static void SetUpTestSuite() { UseFarm("flexible.toml"); }
     static void TearDownTestSuite() { UseFarm(""); }
 };
 
-TEST_F(FlexibleFarm, SecondTrunkContinuesTheVoiceChannels) {
+// The second trunk continues the voice channels; the media list follows the attribute order,
+// not the farm's; the fixed board beside it has no voice resources.
+TEST_F(FlexibleFarm, VoiceChannelsAcrossTrunks) {
     BoardManager manager(7);
     ASSERT_TRUE(manager.IsFlexibleRoutingEnabled());
     EXPECT_EQ(manager.GetVoiceChannelCount(), 5);
@@ -192,24 +157,13 @@ TEST_F(FlexibleFarm, SecondTrunkContinuesTheVoiceChannels) {
     EXPECT_EQ(manager.GetVoiceChannelNumber(2, 3), 0u);
     EXPECT_NE(manager.GetTelephonyVoiceChannel(2, 2), nullptr);
     EXPECT_NE(manager.GetTelephonyVoiceChannel(2, 1), manager.GetTelephonyVoiceChannel(1, 1));
-}
-
-TEST_F(FlexibleFarm, MediaListFollowsTheAttributeOrderNotTheFarms) {
-    BoardManager manager(7);
-    vx7diag::MediaList media = manager.GetMediaResources(2, 2);
-    std::vector<unsigned int> types;
-    for (unsigned int i = 0; i < media.length(); ++i) {
-        types.push_back(media.element(i)->ComponentType);
-    }
     // SIGDETADDR, TONEGENADDR, CALLERIDADDR.
-    EXPECT_EQ(types, (std::vector<unsigned int>{7, 5, 41}));
-}
+    EXPECT_EQ(MediaTypes(manager, 2, 2), (std::vector<unsigned int>{7, 5, 41}));
 
-TEST_F(FlexibleFarm, FixedBoardBesideItHasNoVoiceResources) {
-    BoardManager manager(8);
-    EXPECT_FALSE(manager.IsFlexibleRoutingEnabled());
-    EXPECT_EQ(manager.GetVoiceChannelCount(), 0);
-    EXPECT_EQ(manager.GetTelephonyVoiceChannel(1, 1), nullptr);
+    BoardManager fixed(8);
+    EXPECT_FALSE(fixed.IsFlexibleRoutingEnabled());
+    EXPECT_EQ(fixed.GetVoiceChannelCount(), 0);
+    EXPECT_EQ(fixed.GetTelephonyVoiceChannel(1, 1), nullptr);
 }
 
 }  // namespace

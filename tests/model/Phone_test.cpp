@@ -52,9 +52,7 @@ TEST_F(PhoneTest, RangeChecksComeFirstTrunkBeforeChannel) {
     // The limits themselves pass the check; the board then has no such channel.
     EXPECT_EQ(OutOfRangeText(fixedBoard, 64, 31), "");
     EXPECT_THROW(Phone(fixedBoard, 64, 31), vx7diag::BoardFailure);
-}
-
-TEST_F(PhoneTest, ManagerWithoutBoardCannotMakeAPhone) {
+    EXPECT_THROW(Phone(flexibleBoard, 1, 24), vx7diag::BoardFailure);
     BoardManager absent(9);
     EXPECT_THROW(Phone(&absent, 1, 1), std::runtime_error);
 }
@@ -71,29 +69,26 @@ TEST_F(PhoneTest, DefaultsAndSettings) {
     EXPECT_EQ(phone.GetCurCallId(), 0u);
 }
 
-TEST_F(PhoneTest, FixedRoutingStartAndStopSendNothing) {
-    Phone phone(fixedBoard, 1, 3);
-    // A refused TSC attach would print its failure line if anything were sent.
-    Refuse(0x1234);
-    Refuse(0x1236);
+// With fixed routing there is nothing to join: a refused TSC attach would print its failure
+// line if anything were sent. With flexible routing the voice resources are joined and parted.
+TEST_F(PhoneTest, StartAndStopJoinOnlyFlexibleRouting) {
+    Phone fixed(fixedBoard, 1, 3);
+    Phone flexible(flexibleBoard, 1, 2);
+    {
+        Refuse(0x1234);
+        Refuse(0x1236);
+        testsupport::LogCapture out;
+        EXPECT_EQ(fixed.Start(), 0);
+        EXPECT_EQ(fixed.Stop(), 0);
+        EXPECT_EQ(out.Text(), "");
+    }
+    Control("normal 1234");
+    Control("normal 1236");
     testsupport::LogCapture out;
-    EXPECT_EQ(phone.Start(), 0);
-    EXPECT_EQ(phone.Stop(), 0);
+    EXPECT_EQ(flexible.Start(), 0);
+    EXPECT_NE(flexible.GetRocCluster(), nullptr);
+    EXPECT_EQ(flexible.Stop(), 0);
     EXPECT_EQ(out.Text(), "");
-}
-
-TEST_F(PhoneTest, CallBetweenTwoChannels) {
-    Phone caller(fixedBoard, 1, 4);
-    Phone callee(fixedBoard, 1, 5);
-    unsigned int callId = caller.MakeCall("5551215", "5551216");
-    ASSERT_NE(callId, 0u);
-    EXPECT_NE(caller.GetCallState(callId), 0u);
-    tolk::TSC::MsgGetCallStateCmplt_t state;
-    EXPECT_NE(caller.GetCallState(callId, &state), 0u);
-    EXPECT_EQ(*state.pCallId, callId);
-    EXPECT_NE(caller.GetChanState(), 0u);
-    EXPECT_EQ(caller.DropCall(callId), 0);
-    EXPECT_EQ(caller.ReleaseCall(callId), 0);
 }
 
 TEST_F(PhoneTest, RefusedMakeCallPrintsItsBanner) {
@@ -177,6 +172,10 @@ TEST_F(PhoneTest, AcceptedOperationsGiveTheirSuccessValues) {
     // Channel 3 of trunk 2 answers 5551302.
     unsigned int callId = caller.MakeCall("5551301", "5551302");
     ASSERT_NE(callId, 0u);
+    tolk::TSC::MsgGetCallStateCmplt_t state;
+    EXPECT_NE(caller.GetCallState(callId, &state), 0u);
+    EXPECT_EQ(*state.pCallId, callId);
+    EXPECT_NE(caller.GetChanState(), 0u);
     tolk::TSC::MsgGetCallStateCmplt_t offered;
     callee.GetCallState(0, &offered);
     unsigned int incoming = *offered.pCallId;
@@ -184,15 +183,6 @@ TEST_F(PhoneTest, AcceptedOperationsGiveTheirSuccessValues) {
     EXPECT_EQ(callee.AnswerCall(incoming), 1);
     EXPECT_EQ(caller.DropCall(callId), 0);
     EXPECT_EQ(caller.ReleaseCall(callId), 0);
-}
-
-TEST_F(PhoneTest, FlexibleRoutingJoinsAndPartsTheVoiceResources) {
-    Phone phone(flexibleBoard, 1, 2);
-    testsupport::LogCapture out;
-    EXPECT_EQ(phone.Start(), 0);
-    EXPECT_NE(phone.GetRocCluster(), nullptr);
-    EXPECT_EQ(phone.Stop(), 0);
-    EXPECT_EQ(out.Text(), "");
 }
 
 TEST_F(PhoneTest, RefusedTscAttachDoesNotStopTheClusterSteps) {
@@ -224,10 +214,6 @@ TEST_F(PhoneTest, RefusedTscDetachEndsTheParting) {
     std::string text = out.Text();
     EXPECT_NE(text.find("CmdMsgType 0x1236"), std::string::npos) << text;
     EXPECT_EQ(text.find("0x800023"), std::string::npos) << text;
-}
-
-TEST_F(PhoneTest, ChannelTheBoardLacksIsNoPhone) {
-    EXPECT_THROW(Phone(flexibleBoard, 1, 24), vx7diag::BoardFailure);
 }
 
 TEST_F(PhoneTest, SilentJoiningStopsAndReports) {

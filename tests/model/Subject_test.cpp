@@ -5,6 +5,7 @@
 #include <string>
 #include <vector>
 
+#include "model/Aspect.h"
 #include "model/Observer.h"
 
 namespace {
@@ -14,7 +15,34 @@ using vx7diag::Observer;
 using vx7diag::Subject;
 
 class CallState : public Aspect {};
-class ChanState : public Aspect {};
+class ChanState : public Aspect {
+  public:
+    explicit ChanState(int v = 0) : volume(v) {}
+    int volume;
+};
+
+// Subjects key their observer sets on the aspect's class: the fields never take part, and
+// two classes are never equal, each counting as less than the other.
+TEST(Aspect, ComparesByClassOnly) {
+    ChanState a(1);
+    ChanState b(99);
+    CallState other;
+    Aspect& base = other;
+    EXPECT_TRUE(a == b);
+    EXPECT_FALSE(a < b);
+    EXPECT_FALSE(a == base);
+    EXPECT_TRUE(a < base);
+    EXPECT_TRUE(base < a);
+    EXPECT_EQ(other.ToZLG(), nullptr);
+}
+
+TEST(Observer, LessMeansAnotherObject) {
+    Observer a;
+    Observer b;
+    EXPECT_TRUE(a < b);
+    EXPECT_TRUE(b < a);
+    EXPECT_FALSE(a < a);
+}
 
 // Records, into a log shared by all observers of a test, who was told of what.
 class Recorder : public Observer {
@@ -37,40 +65,31 @@ class SubjectTest : public ::testing::Test {
     Subject subject;
 };
 
+// Copies of one RefPtr are one observer: it is added and told once.
 TEST_F(SubjectTest, SameObserverTwiceIsAddedOnce) {
+    isa::RefPtr<Observer> copy = first;
     EXPECT_TRUE(subject.Attach(first, &callState));
     EXPECT_FALSE(subject.Attach(first, &callState));
+    EXPECT_FALSE(subject.Attach(copy, &callState));
     subject.Notify(callState);
     EXPECT_EQ(log, (std::vector<std::string>{"first:call"}));
 }
 
-TEST_F(SubjectTest, CopiesOfOneRefPtrAreOneObserver) {
-    isa::RefPtr<Observer> copy = first;
-    EXPECT_TRUE(subject.Attach(first, &callState));
-    EXPECT_FALSE(subject.Attach(copy, &callState));
-    EXPECT_EQ(subject.Detach(copy, callState), 0);
-}
-
-TEST_F(SubjectTest, DetachOfUnknownAspectGivesMinusOne) {
+// Detach answers how many observers the aspect keeps, -1 when it has none to detach from.
+TEST_F(SubjectTest, DetachCountsWhatIsLeftOfTheAspect) {
     EXPECT_EQ(subject.Detach(first, callState), -1);
     subject.Attach(first, &chanState);
     EXPECT_EQ(subject.Detach(first, callState), -1);
-}
-
-TEST_F(SubjectTest, LastDetachRemovesTheAspect) {
-    subject.Attach(first, &callState);
-    EXPECT_EQ(subject.Detach(first, callState), 0);
-    EXPECT_EQ(subject.Detach(first, callState), -1);
-    subject.Notify(callState);
-    EXPECT_TRUE(log.empty());
-}
-
-TEST_F(SubjectTest, DetachOfOneOfTwoLeavesTheOther) {
     subject.Attach(first, &callState);
     subject.Attach(second, &callState);
     EXPECT_EQ(subject.Detach(first, callState), 1);
+    EXPECT_EQ(subject.Detach(second, callState), 0);
+    EXPECT_EQ(subject.Detach(second, callState), -1);
     subject.Notify(callState);
-    EXPECT_EQ(log, (std::vector<std::string>{"second:call"}));
+    EXPECT_TRUE(log.empty());
+    // Detached from one aspect, the observer is still told of the other.
+    subject.Notify(chanState);
+    EXPECT_EQ(log, (std::vector<std::string>{"first:chan"}));
 }
 
 TEST_F(SubjectTest, NotifyReachesOnlyObserversOfThatAspect) {
@@ -81,14 +100,6 @@ TEST_F(SubjectTest, NotifyReachesOnlyObserversOfThatAspect) {
     EXPECT_EQ(log, (std::vector<std::string>{"second:chan", "first:call"}));
 }
 
-TEST_F(SubjectTest, DetachForAnotherAspectKeepsTheObserver) {
-    subject.Attach(first, &callState);
-    subject.Attach(first, &chanState);
-    EXPECT_EQ(subject.Detach(first, chanState), 0);
-    subject.Notify(callState);
-    EXPECT_EQ(log, (std::vector<std::string>{"first:call"}));
-}
-
 TEST_F(SubjectTest, ObserverLivesWhileInASet) {
     std::vector<std::string> own;
     {
@@ -97,14 +108,6 @@ TEST_F(SubjectTest, ObserverLivesWhileInASet) {
     }
     subject.Notify(callState);
     EXPECT_EQ(own, (std::vector<std::string>{"only:call"}));
-}
-
-TEST(Observer, LessMeansAnotherObject) {
-    Observer a;
-    Observer b;
-    EXPECT_TRUE(a < b);
-    EXPECT_TRUE(b < a);
-    EXPECT_FALSE(a < a);
 }
 
 }  // namespace

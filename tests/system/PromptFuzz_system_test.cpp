@@ -7,7 +7,7 @@
 // literal-next key (C-v, which would join a line to the next) are not typed: they act on
 // the terminal, not on lineprobe. A line
 // whose first word is "quit" is not typed either.
-// LINEPROBE_FUZZ_LINES sets the number of lines (default 2000, 800 under a sanitizer),
+// LINEPROBE_FUZZ_LINES sets the number of lines (default 1000, 800 under a sanitizer),
 // LINEPROBE_FUZZ_SEED the sequence; scripts/promptfuzz runs the long form.
 #include <gtest/gtest.h>
 
@@ -134,7 +134,7 @@ class LineMaker {
 constexpr std::array<int, 15> FIXED_ROWS{0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 11, 12, 23, 24, 35};
 
 TEST(PromptFuzz, RandomLinesNeitherCrashNorBreakTheLayout) {
-    const long lines = EnvNumber("LINEPROBE_FUZZ_LINES", UNDER_SANITIZER ? 800 : 2000);
+    const long lines = EnvNumber("LINEPROBE_FUZZ_LINES", UNDER_SANITIZER ? 800 : 1000);
     const auto seed = static_cast<unsigned>(EnvNumber("LINEPROBE_FUZZ_SEED", 20261123));
     TerminalOptions options;
     options.unsetEnv = {"REMOTE_TKHOST", "VX7_FARM", "CORVO_ORVANE_DIR"};
@@ -196,29 +196,6 @@ TEST(PromptFuzz, RandomLinesNeitherCrashNorBreakTheLayout) {
     const double took = std::chrono::duration<double>(Clock::now() - start).count();
     EXPECT_TRUE(session.StillRunning());
     std::printf("prompt fuzz: %ld lines (seed %u) in %.1f s\n", lines, seed, took);
-}
-
-}  // namespace
-}  // namespace lineprobe::testing
-
-namespace lineprobe::testing {
-namespace {
-
-// Found by the prompt fuzz: a board number that is not one of the farm's must not open a
-// view on whichever board its low eight bits name.
-TEST(PromptBoardNumbers, ATrunkViewOfANumberPastTheBoardsIsRefused) {
-    TerminalOptions options;
-    options.unsetEnv = {"REMOTE_TKHOST", "VX7_FARM", "CORVO_ORVANE_DIR"};
-    TerminalSession session(options);
-    ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
-    CommandRunner commands(session);
-    // 257 and -255 are board 1 of the built-in farm when cut to eight bits.
-    for (const char* line : {"trunk 257 1", "trunk -255 1"}) {
-        ASSERT_TRUE(commands.Run(line, std::chrono::seconds(30)).returned) << session.Dump();
-        EXPECT_EQ(commands.Result(), "ERROR - unable to create trunk view") << line << "\n"
-                                                                            << session.Dump();
-    }
-    EXPECT_TRUE(session.StillRunning());
 }
 
 }  // namespace

@@ -4,7 +4,7 @@
 // every visible row must show the last state vx7sim sent for it, the prompt must answer,
 // memory must have stayed flat after the first seconds, and the error log must be clean.
 //
-// LINEPROBE_SOAK_SECONDS lengthens the drive (default 50, 20 under a sanitizer),
+// LINEPROBE_SOAK_SECONDS lengthens the drive (default 25, 20 under a sanitizer),
 // LINEPROBE_SOAK_SEED changes the sequence; scripts/soak runs the long form.
 #include <gtest/gtest.h>
 
@@ -110,7 +110,7 @@ std::string TrunkMismatch(const std::string& row, const TrunkExpect& want) {
 
 TEST(Soak, TenPhoneAndTenTrunkViewsUnderAnEventStorm) {
     const auto driveFor =
-        std::chrono::seconds(EnvNumber("LINEPROBE_SOAK_SECONDS", UNDER_SANITIZER ? 20 : 50));
+        std::chrono::seconds(EnvNumber("LINEPROBE_SOAK_SECONDS", UNDER_SANITIZER ? 20 : 25));
     std::mt19937 random(static_cast<unsigned>(EnvNumber("LINEPROBE_SOAK_SEED", 8)));
 
     SimServer sim(FARM);
