@@ -1,9 +1,13 @@
-// The two display observers: the phone row and the trunk row, drawn from the board's events.
+// The two display observers: the phone row and the trunk row, drawn from the board's events,
+// and the texts they draw.
 #include <gtest/gtest.h>
+
+#include <string>
 
 #include "RecordingView.h"
 #include "console/ConsolePhoneObserver.h"
 #include "console/ConsoleTrunkObserver.h"
+#include "console/ObserverTexts.h"
 #include "model/AllAlarms.h"
 #include "model/TSCCallInfo.h"
 #include "model/TSCCallState.h"
@@ -15,69 +19,70 @@ namespace vx7diag {
 namespace {
 
 using lineprobe::testing::RecordingView;
-// What both observers do alike: an aspect they do not draw only refreshes, and without a
-// window they neither draw nor remember anything.
-struct PhoneSide {
-    using ObserverType = ConsolePhoneObserver;
-    static ObserverType Make() { return ConsolePhoneObserver(1, 1, 2, 3, 1); }
-    // An event of the trunk's kind, with the sum the observer would remember from it.
-    static void Remembered(ObserverType& o, VX7EventPublisher* p) {
-        TSCCallState aspect;
-        auto* event = new tolk::TSC::EvtCallState_t();
-        *event->pCallId = 9;
-        aspect.SetEvent(p, event);
-        o.Update(nullptr, aspect);
-        EXPECT_EQ(o.GetCurCallId(), 0u);
-        EXPECT_EQ(o.DisplayCurrentPhoneState(1, 2, 3, 4), 0);
-    }
-    static void Foreign(ObserverType& o, VX7EventPublisher* p) {
-        TSCCallInfo aspect;
-        aspect.SetEvent(p, new tolk::TSC::EvtCallInfo_t());
-        o.Update(nullptr, aspect);
-    }
+
+struct TextCase {
+    const char* (*text)(unsigned int);
+    unsigned int value;
+    std::string golden;
 };
 
-struct TrunkSide {
-    using ObserverType = ConsoleTrunkObserver;
-    static ObserverType Make() { return ConsoleTrunkObserver(1, 2, 2, 1); }
-    static void Remembered(ObserverType& o, VX7EventPublisher* p) {
-        AllAlarms aspect;
-        auto* event = new tolk::LCON::Evt_0x1600_t();
-        *event->pType = 5654;
-        aspect.SetEvent(p, event);
-        o.Update(nullptr, aspect);
-        EXPECT_EQ(o.GetBipolarViolations(), 0u);
-        EXPECT_EQ(o.DisplayCurrentTrunkStatus(nullptr), 0);
+// Each text is padded to wipe a longer one; the last value of each table and the first one
+// past it, whose number shows in the same width instead of a read past the table.
+TEST(ObserverTexts, PaddedToTheirFieldUpToTheEndOfTheirTableAndPastIt) {
+    const TextCase cases[] = {
+        {ConsoleCallStateText, 0, "Null                 "},
+        {ConsoleCallStateText, 21, "DialTone             "},
+        {ConsoleCallStateText, 22, "?22                  "},
+        {ConsoleChanStateText, 0, "                          "},
+        {ConsoleChanStateText, 1, "Active\t\t           "},
+        {ConsoleChanStateText, 14, "OutOfServiceRemote        "},
+        {ConsoleChanStateText, 15, "?15                       "},
+        {ConsoleReasonText, 0, "                          "},
+        {ConsoleReasonText, 51, "NoRingback                "},
+        {ConsoleReasonText, 52, "?52                       "},
+        {ConsoleReasonText, 4294967295u, "?4294967295               "},
+        {ConsoleLineStateReasonText, 5, "Alarm         "},
+        {ConsoleLineStateReasonText, 6, "?6            "},
+    };
+    for (const TextCase& c : cases) {
+        EXPECT_EQ(std::string(c.text(c.value)), c.golden) << c.value;
     }
-    static void Foreign(ObserverType& o, VX7EventPublisher* p) {
-        TSCCallState aspect;
-        aspect.SetEvent(p, new tolk::TSC::EvtCallState_t());
-        o.Update(nullptr, aspect);
-    }
-};
-
-template <class Side>
-class BothObservers : public ::testing::Test {
-  protected:
-    RecordingView view;
-    isa::RefPtr<VX7EventPublisher> publisher{new VX7EventPublisher(1, 1, 1)};
-};
-
-using Sides = ::testing::Types<PhoneSide, TrunkSide>;
-TYPED_TEST_SUITE(BothObservers, Sides);
-
-TYPED_TEST(BothObservers, AnAspectTheyDoNotDrawOnlyRefreshes) {
-    auto observer = TypeParam::Make();
-    observer.SetView(&this->view);
-    TypeParam::Foreign(observer, this->publisher.Get());
-    EXPECT_TRUE(this->view.Prints().empty());
-    EXPECT_EQ(this->view.Refreshes(), 1);
+    EXPECT_EQ(g_LineStateStr[0], "InService       ");
+    EXPECT_EQ(g_LineStateStr[1], "Out of Service  ");
 }
 
-TYPED_TEST(BothObservers, WithoutAWindowNothingIsDrawnNorRemembered) {
-    auto observer = TypeParam::Make();
-    TypeParam::Remembered(observer, this->publisher.Get());
-    EXPECT_TRUE(this->view.calls.empty());
+// What both observers do alike: an aspect they do not draw only refreshes, and without a
+// window they neither draw nor remember anything.
+TEST(Observers, DrawOnlyTheirOwnAspectsAndOnlyWithAWindow) {
+    isa::RefPtr<VX7EventPublisher> publisher(new VX7EventPublisher(1, 1, 1));
+    RecordingView view;
+    ConsolePhoneObserver phone(1, 1, 2, 3, 1);
+    ConsoleTrunkObserver trunk(1, 2, 2, 1);
+
+    TSCCallState callState;
+    auto* call = new tolk::TSC::EvtCallState_t();
+    *call->pCallId = 9;
+    callState.SetEvent(publisher.Get(), call);
+    phone.Update(nullptr, callState);
+    EXPECT_EQ(phone.GetCurCallId(), 0u);
+    EXPECT_EQ(phone.DisplayCurrentPhoneState(1, 2, 3, 4), 0);
+    AllAlarms alarms;
+    auto* alarm = new tolk::LCON::Evt_0x1600_t();
+    *alarm->pType = 5654;
+    alarms.SetEvent(publisher.Get(), alarm);
+    trunk.Update(nullptr, alarms);
+    EXPECT_EQ(trunk.GetBipolarViolations(), 0u);
+    EXPECT_EQ(trunk.DisplayCurrentTrunkStatus(nullptr), 0);
+    EXPECT_TRUE(view.calls.empty());
+
+    phone.SetView(&view);
+    trunk.SetView(&view);
+    TSCCallInfo callInfo;
+    callInfo.SetEvent(publisher.Get(), new tolk::TSC::EvtCallInfo_t());
+    phone.Update(nullptr, callInfo);
+    trunk.Update(nullptr, callState);
+    EXPECT_TRUE(view.Prints().empty());
+    EXPECT_EQ(view.Refreshes(), 2);
 }
 
 constexpr int PHONE_ROW = 3;
@@ -105,6 +110,16 @@ class PhoneObserverTest : public ::testing::Test {
         observer.Update(nullptr, chanStateAspect);
     }
 
+    // The prints so far as "column:text", in order, all on the observer's row.
+    std::vector<std::string> Prints() {
+        std::vector<std::string> out;
+        for (const auto& p : view.Prints()) {
+            EXPECT_EQ(p.row, PHONE_ROW);
+            out.push_back(std::to_string(p.col) + ":" + p.text);
+        }
+        return out;
+    }
+
     RecordingView view;
     ConsolePhoneObserver observer;
     isa::RefPtr<VX7EventPublisher> publisher;
@@ -114,46 +129,30 @@ class PhoneObserverTest : public ::testing::Test {
 
 TEST_F(PhoneObserverTest, CallStateDrawsIdStateAndReasonThenRefreshes) {
     CallState(0x1f, 17, 11);
-    const auto prints = view.Prints();
-    ASSERT_EQ(prints.size(), 3u);
-    EXPECT_EQ(prints[0].text, "0x1f");
-    EXPECT_EQ(prints[0].col, 8);
-    EXPECT_EQ(prints[1].text, "Alerting             ");
-    EXPECT_EQ(prints[1].col, 47);
-    EXPECT_EQ(prints[2].text, "IncomingCall              ");
-    EXPECT_EQ(prints[2].col, 70);
-    for (const auto& p : prints) {
-        EXPECT_EQ(p.row, PHONE_ROW);
-    }
+    EXPECT_EQ(Prints(), (std::vector<std::string>{"8:0x1f", "47:Alerting             ",
+                                                  "70:IncomingCall              "}));
     ASSERT_FALSE(view.calls.empty());
     EXPECT_EQ(view.calls.back().what, "refresh");
     EXPECT_EQ(observer.GetCurCallId(), 0x1fu);
-}
 
-TEST_F(PhoneObserverTest, ShorterCallIdLeavesTheTailOfTheLongerOne) {
+    // A shorter call id leaves the tail of the longer one.
     CallState(0x1234, 2, 0);
     CallState(0x5, 9, 14);
     EXPECT_EQ(view.At(PHONE_ROW, 8, 7), "0x5234 ");
     EXPECT_EQ(observer.GetCurCallId(), 0x5u);
 }
 
-TEST_F(PhoneObserverTest, ReasonZeroAndChanStateZeroBlankTheirFields) {
-    CallState(1, 2, 14);
+TEST_F(PhoneObserverTest, ChanStateDrawsOnlyItsFieldAndZeroesBlankTheirFields) {
     ChanState(4);
+    EXPECT_EQ(Prints(), (std::vector<std::string>{"19:OutOfService              "}));
+    EXPECT_EQ(observer.GetCurCallId(), 0u);
+
+    CallState(1, 2, 14);
     CallState(1, 9, 0);
     ChanState(0);
     EXPECT_EQ(view.At(PHONE_ROW, 70, 26), std::string(26, ' '));
     EXPECT_EQ(view.At(PHONE_ROW, 19, 26), std::string(26, ' '));
     EXPECT_EQ(view.At(PHONE_ROW, 47, 21), "Idle                 ");
-}
-
-TEST_F(PhoneObserverTest, ChanStateDrawsOnlyItsField) {
-    ChanState(4);
-    const auto prints = view.Prints();
-    ASSERT_EQ(prints.size(), 1u);
-    EXPECT_EQ(prints[0].col, 19);
-    EXPECT_EQ(prints[0].text, "OutOfService              ");
-    EXPECT_EQ(observer.GetCurCallId(), 0u);
 }
 
 TEST_F(PhoneObserverTest, ValuesPastTheTablesDrawWithoutReadingPastThem) {
@@ -166,16 +165,9 @@ TEST_F(PhoneObserverTest, ValuesPastTheTablesDrawWithoutReadingPastThem) {
 
 TEST_F(PhoneObserverTest, CurrentStateDrawsInItsOrderWithoutRefreshOrCallId) {
     EXPECT_EQ(observer.DisplayCurrentPhoneState(0x2a, 2, 1, 14), 1);
-    const auto prints = view.Prints();
-    ASSERT_EQ(prints.size(), 4u);
-    EXPECT_EQ(prints[0].col, 19);
-    EXPECT_EQ(prints[0].text, "Active\t\t           ");
-    EXPECT_EQ(prints[1].col, 8);
-    EXPECT_EQ(prints[1].text, "0x2a");
-    EXPECT_EQ(prints[2].col, 47);
-    EXPECT_EQ(prints[2].text, "Connected            ");
-    EXPECT_EQ(prints[3].col, 70);
-    EXPECT_EQ(prints[3].text, "Normal                    ");
+    EXPECT_EQ(Prints(), (std::vector<std::string>{"19:Active\t\t           ", "8:0x2a",
+                                                  "47:Connected            ",
+                                                  "70:Normal                    "}));
     EXPECT_EQ(view.Refreshes(), 0);
     EXPECT_EQ(observer.GetCurCallId(), 0u);
 }
@@ -252,11 +244,15 @@ INSTANTIATE_TEST_SUITE_P(Alarms, AlarmColumnTest,
 
 class TrunkObserverTest : public TrunkObserverFixture, public ::testing::Test {};
 
+// The counters go up on every event whatever its state, and a loopback clear leaves them
+// alone.
 TEST_F(TrunkObserverTest, CountersGoUpOnEveryEventWhateverItsState) {
     Alarm(5654, 1);
     Alarm(5654, 0);
     Alarm(5654, 7);
     Alarm(5655, 0);
+    Alarm(5637, 1);
+    Alarm(5637, 0);
     EXPECT_EQ(view.At(TRUNK_ROW, 85, 2), "3 ");
     EXPECT_EQ(view.At(TRUNK_ROW, 92, 2), "1 ");
     EXPECT_EQ(observer.GetBipolarViolations(), 3u);
@@ -265,15 +261,6 @@ TEST_F(TrunkObserverTest, CountersGoUpOnEveryEventWhateverItsState) {
         Alarm(5654, 1);
     }
     EXPECT_EQ(view.At(TRUNK_ROW, 85, 2), "11");
-}
-
-TEST_F(TrunkObserverTest, LoopbackClearLeavesTheCountersAlone) {
-    Alarm(5654, 1);
-    Alarm(5637, 1);
-    Alarm(5637, 0);
-    EXPECT_EQ(view.At(TRUNK_ROW, 48, 1), " ");
-    EXPECT_EQ(view.At(TRUNK_ROW, 85, 1), "1");
-    EXPECT_EQ(observer.GetBipolarViolations(), 1u);
 }
 
 TEST_F(TrunkObserverTest, CodesBetweenAndOutsideTheTableChangeNothingButRefresh) {
@@ -294,9 +281,7 @@ TEST_F(TrunkObserverTest, LineStateShowsInServiceOnlyFor5647) {
     LineState(1234, 0);
     EXPECT_EQ(view.At(TRUNK_ROW, 8, 16), "Out of Service  ");
     EXPECT_EQ(view.At(TRUNK_ROW, 26, 14), "Null          ");
-}
-
-TEST_F(TrunkObserverTest, ReasonPastTheTableStaysInItsField) {
+    // A reason past the table stays in its field.
     LineState(5647, 6);
     EXPECT_EQ(view.At(TRUNK_ROW, 26, 14), "?6            ");
     EXPECT_EQ(view.At(TRUNK_ROW, 40, 2), "  ");

@@ -1,0 +1,448 @@
+// What the prompt does with a line, apart from the terminal: the editing keys, the scan into
+// fields, the command table and its lookup, the pager's command line, and the arguments of
+// the program.
+#include <gtest/gtest.h>
+
+#include <cstring>
+#include <initializer_list>
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "LogCapture.h"
+#include "console/CmdProcessor.h"
+#include "console/Command.h"
+#include "console/CommandLine.h"
+#include "console/CommandTable.h"
+#include "console/HelpCmd.h"
+#include "console/Lifecycle.h"
+#include "console/LineEditor.h"
+
+namespace lineprobe {
+namespace {
+
+using testsupport::LogCapture;
+
+struct ScanCase {
+    std::string line;
+    int fields;
+    const char* word;
+    int board;
+    int trunk;
+    int chan;
+    const char* text;
+};
+
+// Untouched fields keep these values, so a case can tell "not reached" from "read as 0".
+constexpr int UNSET = -777;
+constexpr const char* PREVIOUS_WORD = "previous";
+
+TEST(ScanCommandLine, SplitsLikeTheScanFormat) {
+    const ScanCase cases[] = {
+        {"quit", 1, "quit", UNSET, UNSET, UNSET, "untouched"},
+        {"quit 1", 2, "quit", 1, UNSET, UNSET, "untouched"},
+        {"trunk 1 2", 3, "trunk", 1, 2, UNSET, "untouched"},
+        {"makecall 1 1 3", 4, "makecall", 1, 1, 3, "untouched"},
+        {"destaddr 2 1 7 5551234", 5, "destaddr", 2, 1, 7, "5551234"},
+        {"  phone\t 3   4  5  ", 4, "phone", 3, 4, 5, "untouched"},
+        {"phone -1 +2 -3", 4, "phone", -1, 2, -3, "untouched"},
+        // A word ends the scan.
+        {"phone x 1 2", 1, "phone", UNSET, UNSET, UNSET, "untouched"},
+        {"phone 1 y 2", 2, "phone", 1, UNSET, UNSET, "untouched"},
+        // A number runs into the text; digits then letters stop the next number.
+        {"origaddr 1 2 3abc", 5, "origaddr", 1, 2, 3, "abc"},
+        {"phone 12ab 3", 2, "phone", 12, UNSET, UNSET, "untouched"},
+        // A lone or doubled sign is no number.
+        {"phone - 3", 1, "phone", UNSET, UNSET, UNSET, "untouched"},
+        {"phone +-3", 1, "phone", UNSET, UNSET, UNSET, "untouched"},
+        {"phone 2147483647 -2147483648 0", 4, "phone", 2147483647, -2147483647 - 1, 0, "untouched"},
+        {"quit 1 1 2147483648", 3, "quit", 1, 1, UNSET, "untouched"},
+        // Only the first word of the text is kept.
+        {"origaddr 1 2 3 555 1212", 5, "origaddr", 1, 2, 3, "555"},
+        // An empty or blank line keeps the previous word.
+        {"", -1, PREVIOUS_WORD, UNSET, UNSET, UNSET, "untouched"},
+        {" \t  ", -1, PREVIOUS_WORD, UNSET, UNSET, UNSET, "untouched"},
+    };
+    for (const ScanCase& c : cases) {
+        SCOPED_TRACE("'" + c.line + "'");
+        char word[MAX_BUFFER_SIZE];
+        char text[MAX_BUFFER_SIZE];
+        std::strcpy(word, PREVIOUS_WORD);
+        std::strcpy(text, "untouched");
+        int board = UNSET;
+        int trunk = UNSET;
+        int chan = UNSET;
+
+        EXPECT_EQ(ScanCommandLine(c.line, word, board, trunk, chan, text), c.fields);
+        EXPECT_STREQ(word, c.word);
+        EXPECT_EQ(board, c.board);
+        EXPECT_EQ(trunk, c.trunk);
+        EXPECT_EQ(chan, c.chan);
+        EXPECT_STREQ(text, c.text);
+    }
+}
+
+TEST(ScanCommandLine, LongWordAndTextAreCutToTheirBuffers) {
+    // 300 letters and then a number: the number must still be the second field, so the
+    // cut-off rest of the word may not be taken for a field of its own.
+    struct {
+        char word[MAX_BUFFER_SIZE];
+        char canary[8];
+    } guarded;
+    std::memset(&guarded, '#', sizeof guarded);
+    char text[MAX_BUFFER_SIZE];
+    int board = UNSET;
+    int trunk = UNSET;
+    int chan = UNSET;
+
+    EXPECT_EQ(
+        ScanCommandLine(std::string(300, 'w') + " 42", guarded.word, board, trunk, chan, text), 2);
+    EXPECT_EQ(std::string(guarded.word), std::string(255, 'w'));
+    EXPECT_EQ(board, 42);
+    EXPECT_EQ(std::string(guarded.canary, sizeof guarded.canary), "########");
+
+    const std::string address(1000, '5');
+    EXPECT_EQ(ScanCommandLine("destaddr 1 1 1 " + address, guarded.word, board, trunk, chan, text),
+              5);
+    EXPECT_EQ(std::string(text), std::string(255, '5'));
+}
+
+using Key = LineEditor::EditKey;
+
+class LineEditorTest : public ::testing::Test {
+  protected:
+    void SetUp() override { editor.Start(1024); }
+
+    void Type(const std::string& text) {
+        for (char c : text) {
+            EXPECT_EQ(editor.Feed(static_cast<unsigned char>(c)), LineEditor::Result::Editing);
+        }
+    }
+    void Press(std::initializer_list<int> keys) {
+        for (int key : keys) {
+            editor.Feed(key);
+        }
+    }
+    // Enters a line and begins the next one, as the prompt does.
+    void Enter(const std::string& text) {
+        Type(text);
+        ASSERT_EQ(editor.Feed('\n'), LineEditor::Result::Entered);
+        editor.Start(1024);
+    }
+
+    LineEditor editor;
+};
+
+TEST_F(LineEditorTest, TabIsABlankAndCarriageReturnEntersTheLine) {
+    Type("phone\t5\t1\t1");
+    EXPECT_EQ(editor.Line(), "phone 5 1 1");
+    EXPECT_EQ(editor.Feed('\r'), LineEditor::Result::Entered);
+    EXPECT_EQ(editor.Line(), "phone 5 1 1");
+}
+
+TEST_F(LineEditorTest, ControlCharactersAndForeignBytesAreIgnored) {
+    Type("bo");
+    Press({0x00, 0x07, 0x0c, 0x1b, 0x80, 0xff, 0x1000, Key::Delete});
+    Type("gus");
+    EXPECT_EQ(editor.Line(), "bogus");
+    EXPECT_EQ(editor.Cursor(), 5u);
+}
+
+TEST_F(LineEditorTest, CursorKeysMoveWithinTheLineAndStopAtBothEnds) {
+    Type("phone 1 1");
+    Press({Key::Left});
+    Type("2");
+    EXPECT_EQ(editor.Line(), "phone 1 21");
+    Press({Key::Home});
+    Type("x");
+    EXPECT_EQ(editor.Line(), "xphone 1 21");
+    Press({Key::End});
+    Type("0");
+    EXPECT_EQ(editor.Line(), "xphone 1 210");
+    // Ctrl-A and Ctrl-E do what Home and End do.
+    Press({0x01, Key::Right, Key::Delete, 0x05});
+    EXPECT_EQ(editor.Line(), "xhone 1 210");
+    EXPECT_EQ(editor.Cursor(), editor.Line().size());
+
+    Press({Key::Right, Key::Delete});
+    EXPECT_EQ(editor.Cursor(), editor.Line().size());
+    EXPECT_EQ(editor.Line(), "xhone 1 210");
+    Press({Key::Home, Key::Left, Key::Backspace});
+    EXPECT_EQ(editor.Cursor(), 0u);
+    EXPECT_EQ(editor.Line(), "xhone 1 210");
+}
+
+TEST_F(LineEditorTest, EveryBackspaceCodeErasesBeforeTheCursor) {
+    Type("abcd");
+    Press({Key::Left, Key::Backspace});
+    EXPECT_EQ(editor.Line(), "abd");
+    Press({0x7f});
+    EXPECT_EQ(editor.Line(), "ad");
+    Press({0x08});
+    EXPECT_EQ(editor.Line(), "d");
+    EXPECT_EQ(editor.Cursor(), 0u);
+}
+
+TEST_F(LineEditorTest, CtrlUKillsToTheCursorAndCtrlWTheWordBehindIt) {
+    Type("makecall 1 1 3");
+    Press({Key::Left, Key::Left, 0x15});
+    EXPECT_EQ(editor.Line(), " 3");
+    EXPECT_EQ(editor.Cursor(), 0u);
+    Press({Key::End, 0x15});
+    EXPECT_EQ(editor.Line(), "");
+
+    Type("makecall 12 1  ");
+    Press({0x17});
+    EXPECT_EQ(editor.Line(), "makecall 12 ");
+    Press({0x17});
+    EXPECT_EQ(editor.Line(), "makecall ");
+    // Within a word it takes only the part behind the cursor.
+    Press({Key::Left, Key::Left, Key::Left, Key::Left, Key::Left, 0x17});
+    EXPECT_EQ(editor.Line(), "call ");
+    EXPECT_EQ(editor.Cursor(), 0u);
+    Press({0x17});
+    EXPECT_EQ(editor.Line(), "call ");
+}
+
+TEST_F(LineEditorTest, TypingPastTheLimitIsDropped) {
+    editor.Start(5);
+    Type("abcdefg");
+    EXPECT_EQ(editor.Line(), "abcde");
+    Press({Key::Home});
+    Type("x");
+    EXPECT_EQ(editor.Line(), "abcde");
+}
+
+TEST_F(LineEditorTest, UpAndDownWalkTheEnteredLinesAndComeBackToTheDraft) {
+    Enter("phone 1 1 1");
+    Enter("trunk 1 1");
+    Type("make");
+    Press({Key::Up});
+    EXPECT_EQ(editor.Line(), "trunk 1 1");
+    EXPECT_EQ(editor.Cursor(), editor.Line().size());
+    Press({Key::Up, Key::Up});
+    EXPECT_EQ(editor.Line(), "phone 1 1 1");
+    Press({Key::Down});
+    EXPECT_EQ(editor.Line(), "trunk 1 1");
+    Press({Key::Down, Key::Down});
+    EXPECT_EQ(editor.Line(), "make");
+}
+
+TEST_F(LineEditorTest, AnEditedRecalledLineIsEnteredAsEditedAndTheOldOneStays) {
+    Enter("phone 1 1 1");
+    Press({Key::Up, Key::Backspace});
+    Type("2");
+    ASSERT_EQ(editor.Feed('\n'), LineEditor::Result::Entered);
+    EXPECT_EQ(editor.Line(), "phone 1 1 2");
+    editor.Start(1024);
+    Press({Key::Up});
+    EXPECT_EQ(editor.Line(), "phone 1 1 2");
+    Press({Key::Up});
+    EXPECT_EQ(editor.Line(), "phone 1 1 1");
+}
+
+TEST_F(LineEditorTest, BlankLinesAndRepeatsAreNotKept) {
+    Enter("quit 1");
+    Enter("");
+    Enter("   ");
+    Enter("quit 1");
+    Enter("help");
+    Press({Key::Up, Key::Up});
+    EXPECT_EQ(editor.Line(), "quit 1");
+    Press({Key::Up});
+    EXPECT_EQ(editor.Line(), "quit 1");  // the oldest: Up goes no further
+    Press({Key::Down});
+    EXPECT_EQ(editor.Line(), "help");
+}
+
+TEST_F(LineEditorTest, TheLatestHundredLinesAreKept) {
+    for (int i = 0; i <= 100; ++i) {
+        Enter("line " + std::to_string(i));
+    }
+    for (int i = 0; i < 100; ++i) {
+        Press({Key::Up});
+    }
+    EXPECT_EQ(editor.Line(), "line 1");
+    Press({Key::Up});
+    EXPECT_EQ(editor.Line(), "line 1");
+}
+
+TEST_F(LineEditorTest, ALongLineScrollsToKeepTheCursorInView) {
+    Type("abcdefghij");
+    LineEditor::Visible shown = editor.Show(4);
+    // The cursor at the end takes the last cell.
+    EXPECT_EQ(shown.text, "hij");
+    EXPECT_EQ(shown.cursor, 3u);
+
+    Press({Key::Left, Key::Left, Key::Left, Key::Left, Key::Left, Key::Left});
+    shown = editor.Show(4);
+    EXPECT_EQ(shown.text, "efgh");
+    EXPECT_EQ(shown.cursor, 0u);
+
+    // Moving right within the shown part does not scroll.
+    Press({Key::Right, Key::Right});
+    shown = editor.Show(4);
+    EXPECT_EQ(shown.text, "efgh");
+    EXPECT_EQ(shown.cursor, 2u);
+
+    Press({Key::Home});
+    shown = editor.Show(4);
+    EXPECT_EQ(shown.text, "abcd");
+    EXPECT_EQ(shown.cursor, 0u);
+
+    // Shortening the line brings text back into view.
+    Press({Key::End, 0x17});
+    shown = editor.Show(4);
+    EXPECT_EQ(shown.text, "");
+    EXPECT_EQ(shown.cursor, 0u);
+    Type("xy");
+    EXPECT_EQ(editor.Show(4).text, "xy");
+    EXPECT_EQ(editor.Show(0).text, "");
+}
+
+TEST(CmdProcessor, RegistersEachNameOnceAndTracesIt) {
+    CmdProcessor processor(nullptr);
+    Command first("phone");
+    Command second("phone");
+    LogCapture out;
+
+    EXPECT_EQ(processor.RegisterCommand(nullptr), -2);
+    EXPECT_EQ(out.Text(), "");
+    EXPECT_EQ(processor.RegisterCommand(&first), 0);
+    EXPECT_EQ(out.Text(), "Calling CmdProcessor::RegisterCommand\ncommand name: phone\n");
+    EXPECT_EQ(processor.RegisterCommand(&second), -1);
+    EXPECT_EQ(processor.FindCommand("phone"), &first);
+}
+
+TEST(CmdProcessor, FindTracesTheWordAndMatchesExactly) {
+    CmdProcessor processor(nullptr);
+    Command quit("quit");
+    Command trunk("trunk");
+    LogCapture out;
+    processor.RegisterCommand(&quit);
+    processor.RegisterCommand(&trunk);
+
+    EXPECT_EQ(processor.FindCommand("quit"), &quit);
+    EXPECT_EQ(processor.FindCommand("trunk"), &trunk);
+    for (const char* miss : {"QUIT", "Quit", "qui", "quit ", "trunk_ins", ""}) {
+        EXPECT_EQ(processor.FindCommand(miss), nullptr) << "'" << miss << "'";
+    }
+    EXPECT_NE(out.Text().find("Calling CmdProcessor::FindCommand: cmdStr= QUIT\n"),
+              std::string::npos);
+}
+
+std::vector<std::string> RegisteredNames(const std::string& trace) {
+    std::vector<std::string> names;
+    const std::string marker = "command name: ";
+    for (std::size_t at = trace.find(marker); at != std::string::npos;
+         at = trace.find(marker, at + 1)) {
+        const std::size_t start = at + marker.size();
+        names.push_back(trace.substr(start, trace.find('\n', start) - start));
+    }
+    return names;
+}
+
+// Every word of the prompt gets its own command, found under that word; start-up traces
+// them in this order (delphone is registered before trunk, though made after it).
+TEST(CommandTable, EveryWordIsRegisteredInItsOrderAndFoundUnderItself) {
+    const std::vector<std::unique_ptr<Command>> owned = CreateCommands({});
+    std::vector<Command*> created;
+    for (const std::unique_ptr<Command>& command : owned) {
+        ASSERT_NE(command, nullptr);
+        created.push_back(command.get());
+    }
+    CmdProcessor processor(nullptr);
+    LogCapture out;
+
+    RegisterCommands(processor, created);
+
+    const std::vector<std::string> names = RegisteredNames(out.Text());
+    EXPECT_EQ(names,
+              (std::vector<std::string>{
+                  "quit",       "help",      "phone",      "delphone", "trunk",    "makecall",
+                  "answer",     "accept",    "drop",       "release",  "chan_oos", "chan_ins",
+                  "trunk_ins",  "trunk_oos", "origaddr",   "destaddr", "deltrunk", "reset",
+                  "disablelbk", "linelbk",   "payloadlbk", "startrai", "stoprai"}));
+    for (const std::string& name : names) {
+        Command* command = processor.FindCommand(name);
+        ASSERT_NE(command, nullptr) << name;
+        EXPECT_EQ(command->GetCommandName(), name);
+    }
+}
+
+TEST(CommandTable, UnknownWordIsRegisteredLastRatherThanLost) {
+    Command extra("selftest");
+    Command quit("quit");
+    CmdProcessor processor(nullptr);
+    LogCapture out;
+
+    RegisterCommands(processor, {&extra, nullptr, &quit});
+
+    EXPECT_EQ(RegisteredNames(out.Text()), (std::vector<std::string>{"quit", "selftest"}));
+    EXPECT_EQ(processor.FindCommand("selftest"), &extra);
+}
+
+TEST(HelpCmd, PagerCommandJoinsDirectoryBinAndFileWithinTwoHundredFiftyFiveCharacters) {
+    EXPECT_EQ(HelpCmd::BuildPagerCommand("/opt/orvane/", "lineprobe_help.txt"),
+              std::optional<std::string>("less /opt/orvane/bin/lineprobe_help.txt"));
+    // No separator is added: the directory carries its own trailing slash.
+    EXPECT_EQ(HelpCmd::BuildPagerCommand("/opt/orvane", "lineprobe_help.txt"),
+              std::optional<std::string>("less /opt/orvanebin/lineprobe_help.txt"));
+
+    // "less " (5) + directory + "bin/" (4) + "lineprobe_help.txt" (18) = 27 + directory.
+    const std::string fits = "/" + std::string(226, 'd') + "/";     // 228: line of 255
+    const std::string tooLong = "/" + std::string(227, 'd') + "/";  // 229: line of 256
+    const std::optional<std::string> longest =
+        HelpCmd::BuildPagerCommand(fits, "lineprobe_help.txt");
+    ASSERT_TRUE(longest.has_value());
+    EXPECT_EQ(longest->size(), 255u);
+    EXPECT_FALSE(HelpCmd::BuildPagerCommand(tooLong, "lineprobe_help.txt").has_value());
+    EXPECT_FALSE(HelpCmd::BuildPagerCommand(std::string(5000, 'x'), "lineprobe_help.txt"));
+}
+
+struct OptionCase {
+    std::vector<std::string> args;
+    std::string output;
+    int stoppedAt;
+};
+
+TEST(ProcessCmdLineArgs, PrintsAndStops) {
+    const std::string usage =
+        "for help on using lineprobe, look in /usr/orvane/bin/lineprobe_help.txt\n";
+    const std::string version = "lineprobe version 1.0\n";
+    const std::string invalid = "invalid argument\n" + usage;
+    const std::string count =
+        "invalid argument count\nvalid arguments are:\n-v\tshow version\n-h\thelp info \n";
+    const OptionCase cases[] = {
+        {{"-v"}, version, 1},
+        {{"-h"}, usage, 1},
+        {{"-v", "-h"}, version + usage, 2},
+        {{"-h", "-v"}, usage + version, 2},
+        {{"-x"}, invalid, 0},
+        {{"-v", "bogus"}, version + invalid, 1},
+        // An unknown argument stops the walk.
+        {{"bogus", "-v"}, invalid, 0},
+        {{"-V"}, invalid, 0},
+        {{"-v", "-h", "-v"}, count, 0},
+        {{"a", "b", "c"}, count, 0},
+        {{"-v", "-v", "-v", "-v"}, count, 0},
+    };
+    for (const OptionCase& c : cases) {
+        std::vector<std::string> args = c.args;
+        std::vector<char*> argv;
+        for (std::string& arg : args) {
+            argv.push_back(arg.data());
+        }
+        argv.push_back(nullptr);
+        LogCapture out;
+
+        const int stoppedAt = ProcessCmdLineArgs(static_cast<int>(args.size()), argv.data());
+
+        EXPECT_EQ(out.Text(), c.output) << c.args[0] << " (" << c.args.size() << " arguments)";
+        EXPECT_EQ(stoppedAt, c.stoppedAt) << c.args[0] << " (" << c.args.size() << " arguments)";
+    }
+}
+
+}  // namespace
+}  // namespace lineprobe

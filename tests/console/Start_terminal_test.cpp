@@ -1,0 +1,156 @@
+// Start-up as the operator meets it: arguments that print and end, the terminal size check,
+// the screen and the logs of a good start, and a relay that cannot be used.
+#include <gtest/gtest.h>
+
+#include <chrono>
+#include <string>
+#include <vector>
+
+#include "ConsoleScreen.h"
+#include "ScriptedRelay.h"
+#include "TerminalSession.h"
+
+namespace lineprobe::testing {
+namespace {
+
+using namespace std::chrono_literals;
+
+const std::string USAGE = "for help on using lineprobe, look in /usr/orvane/bin/lineprobe_help.txt";
+const std::string EARLIER_RUN = "trace of an earlier run\n";
+
+struct EarlyEndCase {
+    std::vector<std::string> args;
+    int rows;
+    int cols;
+    int status;
+    std::vector<std::string> screen;
+};
+
+// Arguments print and end with status 0 (which texts, in which order, is the unit test's);
+// a terminal below 40x100 is refused with status 1. Neither touches the logs of an earlier
+// run.
+TEST(Startup, EarlyEndsShowTheirTextAndLeaveTheLogsAlone) {
+    const std::string minimum = "The terminal size must be at least 40 rows and 100 columns.";
+    const EarlyEndCase cases[] = {
+        {{"-v", "x"}, 40, 100, 0, {"lineprobe version 1.0", "invalid argument", USAGE, ""}},
+        // The tab of the texts reaches the next tab stop, column 8.
+        {{"-v", "-h", "-v"},
+         40,
+         100,
+         0,
+         {"invalid argument count", "valid arguments are:", "-v      show version",
+          "-h      help info", ""}},
+        {{}, 39, 100, 1, {minimum, "current terminal size is: 39 rows by 100 cols"}},
+        {{}, 40, 99, 1, {minimum, "current terminal size is: 40 rows by 99 cols"}},
+    };
+    for (const EarlyEndCase& c : cases) {
+        SCOPED_TRACE(c.screen[1]);
+        TerminalSession session(
+            TerminalOptions().Size(c.rows, c.cols).Args(c.args).File("lineprobe.log", EARLIER_RUN));
+        ASSERT_EQ(session.WaitForExit(), std::optional<int>(c.status)) << session.Dump();
+        for (std::size_t row = 0; row < c.screen.size(); ++row) {
+            EXPECT_TRUE(session.WaitForRow(static_cast<int>(row), c.screen[row]))
+                << "row " << row << " should read '" << c.screen[row] << "':\n"
+                << session.Dump();
+        }
+        EXPECT_EQ(session.ReadLog(), std::optional<std::string>(EARLIER_RUN));
+        EXPECT_FALSE(session.ReadErrLog().has_value());
+    }
+}
+
+// A terminal of exactly the minimum is enough. Both logs start empty on each run, and the
+// analog board of the default farm ends its line walk on the board's refusal, which is no
+// failure, so the trace reports none.
+TEST(Startup, DrawsTheLayoutIntoFreshLogs) {
+    TerminalSession session(TerminalOptions()
+                                .Size(40, 100)
+                                .File("lineprobe.log", "stale trace line\n")
+                                .File("lineprobe_err.log", "stale error line\n"));
+    ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
+    const std::vector<std::string> screen = session.Screen();
+    for (int row : SEPARATOR_ROWS) {
+        EXPECT_TRUE(IsSeparatorRow(screen[static_cast<std::size_t>(row)])) << "row " << row << "\n"
+                                                                           << session.Dump();
+    }
+    EXPECT_EQ(screen[PROMPT_ROW].substr(0, 5), "  -> ");
+    ASSERT_TRUE(session.WaitForLogLine("lineprobe.log", "command name: stoprai"));
+    const std::optional<std::string> log = session.ReadLog();
+    ASSERT_TRUE(log);
+    EXPECT_EQ(CountOccurrences(*log, "Calling CmdProcessor::RegisterCommand\n"), 23u);
+    EXPECT_EQ(log->find("stale"), std::string::npos);
+    EXPECT_EQ(log->find("UnexpectedMsg"), std::string::npos) << *log;
+    EXPECT_EQ(session.ReadErrLog(), std::optional<std::string>(""));
+    EXPECT_TRUE(session.StillRunning());
+}
+
+void ReadTheOpen(sock& conn) {
+    msg_t open;
+    conn.get_msg(open);
+    free_msg(open);
+}
+
+struct RelayCase {
+    const char* name;
+    // Plays the relay; none for a port where nothing listens.
+    ScriptedRelay::Script script;
+    // Part of the cause that the screen must show.
+    const char* reason;
+};
+
+// A relay that is down or answers the open wrongly still ends the program by abort (how
+// each answer is judged is the transport's test), but with the normal screen and the
+// terminal's modes back, and the cause on the screen and in the error log.
+TEST(Startup, UnusableRelayIsReportedOnARestoredTerminal) {
+    const RelayCase cases[] = {
+        {"NothingListening", nullptr, "Connection refused"},
+        {"WrongFrameType",
+         [](sock& conn) {
+             ReadTheOpen(conn);
+             ScriptedRelay::sendEmpty(conn, TKS_FRAME_CLOSE_ACK);
+         },
+         ""},
+        {"EightByteAddress",
+         [](sock& conn) {
+             ReadTheOpen(conn);
+             unsigned char body[8] = {0, 0, 0, 1, 0, 0, 0, 2};
+             msg_t m;
+             m.type = TKS_FRAME_ASSIGNED;
+             m.size = sizeof body;
+             m.body = body;
+             conn.snd_msg(m);
+             char byte;
+             conn.readblock(&byte, 1);
+         },
+         ""},
+    };
+    for (const RelayCase& c : cases) {
+        SCOPED_TRACE(c.name);
+        std::optional<ScriptedRelay> relay;
+        // Port 1 of the loopback: nobody serves it.
+        std::string address = "127.0.0.1:1";
+        if (c.script) {
+            relay.emplace(c.script);
+            address = relay->address();
+        }
+        TerminalOptions options;
+        options.env = {{"REMOTE_TKHOST", address},
+                       {"VX7_FARM", LINEPROBE_FARMS_DIR "/default.toml"}};
+        TerminalSession session(options);
+
+        const std::string cause = "cannot reach the relay at " + address + ": ";
+        EXPECT_EQ(session.WaitForExit(30s), 128 + 6) << session.Dump();
+        EXPECT_FALSE(session.AlternateScreen()) << session.Dump();
+        const std::string modes = session.TerminalModes();
+        EXPECT_NE(modes.find(" icanon"), std::string::npos) << modes;
+        EXPECT_NE(modes.find(" echo "), std::string::npos) << modes;
+        EXPECT_TRUE(session.WaitForText("lineprobe: " + cause, 2s)) << session.Dump();
+        EXPECT_TRUE(session.WaitForText(c.reason, 0ms)) << session.Dump();
+        EXPECT_FALSE(session.WaitForText("terminate called", 0ms)) << session.Dump();
+        const auto errors = session.ReadErrLog();
+        ASSERT_TRUE(errors);
+        EXPECT_EQ(errors->rfind(cause, 0), 0u) << *errors;
+    }
+}
+
+}  // namespace
+}  // namespace lineprobe::testing
