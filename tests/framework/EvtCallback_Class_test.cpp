@@ -222,18 +222,15 @@ TEST_F(Dispatcher, CancelOfAnUnknownNumberRaisesAndLeavesTheLockFree) {
     comp.asyncRegisterMsgType(0x55, msgA, 0);
     EXPECT_THROW(comp.asyncCancelMsgType(0x56), tolk::Exception);
     EXPECT_THROW(comp.asyncCancelEvtGroup(0x56, msgA, 0), tolk::Exception);
+    Component fresh(board.address(), queue);
+    EXPECT_NO_THROW(fresh.asyncCancelMsgType(0x55));  // no dispatcher yet: nothing to cancel
     comp.asyncRegisterMsgType(0x57, msgB, 0);
     send(0x57);
     waitSeen(1);
     EXPECT_EQ(seenCount(), 1u);
 }
 
-TEST_F(Dispatcher, CancelWithoutADispatcherDoesNothing) {
-    Component fresh(board.address(), queue);
-    EXPECT_NO_THROW(fresh.asyncCancelMsgType(0x55));
-}
-
-TEST_F(Dispatcher, UnregisteredMessageBannerNamesTypeAndObject) {
+TEST_F(Dispatcher, UnregisteredMessageOrEventBannerNamesTypeOrGroupAndObject) {
     comp.asyncRegisterMsgType(0x58, msgA, 0);
     testing::internal::CaptureStderr();
     send(0x59, {1, 2});
@@ -249,39 +246,19 @@ TEST_F(Dispatcher, UnregisteredMessageBannerNamesTypeAndObject) {
                        "********************************************\n\n"),
               std::string::npos)
         << err;
-}
 
-TEST_F(Dispatcher, UnregisteredEventBannerNamesTheGroup) {
-    comp.asyncRegisterMsgType(0x58, msgA, 0);
     testing::internal::CaptureStderr();
     send(0x20, evt(0x77));
     send(0x58);
-    waitSeen(1);
-    std::string err = testing::internal::GetCapturedStderr();
-    std::ostringstream head;
+    waitSeen(2);
+    err = testing::internal::GetCapturedStderr();
+    head.str("");
     head << "********************************************\nUnregistered EventGroup 119\nFor "
          << comp << "\n{MsgType: 0x20 ";
     EXPECT_EQ(err.rfind(head.str(), 0), 0u) << err;
     EXPECT_NE(err.find("You may specify your own handler for unregisted events using\n"
                        "Addressable::asyncUnregisteredEvtGroup\n"),
               std::string::npos);
-}
-
-TEST_F(Dispatcher, ExceptionFromACallbackIsReportedOnceAndTheReaderGoesOn) {
-    comp.asyncRegisterMsgType(0x5A, throwing, 0);
-    comp.asyncRegisterMsgType(0x5A, msgA, 0);
-    testing::internal::CaptureStderr();
-    send(0x5A);
-    waitSeen(1);
-    send(0x5A);
-    waitSeen(2);
-    std::string err = testing::internal::GetCapturedStderr();
-    EXPECT_EQ(err,
-              "EvtCallback_Class(138) TOLK Exception caught from callback handler thread\n"
-              "callback failed\n"
-              "EvtCallback_Class(138) TOLK Exception caught from callback handler thread\n"
-              "callback failed\n");
-    EXPECT_EQ(seenCount(), 2u);
 }
 
 TEST_F(Dispatcher, ImpossibleCountInAnEventBodyIsReportedNotFatal) {

@@ -72,6 +72,11 @@ TEST_F(MarshalTest, FirstFieldAtOffsetZeroReturnsItsWidth) {
     OneUInt r;
     EXPECT_EQ(m.read(&r, 0), 4u);
     EXPECT_EQ(r.v, 0xA1B2C3D4u);
+    // A later field, at a non-zero offset, is not adjusted.
+    Msg later(6);
+    unsigned short s = 0x0102;
+    EXPECT_EQ(tolk::putField(&later, 4, 0x280000, &s), 6u);
+    EXPECT_BYTES(later, {0, 0, 0, 0, 0x01, 0x02});
 }
 
 TEST_F(MarshalTest, FirstFieldFixedArrayAddsElementWidthTimesCount) {
@@ -83,13 +88,6 @@ TEST_F(MarshalTest, FirstFieldFixedArrayAddsElementWidthTimesCount) {
     EXPECT_EQ(addr.length(), 128u);
     ASSERT_EQ(fieldCalls().size(), 1u);
     EXPECT_EQ(fieldCalls()[0].descs, std::vector<unsigned int>{0x53F800});
-}
-
-TEST_F(MarshalTest, LaterFieldAtNonZeroOffsetIsNotAdjusted) {
-    Msg m(6);
-    unsigned short s = 0x0102;
-    EXPECT_EQ(tolk::putField(&m, 4, 0x280000, &s), 6u);
-    EXPECT_BYTES(m, {0, 0, 0, 0, 0x01, 0x02});
 }
 
 TEST(MarshalWidth, TypeCodes) {
@@ -147,14 +145,6 @@ INSTANTIATE_TEST_SUITE_P(
                       ChunkCase{511, {0x200000, 0x27F000, 0x27F000}, {4, 5, 260}},
                       ChunkCase{300, {0x216000, 0x27F000}, {4, 49}}));
 
-TEST_F(MarshalTest, EmptyListMakesNoCallAtAll) {
-    Msg m(0u);
-    staticList<unsigned int> l;
-    EXPECT_EQ(tolk::putList(&m, 8, 7, l, false), 8u);
-    EXPECT_EQ(tolk::getList(&m, 8, 7, l, 0, true), 8u);
-    EXPECT_TRUE(fieldCalls().empty());
-}
-
 TEST_F(MarshalTest, WordListsUseTheirFullChunkDescriptors) {
     staticList<unsigned int> w;
     w.realloc(256);
@@ -187,17 +177,22 @@ TEST_F(MarshalTest, FirstChunkOfALeadingListGetsTheFirstFieldRule) {
     EXPECT_EQ(fieldCalls()[1].offsetIn, 45u);
 }
 
-TEST_F(MarshalTest, ElementTypeNarrowerThanTheCodeIsRefused) {
+TEST_F(MarshalTest, ElementTypeNarrowerThanTheCodeOrAnImpossibleCountIsRefused) {
     staticList<unsigned char> l;
     l.realloc(4);
     Msg m(16);
     EXPECT_THROW(tolk::putList(&m, 0, 7, l, true), tolk::Exception);
+    staticList<unsigned int> words;
+    EXPECT_THROW(tolk::getList(&m, 4, 7, words, 0xFFFFFFFFu, false),
+                 staticList<unsigned int>::AllocationError);
     EXPECT_TRUE(fieldCalls().empty());
 }
 
-TEST_F(MarshalTest, FixedArrayOfNoneMovesNothingAndOneBeyond256IsRefused) {
+TEST_F(MarshalTest, ListOrFixedArrayOfNoneMovesNothingAndOneBeyond256IsRefused) {
     Msg m(512);
     staticList<unsigned char> l;
+    EXPECT_EQ(tolk::putList(&m, 8, 4, l, false), 8u);
+    EXPECT_EQ(tolk::getList(&m, 8, 4, l, 0, true), 8u);
     EXPECT_EQ(tolk::putFixed(&m, 4, 4, 0, l, false), 4u);
     EXPECT_EQ(tolk::getFixed(&m, 4, 4, 0, l, false), 4u);
     EXPECT_EQ(l.length(), 0u);
@@ -209,22 +204,6 @@ TEST_F(MarshalTest, FixedArrayOfNoneMovesNothingAndOneBeyond256IsRefused) {
     EXPECT_THROW(tolk::putFixed(&m, 4, 4, 257, l, false), tolk::Exception);
     EXPECT_THROW(tolk::getFixed(&m, 4, 4, 257, l, false), tolk::Exception);
     EXPECT_EQ(fieldCalls().size(), 1u);
-}
-
-TEST_F(MarshalTest, ImpossibleCountRaisesAllocationError) {
-    Msg m(8);
-    staticList<unsigned int> l;
-    EXPECT_THROW(tolk::getList(&m, 4, 7, l, 0xFFFFFFFFu, false),
-                 staticList<unsigned int>::AllocationError);
-    EXPECT_TRUE(fieldCalls().empty());
-}
-
-TEST_F(MarshalTest, RemainingIsSizeMinusOffsetAndZeroBeyond) {
-    Msg m(10);
-    EXPECT_EQ(tolk::remaining(&m, 0), 10u);
-    EXPECT_EQ(tolk::remaining(&m, 4), 6u);
-    EXPECT_EQ(tolk::remaining(&m, 10), 0u);
-    EXPECT_EQ(tolk::remaining(&m, 11), 0u);
 }
 
 TEST_F(MarshalTest, CompDescIsSixBytesWithFourByteFieldsInOneCall) {
@@ -254,7 +233,7 @@ TEST_F(MarshalTest, CompAttrIsKeyThenSignedValue) {
     EXPECT_EQ(r.value, -2);
 }
 
-TEST_F(MarshalTest, MsgDefaultReadsAllThatIsLeft) {
+TEST_F(MarshalTest, MsgDefaultReadsAllThatIsLeftAndWritesItsList) {
     Msg m(5);
     fillBody(m, {9, 8, 7, 6, 5});
     tolk::MsgDefault_t d;
@@ -267,19 +246,17 @@ TEST_F(MarshalTest, MsgDefaultReadsAllThatIsLeft) {
     tolk::MsgDefault_t none;
     EXPECT_EQ(m.read(&none, 9), 9u);
     EXPECT_EQ(none.GetByteSize(), 0u);
-}
-
-TEST_F(MarshalTest, MsgDefaultOnCallersListWritesIt) {
+    // Made on the caller's list, it writes that list and its copies are its own.
     staticList<unsigned char> bytes;
     bytes.realloc(3);
     *bytes[0] = 1;
     *bytes[1] = 2;
     *bytes[2] = 3;
-    tolk::MsgDefault_t d(bytes);
-    Msg m(d.GetByteSize());
-    EXPECT_EQ(m.write(&d, 0), 3u);
-    EXPECT_BYTES(m, {1, 2, 3});
-    tolk::MsgDefault_t copy(d);
+    tolk::MsgDefault_t mine(bytes);
+    Msg out(mine.GetByteSize());
+    EXPECT_EQ(out.write(&mine, 0), 3u);
+    EXPECT_BYTES(out, {1, 2, 3});
+    tolk::MsgDefault_t copy(mine);
     *bytes[0] = 99;
     EXPECT_EQ(*copy.bytes()[0], 1);
 }

@@ -5,12 +5,16 @@
 #include <cstring>
 #include <sstream>
 
+#include "framework/CompAttr_t.h"
+#include "framework/CompDesc_t.h"
+
 #include "framework/MsgDefault_t.h"
 #include "framework/tolk.h"
 #include "transport/TKSMsgRef.h"
 
 namespace {
 
+using tolk::CompDesc_t;
 using tolk::Msg;
 
 std::string text(const tolk::virtualObject& o) {
@@ -62,7 +66,7 @@ TEST(Msg, PrintingLeavesAByteDefinitionThatTheSecondPrintRefills) {
     EXPECT_NE(second.find("{ByteData {0x7 0x20 0xff }}"), std::string::npos);
 }
 
-TEST(Msg, CopyIsDeepAndHasNoDefinition) {
+TEST(Msg, CopyIsDeepAndHasNoDefinitionAndReallocKeepsTheHeader) {
     std::unique_ptr<Msg> m(sample());
     text(*m);
     Msg c(*m);
@@ -71,6 +75,9 @@ TEST(Msg, CopyIsDeepAndHasNoDefinition) {
     EXPECT_EQ(text(c), text(*m));
     tkMsgBody(c.getMsgRef())[0] = 9;
     EXPECT_EQ(tkMsgBody(m->getMsgRef())[0], 1);
+    c.realloc(10);
+    EXPECT_EQ(c.getSize(), 10u);
+    EXPECT_EQ(c.getMsgType(), 0x1214u);
 }
 
 TEST(Msg, AdoptsABlockAndAnEmptiedSlotFreesNothing) {
@@ -93,14 +100,6 @@ TEST(Msg, AdoptsABlockAndAnEmptiedSlotFreesNothing) {
     kept.free();
 }
 
-TEST(Msg, ReallocKeepsTheHeader) {
-    Msg m(2u);
-    m.setMsgType(0x20);
-    m.realloc(10);
-    EXPECT_EQ(m.getSize(), 10u);
-    EXPECT_EQ(m.getMsgType(), 0x20u);
-}
-
 TEST(UniqueIds, CountUpFromTheirOwnBase) {
     unsigned int a = tolk::getUniqueTransId();
     unsigned int b = tolk::getUniqueTransId();
@@ -109,6 +108,38 @@ TEST(UniqueIds, CountUpFromTheirOwnBase) {
     unsigned int o = tolk::getUniqueObjId();
     EXPECT_GE(o, 1000u);
     EXPECT_EQ(tolk::getUniqueObjId(), o + 1);
+}
+
+const CompDesc_t base(0x0102, 3, 4, 5, 6);
+
+TEST(CompDesc, DiffersOnEachSingleField) {
+    for (const CompDesc_t& other :
+         {CompDesc_t(0x0202, 3, 4, 5, 6), CompDesc_t(0x0103, 3, 4, 5, 6),
+          CompDesc_t(0x0102, 9, 4, 5, 6), CompDesc_t(0x0102, 3, 9, 5, 6),
+          CompDesc_t(0x0102, 3, 4, 9, 6), CompDesc_t(0x0102, 3, 4, 5, 9)}) {
+        EXPECT_FALSE(base == other) << other;
+        EXPECT_TRUE(base != other) << other;
+    }
+    CompDesc_t c;
+    c = base;
+    EXPECT_TRUE(c == base);
+    EXPECT_FALSE(c != base);
+    EXPECT_TRUE(CompDesc_t(base.getTKCompDesc()) == base);
+}
+
+TEST(CompDesc, PrintsInTheStreamsBase) {
+    std::ostringstream os;
+    os << CompDesc_t(5, 2, 3, 4, 1);
+    EXPECT_EQ(os.str(), "{Node 1 Board 2 Processor 3 Component 4 Instance 5}");
+    std::ostringstream hx;
+    hx << std::hex << CompDesc_t(0x1F, 0x20, 0, 18, 10);
+    EXPECT_EQ(hx.str(), "{Node a Board 20 Processor 0 Component 12 Instance 1f}");
+}
+
+TEST(CompDesc, ClosedFormPrintsHexJoinedAndRestoresFlags) {
+    std::ostringstream os;
+    os << CompDesc_t(5, 2, 3, 4, 1).getTKCompDesc() << " " << 10 << " " << tolk::CompAttr_t(7, -3);
+    EXPECT_EQ(os.str(), "0x1:0x2:0x3:0x4:0x5 10 {key 7 value -3}");
 }
 
 }  // namespace

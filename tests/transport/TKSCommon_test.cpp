@@ -1,14 +1,19 @@
-#include "transport/TKSCommon.h"
-
 #include <gtest/gtest.h>
 
+#include <atomic>
+#include <chrono>
 #include <stdexcept>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "transport/IsaSync.h"
+#include "transport/TKSCommon.h"
 
 namespace {
+
+using namespace std::chrono_literals;
+using Clock = std::chrono::steady_clock;
 
 TEST(TKSMutex, TryLockIsABinarySignal) {
     TKSMutex m;
@@ -21,29 +26,6 @@ TEST(TKSMutex, TryLockIsABinarySignal) {
     EXPECT_TRUE(m.tryLock());
     EXPECT_FALSE(m.tryLock());
 }
-
-TEST(TKSMutex, StepLargerThanTheTimeOutTriesOnce) {
-    TKSMutex m;
-    m.lock();
-    EXPECT_FALSE(m.tryLock(5, 10));
-    m.unlock();
-    EXPECT_TRUE(m.tryLock(5, 10));
-}
-
-TEST(TKSCommon, SleepChecksItsLimit) {
-    tks_sleep_ms(0);
-    tks_sleep_ms(1);
-    EXPECT_DEATH(tks_sleep_ms(1001), "miliseconds <= 1000");
-}
-
-TEST(TKSCommon, HostInitSucceeds) {
-    EXPECT_EQ(0, TKSHostInit());
-    TKSHostCleanup();
-}
-
-struct Recorder {
-    std::vector<int> order;
-};
 
 std::vector<int>* g_order = nullptr;
 
@@ -69,24 +51,19 @@ void* arg(int v) {
     return reinterpret_cast<void*>(static_cast<std::intptr_t>(v));
 }
 
-TEST_F(CleanupStack, PopReportsWhatRemainsAndRunsOnlyWhenAsked) {
-    TKSThread::control c(status, runLock);
-    EXPECT_EQ(0, c.popCleanup(1));
-    c.pushCleanup(recordOne, arg(1));
-    c.pushCleanup(recordOne, arg(2));
-    EXPECT_EQ(1, c.popCleanup(0));
-    EXPECT_TRUE(order.empty());
-    EXPECT_EQ(0, c.popCleanup(1));
-    EXPECT_EQ(std::vector<int>({1}), order);
-}
-
-TEST_F(CleanupStack, DestructorRunsTheRestNewestFirstAndOpensRunLock) {
+TEST_F(CleanupStack, PopRunsOnlyWhenAskedAndTheDestructorRunsTheRestNewestFirst) {
     runLock.lock();
     {
         TKSThread::control c(status, runLock);
-        c.pushCleanup(recordOne, arg(1));
-        c.pushCleanup(recordOne, arg(2));
-        c.pushCleanup(recordOne, arg(3));
+        EXPECT_EQ(0, c.popCleanup(1));
+        for (int i = 1; i <= 4; ++i) {
+            c.pushCleanup(recordOne, arg(i));
+        }
+        // The answer is whether entries remain, not how many.
+        EXPECT_EQ(1, c.popCleanup(0));
+        EXPECT_TRUE(order.empty());
+        EXPECT_EQ(1, c.popCleanup(1));
+        EXPECT_EQ(std::vector<int>({3}), order);
     }
     EXPECT_EQ(std::vector<int>({3, 2, 1}), order);
     EXPECT_TRUE(runLock.tryLock());
@@ -105,10 +82,236 @@ TEST_F(CleanupStack, ThrowingCleanupIsReportedAndReRaised) {
     EXPECT_EQ(std::vector<int>({1}), order);
 }
 
-TEST(TKSThread, JoinOnANeverStartedThreadReturnsAtOnce) {
-    TKSThread t([](void*, void*) -> void* { return nullptr; }, 0);
+TEST(TKSMutexSignal, AnotherThreadReleasesAWaiterAtOnceNotAtTheNextStep) {
+    TKSMutex gate;
+    gate.lock();
+    std::thread opener([&] {
+        std::this_thread::sleep_for(20ms);
+        gate.unlock();
+    });
+    auto t0 = Clock::now();
+    // A wait that looked again only every step would sit here for 20 s.
+    EXPECT_TRUE(gate.tryLock(60000, 20000));
+    EXPECT_LT(Clock::now() - t0, 10s);
+    opener.join();
+}
+
+TEST(TKSMutexSignal, TimeOutKeepsItsLength) {
+    TKSMutex gate;
+    gate.lock();
+    auto t0 = Clock::now();
+    EXPECT_FALSE(gate.tryLock(100, 10));
+    EXPECT_GE(Clock::now() - t0, 100ms);
+    EXPECT_FALSE(gate.tryLock(0, 10));
+    // A step larger than the time-out tries once.
+    EXPECT_FALSE(gate.tryLock(5, 10));
+    gate.unlock();
+    EXPECT_TRUE(gate.tryLock(5, 10));
+}
+
+struct Body : TKSRunnable {
+    std::atomic<int> runs{0};
+    std::atomic<bool> release{false};
+    void* run(void*, void* arg) {
+        ++runs;
+        while (!release.load()) {
+            std::this_thread::sleep_for(1ms);
+        }
+        return arg;
+    }
+};
+
+TEST(TKSThread, StartRunsTheMemberBodyAndJoinWaitsForIt) {
+    Body body;
+    TKSThread t(static_cast<TKSRunnable*>(&body), static_cast<TKSThread::MemberBody>(&Body::run),
+                0);
+    int token = 0;
+    t.start(&token);
+    EXPECT_EQ(TKSThread::RUNNING, t.getStatus());
+    EXPECT_THROW(t.start(nullptr), TKSThread::AlreadyActive);
+    body.release = true;
     t.join();
     EXPECT_EQ(TKSThread::NOT_RUNNING, t.getStatus());
+    EXPECT_EQ(&token, t.getResult());
+    EXPECT_EQ(1, body.runs.load());
+    // A thread that ended can be started again.
+    t.start(nullptr);
+    t.join();
+    EXPECT_EQ(2, body.runs.load());
+}
+
+TEST(TKSThread, SmallStackIsRaisedNotRefusedAndJoinBeforeStartReturns) {
+    static std::atomic<bool> ran;
+    ran = false;
+    TKSThread t(
+        [](void*, void*) -> void* {
+            ran = true;
+            return nullptr;
+        },
+        1);
+    t.join();
+    EXPECT_EQ(TKSThread::NOT_RUNNING, t.getStatus());
+    EXPECT_NO_THROW(t.start(nullptr));
+    t.join();
+    EXPECT_TRUE(ran.load());
+}
+
+std::atomic<int> g_cleanups{0};
+void* countCleanup(void*) {
+    ++g_cleanups;
+    return nullptr;
+}
+
+TEST(TKSThread, CancelIsNoticedByTestCancelWhichRunsTheCleanups) {
+    g_cleanups = 0;
+    static std::atomic<bool> started;
+    started = false;
+    TKSThread t(
+        [](void* control, void*) -> void* {
+            auto* c = static_cast<TKSThread::control*>(control);
+            c->pushCleanup(countCleanup, nullptr);
+            c->pushCleanup(countCleanup, nullptr);
+            started = true;
+            for (;;) {
+                c->testCancel();
+                std::this_thread::sleep_for(1ms);
+            }
+        },
+        0);
+    t.start(nullptr);
+    while (!started.load()) {
+        std::this_thread::sleep_for(1ms);
+    }
+    t.cancel();
+    t.join();
+    EXPECT_EQ(2, g_cleanups.load());
+    EXPECT_EQ(TKSThread::NOT_RUNNING, t.getStatus());
+}
+
+// Records its own end, so that a test can see who deleted it.
+class SelfDeleting : public TKSThread {
+  public:
+    explicit SelfDeleting(std::atomic<int>& deletions)
+        : TKSThread(static_cast<TKSRunnable*>(&body),
+                    static_cast<TKSThread::MemberBody>(&Body::run), 0),
+          deletions(deletions) {}
+    ~SelfDeleting() override { ++deletions; }
+    Body body;
+
+  private:
+    std::atomic<int>& deletions;
+};
+
+TEST(TKSThread, SelfDeletingThreadDeletesItsObjectOnceWhenTheBodyEnds) {
+    std::atomic<int> deletions{0};
+    auto* t = new SelfDeleting(deletions);
+    t->setSelfDelete(1);
+    t->start(nullptr);
+    EXPECT_EQ(0, deletions.load());
+    t->body.release = true;
+    for (int i = 0; i < 5000 && deletions.load() == 0; ++i) {
+        std::this_thread::sleep_for(1ms);
+    }
+    std::this_thread::sleep_for(10ms);
+    EXPECT_EQ(1, deletions.load());
+}
+
+TEST(TKSThread, ExceptionFromABodyEndsOnlyThatThread) {
+    TKSThread t([](void*, void*) -> void* { throw 42; }, 0);
+    testing::internal::CaptureStderr();
+    t.start(nullptr);
+    t.join();
+    std::string err = testing::internal::GetCapturedStderr();
+    EXPECT_NE(std::string::npos, err.find("exception left a thread body"));
+    EXPECT_EQ(TKSThread::NOT_RUNNING, t.getStatus());
+}
+
+TEST(TKSThread, DestructorStopsARunningThread) {
+    static std::atomic<bool> ended;
+    ended = false;
+    {
+        TKSThread t(
+            [](void* control, void*) -> void* {
+                auto* c = static_cast<TKSThread::control*>(control);
+                while (!c->cancelled()) {
+                    std::this_thread::sleep_for(1ms);
+                }
+                ended = true;
+                return nullptr;
+            },
+            0);
+        t.start(nullptr);
+    }
+    EXPECT_TRUE(ended.load());
+}
+
+TEST(TKSThread, AbandonedThreadRunsWithoutControl) {
+    static std::atomic<void*> seenControl;
+    static std::atomic<bool> done;
+    seenControl = reinterpret_cast<void*>(1);
+    done = false;
+    TKSAbandonedThread_create(
+        [](void* control, void*) -> void* {
+            seenControl = control;
+            done = true;
+            return nullptr;
+        },
+        nullptr, 0);
+    while (!done.load()) {
+        std::this_thread::sleep_for(1ms);
+    }
+    EXPECT_EQ(nullptr, seenControl.load());
+}
+
+struct Tracked {
+    static std::atomic<int> deletes;
+    virtual ~Tracked() { ++deletes; }
+};
+std::atomic<int> Tracked::deletes{0};
+
+TEST(RefPtrConcurrency, CountSurvivesConcurrentCopyAndRelease) {
+    Tracked::deletes = 0;
+    for (int round = 0; round < 20; ++round) {
+        auto* shared = new isa::RefPtr<Tracked>(new Tracked);
+        std::atomic<bool> go{false};
+        std::vector<std::thread> threads;
+        for (int t = 0; t < 4; ++t) {
+            threads.emplace_back([&, copy = *shared]() mutable {
+                while (!go.load()) {
+                }
+                for (int i = 0; i < 2000; ++i) {
+                    isa::RefPtr<Tracked> a(copy);
+                    isa::RefPtr<Tracked> b;
+                    b = a;
+                    a.Detach();
+                }
+            });
+        }
+        delete shared;
+        go = true;
+        for (auto& t : threads) {
+            t.join();
+        }
+        EXPECT_EQ(round + 1, Tracked::deletes.load());
+    }
+}
+
+TEST(RefPtrConcurrency, OneRefPtrReadWhileAnotherThreadAssignsIt) {
+    Tracked::deletes = 0;
+    isa::RefPtr<Tracked> slot(new Tracked);
+    std::atomic<bool> stop{false};
+    std::thread reader([&] {
+        while (!stop.load()) {
+            isa::RefPtr<Tracked> copy(slot);
+            EXPECT_NE(nullptr, copy.Get());
+        }
+    });
+    for (int i = 0; i < 2000; ++i) {
+        slot = isa::RefPtr<Tracked>(new Tracked);
+    }
+    stop = true;
+    reader.join();
+    EXPECT_EQ(2000, Tracked::deletes.load());
 }
 
 struct Counted {
@@ -120,42 +323,30 @@ int Counted::alive = 0;
 
 struct Derived : Counted {};
 
-TEST(RefPtr, LastOwnerDeletes) {
+TEST(RefPtr, LastOwnerDeletesAndAssignmentReleasesTheOldObject) {
     {
         isa::RefPtr<Counted> a(new Counted);
+        isa::RefPtr<Counted> b(new Counted);
+        isa::RefPtr<Counted>& alias = a;
+        a = alias;
+        EXPECT_EQ(2, Counted::alive);
         {
-            isa::RefPtr<Counted> b(a);
-            isa::RefPtr<Counted> c;
+            isa::RefPtr<Counted> c(a);
             c = b;
-            EXPECT_EQ(a.Get(), c.Get());
+            EXPECT_EQ(b.Get(), c.Get());
+            a = c;
+            EXPECT_EQ(1, Counted::alive);
         }
+        isa::RefPtr<Counted> fromDerived = isa::RefPtr<Derived>(new Derived);
+        EXPECT_EQ(2, Counted::alive);
+        fromDerived.Detach();
+        EXPECT_EQ(nullptr, fromDerived.Get());
         EXPECT_EQ(1, Counted::alive);
+        isa::RefPtr<Counted> null(nullptr);
+        isa::RefPtr<Counted> nullCopy(null);
+        EXPECT_EQ(nullptr, static_cast<Counted*>(nullCopy));
     }
     EXPECT_EQ(0, Counted::alive);
-}
-
-TEST(RefPtr, SelfAssignmentKeepsTheObject) {
-    isa::RefPtr<Counted> a(new Counted);
-    isa::RefPtr<Counted>& alias = a;
-    a = alias;
-    EXPECT_EQ(1, Counted::alive);
-    EXPECT_NE(nullptr, a.Get());
-    a.Detach();
-    EXPECT_EQ(0, Counted::alive);
-    EXPECT_EQ(nullptr, a.Get());
-}
-
-TEST(RefPtr, AssignmentReleasesTheOldObject) {
-    isa::RefPtr<Counted> a(new Counted);
-    isa::RefPtr<Counted> b(new Counted);
-    EXPECT_EQ(2, Counted::alive);
-    a = b;
-    EXPECT_EQ(1, Counted::alive);
-    isa::RefPtr<Counted> fromDerived = isa::RefPtr<Derived>(new Derived);
-    EXPECT_EQ(2, Counted::alive);
-    isa::RefPtr<Counted> null(nullptr);
-    isa::RefPtr<Counted> nullCopy(null);
-    EXPECT_EQ(nullptr, static_cast<Counted*>(nullCopy));
 }
 
 TEST(CriticalSection, IsNotRecursiveAndGuardTracksItsState) {

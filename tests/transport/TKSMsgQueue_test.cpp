@@ -6,15 +6,18 @@
 #include <chrono>
 #include <condition_variable>
 #include <cstdlib>
+#include <functional>
 #include <mutex>
 #include <optional>
 #include <stdexcept>
 #include <string>
 #include <thread>
+#include <utility>
 #include <vector>
 
 #include "ScriptedRelay.h"
 #include "platform/tkhost/tkhost_switch.h"
+#include "transport/TKSRemoteMsgQueue.h"
 
 namespace {
 
@@ -49,29 +52,27 @@ class EnvGuard {
     std::optional<std::string> remote, host;
 };
 
-// Collects what the reader routes to the callback.
+// Collects what the reader routes to the callback, whichever transport feeds it.
 class Receiver : public TKSAsyncMsgReceiver {
   public:
     int receive(TKSMsgRef& ref) {
         std::lock_guard<std::mutex> lk(m);
         types.push_back(ref.getMsgType());
-        if (ref.getMsgType() == 0xBAD) {
-            ref.free();
-            throw std::runtime_error("receiver failed");
-        }
         ref.free();
         cv.notify_all();
+        if (types.back() == 0xBAD) {
+            throw std::runtime_error("receiver failed");
+        }
         return 1;
     }
     // Waits until the marker has come through: everything sent before it has been routed.
     std::vector<unsigned int> untilMarker() {
         std::unique_lock<std::mutex> lk(m);
         cv.wait_for(lk, 5s, [this] { return !types.empty() && types.back() == kMarker; });
-        std::vector<unsigned int> out(types.begin(), types.end());
+        std::vector<unsigned int> out = std::exchange(types, {});
         if (!out.empty() && out.back() == kMarker) {
             out.pop_back();
         }
-        types.clear();
         return out;
     }
 
@@ -141,13 +142,13 @@ struct RoutingCase {
     std::vector<Answer> answers;
     int anySource;
     int replyIndex;  // which answer the request returns; -1 for a time-out
+    unsigned int trans = 0x10005;
 };
 
 class Routing : public LocalQueue, public ::testing::WithParamInterface<RoutingCase> {};
 
 TEST_P(Routing, TellsTheReplyFromTheRest) {
     const RoutingCase& c = GetParam();
-    const unsigned int trans = 0x10000 + 5;
     TKCompDesc other = peer.addr;
     other.instance ^= 0x8000;
     std::thread responder([&] {
@@ -158,13 +159,15 @@ TEST_P(Routing, TellsTheReplyFromTheRest) {
         EXPECT_TRUE(src == queue->getHostDesc()) << "the request carries the queue's address";
         tkMsgFree(req);
         for (const Answer& a : c.answers) {
-            peer.send(queue->getHostDesc(), a.fromTarget ? peer.addr : other, trans + a.transDelta,
-                      a.type);
+            peer.send(queue->getHostDesc(), a.fromTarget ? peer.addr : other,
+                      (c.trans & 0xFFFFFF) + a.transDelta, a.type);
         }
     });
-    TKSMsgRef req = makeRequest(peer.addr, trans);
+    TKSMsgRef req = makeRequest(peer.addr, c.trans);
     unsigned int timeout = c.replyIndex < 0 ? 150 : 5000;
+    auto t0 = Clock::now();
     TKSMsgRef reply = queue->request(req, timeout, kCompletion, c.anySource);
+    auto took = Clock::now() - t0;
     responder.join();
     sendMarker();
     std::vector<unsigned int> routed = receiver.untilMarker();
@@ -180,6 +183,8 @@ TEST_P(Routing, TellsTheReplyFromTheRest) {
     } else {
         ASSERT_NE(nullptr, reply.getMsgRef());
         EXPECT_EQ(c.answers[c.replyIndex].type, reply.getMsgType());
+        // The reply wakes the caller: no waiting out the time-out.
+        EXPECT_LT(took, 2500ms);
         reply.free();
     }
     EXPECT_EQ(expectRouted, routed);
@@ -197,35 +202,9 @@ INSTANTIATE_TEST_SUITE_P(
         RoutingCase{"AnySourceTakesOtherSource", {{0, kCompletion, false}}, 1, 0},
         RoutingCase{"EventBeforeReply", {{0, 0x20, true}, {0, 0x800001, true}}, 0, 1},
         RoutingCase{
-            "SecondMatchGoesToCallback", {{0, kCompletion, true}, {0, kCompletion, true}}, 0, 0}),
+            "SecondMatchGoesToCallback", {{0, kCompletion, true}, {0, kCompletion, true}}, 0, 0},
+        RoutingCase{"TransactionIdOf24Bits", {{0, kCompletion, true}}, 0, 0, 0x1000005}),
     [](const ::testing::TestParamInfo<RoutingCase>& i) { return std::string(i.param.name); });
-
-TEST_F(LocalQueue, TransactionIdIsMatchedOn24Bits) {
-    std::thread responder([&] {
-        tkMsgFree(peer.readOne());
-        peer.send(queue->getHostDesc(), peer.addr, 0x000005, kCompletion);
-    });
-    TKSMsgRef req = makeRequest(peer.addr, 0x1000005);
-    TKSMsgRef reply = queue->request(req, 5000, kCompletion, 0);
-    responder.join();
-    ASSERT_NE(nullptr, reply.getMsgRef());
-    reply.free();
-}
-
-TEST_F(LocalQueue, ReplyWakesTheCallerWithoutWaitingOutTheTimeOut) {
-    std::thread responder([&] {
-        tkMsgFree(peer.readOne());
-        peer.send(queue->getHostDesc(), peer.addr, 9, kCompletion);
-    });
-    TKSMsgRef req = makeRequest(peer.addr, 9);
-    auto t0 = Clock::now();
-    TKSMsgRef reply = queue->request(req, 5000, kCompletion, 0);
-    auto took = Clock::now() - t0;
-    responder.join();
-    ASSERT_NE(nullptr, reply.getMsgRef());
-    EXPECT_LT(took, 2500ms);
-    reply.free();
-}
 
 TEST_F(LocalQueue, ReplyAfterTheTimeOutGoesToTheCallback) {
     std::atomic<bool> gaveUp{false};
@@ -234,7 +213,6 @@ TEST_F(LocalQueue, ReplyAfterTheTimeOutGoesToTheCallback) {
         while (!gaveUp.load()) {
             std::this_thread::sleep_for(1ms);
         }
-        std::this_thread::sleep_for(1ms);
         peer.send(queue->getHostDesc(), peer.addr, 11, kCompletion);
         sendMarker();
     });
@@ -263,8 +241,7 @@ TEST_F(LocalQueue, UndeliverableRequestTimesOutWithoutLeaking) {
     TKCompDesc nowhere{};
     nowhere.board = 31;
     TKSMsgRef req = makeRequest(nowhere, 13);
-    TKSMsgRef r = queue->request(req, 30, kCompletion, 0);
-    EXPECT_EQ(nullptr, r.getMsgRef());
+    EXPECT_EQ(nullptr, queue->request(req, 30, kCompletion, 0).getMsgRef());
     EXPECT_EQ(1u, tkSwitchUndeliverableCount());
 }
 
@@ -281,53 +258,34 @@ TEST_F(LocalQueue, CallbackExceptionIsReportedAndTheQueueGoesOn) {
     EXPECT_EQ(1u, queue->callbackFailures());
 }
 
-TEST(LocalQueueLifecycle, DestructionEndsTheReaderThroughTheSelfMessage) {
+TEST(LocalQueueLifecycle, BlocksBeforeAnyCallbackWaitInThePickupSlotUntilOneIsRegistered) {
     EnvGuard env;
     unsetenv("REMOTE_TKHOST");
-    for (int i = 0; i < 20; ++i) {
-        auto q = std::make_unique<TKSMsgQueue>(TKCompDesc{}, 512, 5, nullptr);
-        TKCompDesc addr = q->getHostDesc();
-        EXPECT_TRUE(tkSwitchIsBound(addr));
-        q.reset();
-        EXPECT_FALSE(tkSwitchIsBound(addr));
+    auto q = std::make_unique<TKSMsgQueue>(TKCompDesc{}, 512, 5, nullptr);
+    const TKCompDesc addr = q->getHostDesc();
+    EXPECT_TRUE(tkSwitchIsBound(addr));
+    Peer peer;
+    for (unsigned int type : {0x31u, 0x32u, 0x33u}) {
+        peer.send(addr, peer.addr, 1, type);
     }
-}
-
-TEST(LocalQueueLifecycle, BlocksBeforeAnyCallbackWaitInThePickupSlot) {
-    EnvGuard env;
-    unsetenv("REMOTE_TKHOST");
-    TKSMsgQueue q(TKCompDesc{}, 512, 5, nullptr);
-    Peer peer;
-    peer.send(q.getHostDesc(), peer.addr, 1, 0x31);
-    peer.send(q.getHostDesc(), peer.addr, 1, 0x32);
-    TKSMsgRef first = q.pickup(5000);
-    ASSERT_NE(nullptr, first.getMsgRef());
-    EXPECT_EQ(0x31u, first.getMsgType());
-    first.free();
-    TKSMsgRef second = q.pickup(5000);
-    ASSERT_NE(nullptr, second.getMsgRef());
-    EXPECT_EQ(0x32u, second.getMsgType());
-    second.free();
-    // A third block parks the reader on the full slot; destruction must still end it.
-    peer.send(q.getHostDesc(), peer.addr, 1, 0x33);
-    peer.send(q.getHostDesc(), peer.addr, 1, 0x34);
-}
-
-TEST(LocalQueueLifecycle, CallbackRegisteredWhileTheSlotIsFullGetsWhatComesNext) {
-    EnvGuard env;
-    unsetenv("REMOTE_TKHOST");
-    TKSMsgQueue q(TKCompDesc{}, 512, 5, nullptr);
-    Peer peer;
-    // The first fills the pickup slot; the reader holds the second, waiting for room.
-    peer.send(q.getHostDesc(), peer.addr, 1, 0x31);
-    peer.send(q.getHostDesc(), peer.addr, 1, 0x32);
+    for (unsigned int type : {0x31u, 0x32u}) {
+        TKSMsgRef got = q->pickup(5000);
+        ASSERT_NE(nullptr, got.getMsgRef());
+        EXPECT_EQ(type, got.getMsgType());
+        got.free();
+    }
+    // 0x33 fills the slot; the reader holds 0x34, waiting for room, until a callback comes.
+    peer.send(addr, peer.addr, 1, 0x34);
     std::this_thread::sleep_for(50ms);
     Receiver receiver;
-    q.registerAsyncCallback(&receiver, static_cast<TKSAsyncMethod>(&Receiver::receive));
-    peer.send(q.getHostDesc(), peer.addr, 1, kMarker);
+    q->registerAsyncCallback(&receiver, static_cast<TKSAsyncMethod>(&Receiver::receive));
+    peer.send(addr, peer.addr, 1, kMarker);
     std::vector<unsigned int> got = receiver.untilMarker();
     ASSERT_FALSE(got.empty()) << "the reader stayed parked on the full slot";
-    EXPECT_EQ(0x32u, got.back());
+    EXPECT_EQ(0x34u, got.back());
+    // Destruction ends the reader through its message to itself and gives the address back.
+    q.reset();
+    EXPECT_FALSE(tkSwitchIsBound(addr));
 }
 
 TEST(LocalQueueLifecycle, OutOfDescriptorsIsACreationError) {
@@ -396,12 +354,447 @@ TEST(TransportChoice, UnreachableRelayIsACreationErrorWithTheHostName) {
     } catch (const TKSMsgQueue::CreationError& e) {
         EXPECT_EQ(where, e.getHostName());
     }
+    EXPECT_EQ(std::string(99, 'h'),
+              TKSMsgQueue::CreationError(std::string(150, 'h').c_str()).getHostName());
+    TKSRemoteService_ComFailure f(std::string(120, 'r').c_str(), 6554);
+    EXPECT_EQ(std::string(99, 'r'), f.getHostName());
+    EXPECT_EQ(6554, f.getPort());
 }
 
-TEST(TransportChoice, HostNameInTheErrorIsCutTo99Characters) {
-    std::string longName(150, 'h');
-    TKSMsgQueue::CreationError e(longName.c_str());
-    EXPECT_EQ(std::string(99, 'h'), e.getHostName());
+// --- Over a relay ---
+
+TKMsg32Bit* blockFor(TKCompDesc to, unsigned int type, unsigned int trans, unsigned int size) {
+    TKMsg32Bit* b = nullptr;
+    tkMsgAllocate(size, &b);
+    tkMsgFieldPut(b, TK_FIELD_TGT, &to);
+    b->type = type;
+    b->transTag = trans << 8;
+    for (unsigned int i = 0; i < size; ++i) {
+        tkMsgBody(b)[i] = static_cast<unsigned char>(i + 1);
+    }
+    return b;
 }
+
+TKSMsgQueue* openQueue(const ScriptedRelay& relay) {
+    TKCompDesc want{};
+    want.node = 1;
+    want.board = 2;
+    want.processor = 3;
+    want.component = 4;
+    want.instance = 0x0506;
+    return new TKSMsgQueue(want, 512, 5, relay.address().c_str());
+}
+
+void discard(sock&, TKMsg32Bit* b) {
+    tkMsgFree(b);
+}
+
+TEST(RemoteQueue, OpenRequestAndReplyTravelAsFramesAndTheCloseIsAcknowledged) {
+    Bytes openBody;
+    TKMsg32Bit* seen = nullptr;
+    std::atomic<bool> closed{false};
+    ScriptedRelay relay([&](sock& conn) {
+        ASSERT_TRUE(ScriptedRelay::acceptOpen(conn, &openBody));
+        msg_t request;
+        ASSERT_EQ(0, conn.get_msg(request));
+        seen = tksBlockFromFrame(request);
+        free_msg(request);
+        ASSERT_NE(nullptr, seen);
+        // The reply: same transaction id, completion type, from the target, 2 body bytes.
+        TKCompDesc target{};
+        tkMsgFieldGet(seen, TK_FIELD_TGT, &target);
+        TKMsg32Bit* reply = blockFor(ScriptedRelay::assignedAddress(), kCompletion, 0x2345, 2);
+        tkMsgFieldPut(reply, TK_FIELD_SRC, &target);
+        ScriptedRelay::sendBlock(conn, reply);
+        ScriptedRelay::serve(conn, discard);
+        closed = true;
+    });
+    std::unique_ptr<TKSMsgQueue> q(openQueue(relay));
+    EXPECT_TRUE(q->getHostDesc() == ScriptedRelay::assignedAddress());
+    TKCompDesc target{};
+    target.board = 1;
+    target.processor = 1;
+    target.instance = 5;
+    TKSMsgRef req(blockFor(target, kCommand, 0x2345, 3));
+    req.getMsgRef()->transTag |= 0x5A;
+    TKSMsgRef reply = q->request(req, 5000, kCompletion, 0);
+    ASSERT_NE(nullptr, reply.getMsgRef());
+    EXPECT_EQ(2u, reply.getSize());
+    EXPECT_EQ(2, tkMsgBody(reply.getMsgRef())[1]);
+    reply.free();
+    auto t0 = Clock::now();
+    q.reset();
+    // The close was acknowledged: no 5 s wait.
+    EXPECT_LT(Clock::now() - t0, 4s);
+    relay.join();
+    EXPECT_TRUE(closed.load());
+    EXPECT_TRUE(golden::SameBytes(openBody, {0, 0, 0, 1, 0, 0, 0, 2, 0, 0, 0, 3, 0, 0,
+                                             0, 4, 0, 0, 5, 6, 0, 0, 2, 0, 0, 0, 0, 5}));
+    ASSERT_NE(nullptr, seen);
+    // The request goes out from the assigned address, with its tag byte and its body.
+    TKCompDesc src{};
+    tkMsgFieldGet(seen, TK_FIELD_SRC, &src);
+    EXPECT_TRUE(src == ScriptedRelay::assignedAddress());
+    EXPECT_EQ(0x23455Au, seen->transTag);
+    EXPECT_EQ(3u, seen->size);
+    EXPECT_EQ(3, tkMsgBody(seen)[2]);
+    tkMsgFree(seen);
+}
+
+// What the relay sends after the open, then a good event: the good one must arrive.
+struct HostileCase {
+    const char* name;
+    Bytes junk;
+    bool errorLine;
+};
+
+Bytes frame(std::uint32_t type, std::uint32_t size, std::uint32_t exSize, Bytes rest) {
+    Bytes b = frameHeader(type, size, exSize);
+    b.insert(b.end(), rest.begin(), rest.end());
+    return b;
+}
+
+Bytes countTooLarge() {
+    Bytes words(52, 0);
+    golden::u32(words, 100000);  // body size word far above the bytes that follow
+    words.insert(words.end(), {9, 9});
+    return frame(TKS_FRAME_MESSAGE, 56, 2, words);
+}
+
+class RemoteHostile : public ::testing::TestWithParam<HostileCase> {};
+
+TEST_P(RemoteHostile, BadFrameIsDroppedAndTheNextOneArrives) {
+    const HostileCase& c = GetParam();
+    std::atomic<bool> registered{false};
+    ScriptedRelay relay([&](sock& conn) {
+        ASSERT_TRUE(ScriptedRelay::acceptOpen(conn));
+        // Until the callback is registered, blocks would wait in the pickup slot instead.
+        while (!registered.load()) {
+            std::this_thread::sleep_for(1ms);
+        }
+        ScriptedRelay::sendRaw(conn, c.junk);
+        ScriptedRelay::sendBlock(conn, blockFor(ScriptedRelay::assignedAddress(), kMarker, 1, 4));
+        ScriptedRelay::serve(conn, discard);
+    });
+    testing::internal::CaptureStderr();
+    Receiver inbox;
+    {
+        std::unique_ptr<TKSMsgQueue> q(openQueue(relay));
+        q->registerAsyncCallback(&inbox, static_cast<TKSAsyncMethod>(&Receiver::receive));
+        registered = true;
+        EXPECT_EQ(std::vector<unsigned int>{}, inbox.untilMarker());
+        EXPECT_FALSE(q->transportFailed());
+    }
+    relay.join();
+    std::string err = testing::internal::GetCapturedStderr();
+    const char* expected =
+        c.errorLine ? "Error communicating with remote message queue on " : "Discarding";
+    EXPECT_NE(std::string::npos, err.find(expected)) << err;
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Frames, RemoteHostile,
+    ::testing::Values(
+        HostileCase{"Oversize", frame(TKS_FRAME_MESSAGE, 102401, 0, Bytes(102401, 0x42)), true},
+        HostileCase{"UnknownType", frame(4242, 4, 0, {1, 2, 3, 4}), false},
+        HostileCase{"ShortMessageHeader", frame(TKS_FRAME_MESSAGE, 8, 0, Bytes(8, 0)), false},
+        HostileCase{"CountLargerThanMessage", countTooLarge(), false}),
+    [](const ::testing::TestParamInfo<HostileCase>& i) { return std::string(i.param.name); });
+
+struct RelayEvents {
+    std::mutex m;
+    std::vector<std::string> seen;
+    static RelayEvents& get() {
+        static RelayEvents* events = [] {
+            auto* e = new RelayEvents;
+            TKSMsgQueue::addRelayListener([e](bool cut, const std::string& relay) {
+                std::lock_guard<std::mutex> lk(e->m);
+                e->seen.push_back((cut ? "cut off from " : "back to ") + relay);
+            });
+            return e;
+        }();
+        return *events;
+    }
+    std::vector<std::string> take() {
+        std::lock_guard<std::mutex> lk(m);
+        return std::exchange(seen, {});
+    }
+};
+
+bool waitUntil(const std::function<bool()>& done, std::chrono::milliseconds limit) {
+    auto deadline = Clock::now() + limit;
+    while (!done()) {
+        if (Clock::now() > deadline) {
+            return false;
+        }
+        std::this_thread::sleep_for(2ms);
+    }
+    return true;
+}
+
+TKCompDesc secondAddress() {
+    TKCompDesc d = ScriptedRelay::assignedAddress();
+    d.instance = 0x4322;
+    return d;
+}
+
+// The relay breaks the first connection in the middle of a frame, and answers the second
+// connection's open only when the test lets it: meanwhile the queue is cut off.
+TEST(RemoteReconnect, LostConnectionComesBackWithItsNewAddressAndRequestsFailAtOnceMeanwhile) {
+    RelayEvents::get().take();
+    std::mutex m;
+    std::condition_variable cv;
+    bool answerOpen = false;
+    ScriptedRelay relay(
+        [&](sock& conn, int index) {
+            if (index == 0) {
+                ASSERT_TRUE(ScriptedRelay::acceptOpen(conn));
+                ScriptedRelay::sendRaw(conn, frame(TKS_FRAME_MESSAGE, 56, 10, Bytes(30, 0)));
+                return;
+            }
+            {
+                std::unique_lock<std::mutex> lk(m);
+                cv.wait_for(lk, 10s, [&] { return answerOpen; });
+            }
+            ASSERT_TRUE(ScriptedRelay::acceptOpen(conn, nullptr, secondAddress()));
+            ScriptedRelay::serve(conn, [](sock& c, TKMsg32Bit* b) {
+                // The answer goes back to whoever asked, from whom it asked.
+                TKCompDesc from{};
+                TKCompDesc to{};
+                tkMsgFieldGet(b, TK_FIELD_TGT, &from);
+                tkMsgFieldGet(b, TK_FIELD_SRC, &to);
+                TKMsg32Bit* reply = blockFor(to, b->type + 1, b->transTag >> 8, 0);
+                tkMsgFieldPut(reply, TK_FIELD_SRC, &from);
+                tkMsgFree(b);
+                ScriptedRelay::sendBlock(c, reply);
+            });
+        },
+        2);
+    testing::internal::CaptureStderr();
+    std::unique_ptr<TKSMsgQueue> q(openQueue(relay));
+    ASSERT_TRUE(waitUntil([&] { return q->transportFailed(); }, 5s));
+
+    TKCompDesc target{};
+    target.board = 1;
+    for (unsigned int type : {kCommand, 0x1216u}) {
+        // Awaiting a completion or not, nothing is sent and nobody waits.
+        TKSMsgRef cutOff(blockFor(target, type, 77, 0));
+        auto t0 = Clock::now();
+        EXPECT_EQ(nullptr,
+                  q->request(cutOff, 5000, type == kCommand ? kCompletion : 0, 0).getMsgRef());
+        EXPECT_LT(Clock::now() - t0, 100ms);
+    }
+    {
+        std::lock_guard<std::mutex> lk(m);
+        answerOpen = true;
+    }
+    cv.notify_all();
+    ASSERT_TRUE(waitUntil([&] { return !q->transportFailed(); }, 10s));
+    EXPECT_TRUE(q->getHostDesc() == secondAddress());
+    TKSMsgRef again(blockFor(target, kCommand, 79, 0));
+    TKSMsgRef reply = q->request(again, 5000, kCompletion, 0);
+    ASSERT_NE(nullptr, reply.getMsgRef());
+    EXPECT_EQ(kCompletion, reply.getMsgType());
+    reply.free();
+    q.reset();
+    relay.join();
+
+    std::string err = testing::internal::GetCapturedStderr();
+    const std::string name = "relay connection to " + relay.address();
+    EXPECT_NE(std::string::npos, err.find(name + " lost at ")) << err;
+    EXPECT_NE(std::string::npos, err.find(name + " back at ")) << err;
+    EXPECT_NE(std::string::npos,
+              err.find("request of type 0x1214 not sent: the " + name + " is lost"))
+        << err;
+    EXPECT_NE(std::string::npos, err.find("request of type 0x1216 not sent")) << err;
+    EXPECT_EQ(
+        std::vector<std::string>({"cut off from " + relay.address(), "back to " + relay.address()}),
+        RelayEvents::get().take());
+}
+
+TEST(RemoteReconnect, RequestWaitingWhenTheConnectionBreaksEndsAtOnce) {
+    ScriptedRelay relay(
+        [](sock& conn, int index) {
+            ASSERT_TRUE(ScriptedRelay::acceptOpen(conn));
+            if (index == 0) {
+                msg_t request;
+                conn.get_msg(request);
+                free_msg(request);
+                return;
+            }
+            ScriptedRelay::serve(conn, discard);
+        },
+        2);
+    testing::internal::CaptureStderr();
+    std::unique_ptr<TKSMsgQueue> q(openQueue(relay));
+    TKCompDesc target{};
+    target.board = 1;
+    TKSMsgRef req(blockFor(target, kCommand, 80, 0));
+    auto t0 = Clock::now();
+    EXPECT_EQ(nullptr, q->request(req, 5000, kCompletion, 0).getMsgRef());
+    EXPECT_LT(Clock::now() - t0, 1s);
+    ASSERT_TRUE(waitUntil([&] { return !q->transportFailed(); }, 10s));
+    q.reset();
+    relay.join();
+    std::string err = testing::internal::GetCapturedStderr();
+    EXPECT_NE(std::string::npos, err.find("request of type 0x1214 ended without its answer"))
+        << err;
+}
+
+// Answers to the open that refuse it, stop short, or announce more than an address can be. The
+// relay keeps the connection open well past the open's limit, so only the client's own limit can
+// end the wait; an announced size that no address has is refused without waiting for its bytes.
+struct BadOpenCase {
+    const char* name;
+    Bytes answer;
+    bool hangUp;  // the relay ends the connection after its answer
+    std::chrono::milliseconds within;
+    const char* reason;
+};
+
+class RemoteBadOpen : public ::testing::TestWithParam<BadOpenCase> {};
+
+TEST_P(RemoteBadOpen, IsACreationErrorWithinTheOpensLimit) {
+    const BadOpenCase& c = GetParam();
+    std::mutex m;
+    std::condition_variable cv;
+    bool done = false;
+    ScriptedRelay relay([&](sock& conn) {
+        msg_t open;
+        ASSERT_EQ(0, conn.get_msg(open));
+        free_msg(open);
+        ScriptedRelay::sendRaw(conn, c.answer);
+        std::unique_lock<std::mutex> lk(m);
+        cv.wait_for(lk, 9s, [&] { return done || c.hangUp; });
+    });
+    auto t0 = Clock::now();
+    std::string reason = "no CreationError";
+    try {
+        delete openQueue(relay);
+    } catch (const TKSMsgQueue::CreationError& e) {
+        reason = e.getReason();
+        EXPECT_EQ(relay.address(), e.getHostName());
+        EXPECT_EQ(std::to_string(e.getPort()), relay.address().substr(10));
+    }
+    auto took = Clock::now() - t0;
+    {
+        std::lock_guard<std::mutex> lk(m);
+        done = true;
+    }
+    cv.notify_all();
+    relay.join();
+    EXPECT_LT(took, c.within) << std::chrono::duration_cast<std::chrono::milliseconds>(took).count()
+                              << " ms";
+    EXPECT_NE(std::string::npos, reason.find(c.reason)) << reason;
+}
+
+Bytes firstHalfOfTheHeader() {
+    Bytes b = frameHeader(TKS_FRAME_ASSIGNED, TKS_ASSIGNED_BODY_BYTES, 0);
+    b.resize(10);
+    return b;
+}
+
+// The open's limit is 5 s; a loaded machine gets 1.5 s more.
+INSTANTIATE_TEST_SUITE_P(
+    Answers, RemoteBadOpen,
+    ::testing::Values(
+        BadOpenCase{"Refused", frameHeader(TKS_FRAME_CLOSE_ACK, 0, 0), true, 6500ms, ""},
+        BadOpenCase{"ClosedUnanswered", {}, true, 6500ms, ""},
+        BadOpenCase{"HalfAHeader", firstHalfOfTheHeader(), false, 6500ms,
+                    "incomplete answer to the open within 5 s (10 of 40 bytes)"},
+        BadOpenCase{"HeaderWithoutItsBody",
+                    frameHeader(TKS_FRAME_ASSIGNED, TKS_ASSIGNED_BODY_BYTES, 0), false, 6500ms,
+                    "incomplete answer to the open within 5 s (20 of 40 bytes)"},
+        BadOpenCase{"AbsurdSize", frameHeader(TKS_FRAME_ASSIGNED, 0xFFFFFFFFu, 0), false, 1000ms,
+                    "an address of 4294967295 bytes, not 20"}),
+    [](const ::testing::TestParamInfo<BadOpenCase>& i) { return std::string(i.param.name); });
+
+TEST(RemoteTransport, OversizeBlockIsNotSentAndStaysWithTheCaller) {
+    ScriptedRelay relay([](sock& conn) {
+        ASSERT_TRUE(ScriptedRelay::acceptOpen(conn));
+        ScriptedRelay::serve(conn, [](sock&, TKMsg32Bit* b) {
+            ADD_FAILURE() << "an oversize block reached the relay";
+            tkMsgFree(b);
+        });
+    });
+    {
+        TKSRemoteMsgQueue t(TKCompDesc{}, 512, 5, relay.address().c_str());
+        TKMsg32Bit* big = blockFor(TKCompDesc{}, 1, 1, 102401);
+        EXPECT_EQ(2, t.msgWrite(big));
+        EXPECT_EQ(1u, big->type);  // still the caller's
+        tkMsgFree(big);
+        // Used on its own, the transport runs the close exchange itself.
+    }
+    relay.join();
+}
+
+// Once the close is sent, the relay may end the connection after its acknowledgement, in place
+// of it, or may have vanished before. Each is the end of the exchange: no error line, and no 5 s
+// wait for an acknowledgement that cannot come any more.
+struct CloseCase {
+    const char* name;
+    bool readsTheClose;
+    bool acknowledge;
+};
+
+class RemoteClose : public ::testing::TestWithParam<CloseCase> {};
+
+TEST_P(RemoteClose, RelayEndingTheConnectionIsNoErrorAndEndsTheWait) {
+    const CloseCase& c = GetParam();
+    ScriptedRelay relay([c](sock& conn) {
+        ASSERT_TRUE(ScriptedRelay::acceptOpen(conn));
+        if (!c.readsTheClose) {
+            return;
+        }
+        msg_t m;
+        ASSERT_EQ(0, conn.get_msg(m));
+        EXPECT_EQ(TKS_FRAME_CLOSE, m.type);
+        free_msg(m);
+        if (c.acknowledge) {
+            ScriptedRelay::sendEmpty(conn, TKS_FRAME_CLOSE_ACK);
+        }
+        // The connection ends as the script returns.
+    });
+    testing::internal::CaptureStderr();
+    if (!c.readsTheClose) {
+        std::unique_ptr<TKSMsgQueue> q(openQueue(relay));
+        relay.join();
+        auto t0 = Clock::now();
+        q.reset();
+        EXPECT_LT(Clock::now() - t0, 4s);
+        testing::internal::GetCapturedStderr();
+        return;
+    }
+    std::vector<int> results;
+    {
+        TKSRemoteMsgQueue t(TKCompDesc{}, 512, 5, relay.address().c_str());
+        std::thread reader([&] {
+            for (int i = 0; i < (c.acknowledge ? 2 : 1); ++i) {
+                TKMsg32Bit* b = nullptr;
+                results.push_back(t.msgRead(&b));
+                EXPECT_EQ(nullptr, b);
+            }
+        });
+        auto t0 = Clock::now();
+        t.closeExchange();
+        EXPECT_LT(Clock::now() - t0, 4s);
+        relay.join();
+        // Time for a reader that took the ended connection for a fault to say so.
+        std::this_thread::sleep_for(20ms);
+        t.sendLastMessage();
+        reader.join();
+    }
+    std::string err = testing::internal::GetCapturedStderr();
+    EXPECT_EQ(std::string::npos, err.find("Error communicating")) << err;
+    EXPECT_EQ(std::vector<int>(c.acknowledge ? 2 : 1, 2), results);
+}
+
+INSTANTIATE_TEST_SUITE_P(Relay, RemoteClose,
+                         ::testing::Values(CloseCase{"AcknowledgesThenCloses", true, true},
+                                           CloseCase{"ClosesWithoutAcknowledging", true, false},
+                                           CloseCase{"VanishedBeforeTheClose", false, false}),
+                         [](const ::testing::TestParamInfo<CloseCase>& i) {
+                             return std::string(i.param.name);
+                         });
 
 }  // namespace

@@ -7,6 +7,8 @@
 #include <iostream>
 #include <string>
 
+#include "transport/TKSCommon.h"
+
 namespace {
 
 TEST(TKSSockText, StnReadsDecimalAndHex) {
@@ -92,6 +94,13 @@ TEST(TKSSockHost, RefusedConnectionFails) {
     sock s(("127.0.0.1:" + std::to_string(port)).c_str(), 6554);
     EXPECT_NE(0, s.connect());
     EXPECT_TRUE(s.isFailed());
+}
+
+TEST(TKSCommonDeathTest, SleepChecksItsLimitAndHostInitSucceeds) {
+    tks_sleep_ms(1);
+    EXPECT_DEATH(tks_sleep_ms(1001), "miliseconds <= 1000");
+    EXPECT_EQ(0, TKSHostInit());
+    TKSHostCleanup();
 }
 
 }  // namespace

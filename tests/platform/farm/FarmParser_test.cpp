@@ -3,7 +3,6 @@
 #include <gtest/gtest.h>
 
 #include <fstream>
-#include <set>
 #include <string>
 
 namespace farm {
@@ -144,7 +143,9 @@ INSTANTIATE_TEST_SUITE_P(
         BadFarm{"TooManyVoiceChannels",
                 kHead + "routing = \"flexible\"\n" +
                     trunks(34, "[[board.trunk]]\nchannels = 31\ntype = 1\nsignaling = \"CCS\"\n"),
-                "2:1: a flexible-routing board serves at most 1024 channels, this one has 1054"}),
+                "2:1: a flexible-routing board serves at most 1024 channels, this one has 1054"},
+        BadFarm{"ControlCharacters", kHead + "routing = \"a\\nb\"\n",
+                "6:11: routing must be \"fixed\" or \"flexible\", not \"a?b\""}),
     [](const ::testing::TestParamInfo<BadFarm>& info) { return std::string(info.param.label); });
 
 TEST(FarmParser, ReadsEveryFieldOfABoard) {
@@ -181,105 +182,34 @@ TEST(FarmParser, ReadsEveryFieldOfABoard) {
     EXPECT_EQ(f->numbers.size(), 24u);
 }
 
-TEST(FarmParser, FlexibleBoardWithoutMediaHasAllSeven) {
+TEST(FarmParser, AcceptsNoBoardsSixtyFourTrunksAndGivesAFlexibleBoardAllSevenMedia) {
     std::string error;
-    auto f = parseFarm(kHead + "routing = \"flexible\"\n", "t.toml", error);
-    ASSERT_TRUE(f) << error;
-    EXPECT_EQ(f->boards[0].media.size(), 7u);
-    EXPECT_EQ(f->boards[0].media.front(), Media::SigDet);
-    EXPECT_EQ(f->boards[0].media.back(), Media::CallerId);
-}
-
-TEST(FarmParser, AFarmMayHaveNoBoards) {
-    std::string error;
-    auto f = parseFarm("system_name = \"empty\"\n", "t.toml", error);
-    ASSERT_TRUE(f) << error;
-    EXPECT_TRUE(f->boards.empty());
-}
-
-TEST(FarmParser, SixtyFourTrunksAreAllowed) {
-    std::string error;
+    auto none = parseFarm("system_name = \"empty\"\n", "t.toml", error);
+    ASSERT_TRUE(none) << error;
+    EXPECT_TRUE(none->boards.empty());
     auto f = parseFarm(kHead + trunks(64, kCasTrunk), "t.toml", error);
     ASSERT_TRUE(f) << error;
     EXPECT_EQ(f->boards[0].trunks.size(), 64u);
     EXPECT_EQ(f->boards[0].trunks.back().number, 64);
+    auto flexible = parseFarm(kHead + "routing = \"flexible\"\n", "t.toml", error);
+    ASSERT_TRUE(flexible) << error;
+    EXPECT_EQ(flexible->boards[0].media.size(), 7u);
+    EXPECT_EQ(flexible->boards[0].media.front(), Media::SigDet);
+    EXPECT_EQ(flexible->boards[0].media.back(), Media::CallerId);
 }
 
-TEST(FarmParser, MissingFileIsOneLine) {
+TEST(FarmParser, FileThatCannotBeReadOrParsedIsOneLineNamingItsPath) {
     std::string error;
     EXPECT_FALSE(loadFarmFile(kFarms + "/no-such-farm.toml", error));
     EXPECT_EQ(error,
               kFarms + "/no-such-farm.toml: cannot read the farm file: No such file or directory");
-}
-
-TEST(FarmParser, DirectoryIsNotAFarm) {
-    std::string error;
     EXPECT_FALSE(loadFarmFile(kFarms, error));
     EXPECT_EQ(error, kFarms + ": cannot read the farm file: not a regular file");
-}
-
-TEST(FarmParser, BrokenFileNamesItsPath) {
     std::string path = ::testing::TempDir() + "broken_farm.toml";
     std::ofstream(path) << "system_name = \"s\"\n\n[[board]]\nlogical_id = 40\n";
-    std::string error;
     EXPECT_FALSE(loadFarmFile(path, error));
     EXPECT_EQ(error, path + ":4:14: logical_id must be 0 to 32, not 40");
 }
-
-TEST(FarmParser, ControlCharactersDoNotBreakTheLine) {
-    std::string error;
-    EXPECT_FALSE(parseFarm(kHead + "routing = \"a\\nb\"\n", "t.toml", error));
-    EXPECT_EQ(error, "t.toml:6:11: routing must be \"fixed\" or \"flexible\", not \"a?b\"");
-}
-
-struct FarmFile {
-    const char* file;
-    const char* systemName;
-    std::set<unsigned> boards;
-    std::size_t trunks;  // over all boards
-    std::size_t numbers;
-};
-
-class FarmFiles : public ::testing::TestWithParam<FarmFile> {};
-
-TEST_P(FarmFiles, LoadWithTheirBoards) {
-    const FarmFile& p = GetParam();
-    std::string error;
-    auto f = loadFarmFile(kFarms + "/" + p.file, error);
-    ASSERT_TRUE(f) << error;
-    EXPECT_EQ(f->systemName, p.systemName);
-    std::set<unsigned> ids;
-    std::size_t trunks = 0;
-    for (const auto& b : f->boards) {
-        ids.insert(b.logicalId);
-        trunks += b.trunks.size();
-    }
-    EXPECT_EQ(ids, p.boards);
-    EXPECT_EQ(trunks, p.trunks);
-    EXPECT_EQ(f->numbers.size(), p.numbers);
-}
-
-INSTANTIATE_TEST_SUITE_P(
-    Shipped, FarmFiles,
-    ::testing::Values(FarmFile{"default.toml", "vx7-demo", {1, 2, 3}, 5, 24 + 24 + 23 + 4 + 4},
-                      FarmFile{"gaps.toml", "vx7-gaps", {0, 3, 32}, 3, 0},
-                      FarmFile{"no_trunks.toml", "vx7-bare", {4, 5}, 1, 24},
-                      FarmFile{"flexible.toml", "vx7-flex", {7, 8}, 3, 5},
-                      FarmFile{"big33.toml", "vx7-big33",
-                               [] {
-                                   std::set<unsigned> s;
-                                   for (unsigned i = 0; i <= 32; ++i) {
-                                       s.insert(i);
-                                   }
-                                   return s;
-                               }(),
-                               33 * 4, 33 * 4 * 30}),
-    [](const ::testing::TestParamInfo<FarmFile>& info) {
-        std::string name = info.param.file;
-        name = name.substr(0, name.find('.'));
-        std::erase(name, '_');
-        return name;
-    });
 
 }  // namespace
 }  // namespace farm

@@ -96,11 +96,8 @@ class DeviceMap : public ::testing::Test {
     }
 };
 
-TEST_F(DeviceMap, HostIsNamedAfterTheFarm) {
+TEST_F(DeviceMap, SystemViewFindsExactlyTheFarmsBoardsUnderAHostNamedAfterIt) {
     EXPECT_EQ(text(host(), "NAME"), "vx7-demo");
-}
-
-TEST_F(DeviceMap, SystemViewFindsExactlyTheFarmsBoards) {
     std::map<unsigned, UM_AUID> boards;
     for (unsigned id = 0; id <= 32; ++id) {
         int status = -1;
@@ -128,9 +125,7 @@ TEST_F(DeviceMap, SystemViewFindsExactlyTheFarmsBoards) {
         EXPECT_EQ(number(b, "LOGICAL ID"), e.id);
         EXPECT_EQ(text(b, "CTPLATFORM"), "VX7");
     }
-}
-
-TEST_F(DeviceMap, PlatformMustMatchWholly) {
+    // The platform must match wholly.
     char platform[5] = "VX70";
     unsigned logical = 1;
     um_attribute search[2];
@@ -142,7 +137,7 @@ TEST_F(DeviceMap, PlatformMustMatchWholly) {
     EXPECT_EQ(count, 0u);
 }
 
-TEST_F(DeviceMap, LineAUsCarryChannelCountAndTheirLconAddress) {
+TEST_F(DeviceMap, LineAUsCarryChannelCountAndTheirLconAddressAndSearchStopsAtTheRoomGiven) {
     UM_AUID board = findBoard(1).at(0);
     auto lines = findType(board, 503, 64);
     ASSERT_EQ(lines.size(), 2u);
@@ -159,26 +154,10 @@ TEST_F(DeviceMap, LineAUsCarryChannelCountAndTheirLconAddress) {
         EXPECT_EQ(a[1].status, 0u);
     }
     EXPECT_TRUE(findType(board, 501, 256, 5).empty());  // fixed routing: no voice resources
-}
-
-TEST_F(DeviceMap, AnalogLinesHaveFourChannels) {
-    UM_AUID board = findBoard(3).at(0);
-    auto lines = findType(board, 503, 64);
-    ASSERT_EQ(lines.size(), 2u);
-    EXPECT_EQ(number(lines[0], "ChannelCount"), 4u);
-    EXPECT_EQ(number(lines[1], "ChannelCount"), 4u);
-}
-
-TEST_F(DeviceMap, SearchStopsAtTheRoomGiven) {
-    UM_AUID board = findBoard(1).at(0);
-    auto lines = findType(board, 503, 1);
-    ASSERT_EQ(lines.size(), 1u);
-    EXPECT_EQ(number(lines[0], "ChannelCount"), 24u);
-    Bytes admin{};
-    um_attribute a;
-    um_initAttributeStruct(&a, "LINEADMINADDR", admin.data(), 8, 0, 0);
-    EXPECT_EQ(um_getAttributes(lines[0], 1, &a), UM_SUCCESS);
-    EXPECT_EQ(admin, addr(1, 1, 22));  // the first line, in tree order
+    EXPECT_EQ(findType(board, 503, 1), std::vector<UM_AUID>{lines[0]});  // tree order
+    for (UM_AUID line : findType(findBoard(3).at(0), 503, 64)) {
+        EXPECT_EQ(number(line, "ChannelCount"), 4u);  // analog
+    }
 }
 
 const char* const kVoiceAttributes[] = {"SIGDETADDR",    "CLUSTERADDR", "SIGBUFADDR_DTMF",
@@ -262,7 +241,7 @@ TEST_F(DeviceMap, BoardWithAllMediaAnswersWhole) {
     EXPECT_EQ(voices[1].values[6], addr(2, 9, 66));
 }
 
-TEST_F(DeviceMap, PartialAnswerMarksEachAttribute) {
+TEST_F(DeviceMap, PartialAnswerMarksEachAttributeAndAllFailingGivesTheFirstFailure) {
     UM_AUID board = findBoard(1).at(0);
     char name[256];
     unsigned bogus = 0x55555555;
@@ -278,16 +257,10 @@ TEST_F(DeviceMap, PartialAnswerMarksEachAttribute) {
     EXPECT_STREQ(name, "VX7/T1-2");
     EXPECT_EQ(bogus, 0x55555555u);
     EXPECT_EQ(trunks, 2u);
-}
-
-TEST_F(DeviceMap, AllFailingGivesTheFirstFailure) {
-    UM_AUID board = findBoard(1).at(0);
-    unsigned v = 0;
-    um_attribute a[2];
-    um_initAttributeStruct(&a[0], "TYPE", &v, 4, 0, 0);
-    um_initAttributeStruct(&a[1], "ChannelCount", &v, 4, 0, 0);
-    EXPECT_EQ(um_getAttributes(board, 2, a), UM_ERR_NO_SUCH_ATTRIBUTE);
+    um_initAttributeStruct(&a[0], "TYPE", &trunks, 4, 0, 0);
+    um_initAttributeStruct(&a[2], "ChannelCount", &trunks, 4, 0, 0);
     EXPECT_EQ(um_getAttributes(board, 1, a), UM_ERR_NO_SUCH_ATTRIBUTE);
+    EXPECT_EQ(um_getAttributes(board, 2, &a[1]), UM_ERR_NO_SUCH_ATTRIBUTE);
 }
 
 TEST_F(DeviceMap, ValuesNeedTheirRoom) {
@@ -352,41 +325,54 @@ TEST_F(DeviceMap, InitFillsTheFiveWords) {
     EXPECT_EQ(um_initAttributeStruct(nullptr, "TYPE", &value, 4, 0, 0), UM_ERR_INVALID_ARGUMENT);
 }
 
-TEST_F(DeviceMap, GapsKeepTheirNumbers) {
-    use(kFarms + "/gaps.toml");
+struct FarmShape {
+    const char* file;
+    std::vector<unsigned> boards;
+    std::vector<unsigned> trunks;  // of each board
+    unsigned lastChannels;         // of the last line of each board; 0: not checked
+};
+
+class FarmShapes : public DeviceMap, public ::testing::WithParamInterface<FarmShape> {};
+
+TEST_P(FarmShapes, EveryBoardKeepsItsNumberAndItsLines) {
+    const FarmShape& c = GetParam();
+    use(kFarms + "/" + c.file);
     std::vector<unsigned> ids;
     for (unsigned id = 0; id <= 33; ++id) {
-        if (findBoard(id).size() == 1) {
-            ids.push_back(id);
+        auto b = findBoard(id);
+        if (b.empty()) {
+            continue;
+        }
+        ids.push_back(id);
+        ASSERT_LT(ids.size(), c.trunks.size() + 1) << id;
+        const unsigned trunks = c.trunks[ids.size() - 1];
+        EXPECT_EQ(number(b[0], "NUM_TRUNKS"), trunks) << id;
+        auto lines = findType(b[0], 503, 64);
+        ASSERT_EQ(lines.size(), trunks) << id;
+        if (c.lastChannels != 0) {
+            EXPECT_EQ(number(lines.back(), "ChannelCount"), c.lastChannels);
         }
     }
-    EXPECT_EQ(ids, (std::vector<unsigned>{0, 3, 32}));
+    EXPECT_EQ(ids, c.boards);
 }
 
-TEST_F(DeviceMap, BoardWithoutTrunks) {
-    use(kFarms + "/no_trunks.toml");
-    UM_AUID board = findBoard(4).at(0);
-    EXPECT_EQ(number(board, "NUM_TRUNKS"), 0u);
-    EXPECT_TRUE(findType(board, 503, 64).empty());
-}
-
-TEST_F(DeviceMap, ThirtyThreeBoardsOfFourTrunks) {
-    use(kFarms + "/big33.toml");
+std::vector<unsigned> allIds() {
+    std::vector<unsigned> ids;
     for (unsigned id = 0; id <= 32; ++id) {
-        auto b = findBoard(id);
-        ASSERT_EQ(b.size(), 1u) << id;
-        EXPECT_EQ(number(b[0], "NUM_TRUNKS"), 4u);
-        auto lines = findType(b[0], 503, 64);
-        ASSERT_EQ(lines.size(), 4u);
-        EXPECT_EQ(number(lines[3], "ChannelCount"), 30u);
+        ids.push_back(id);
     }
+    return ids;
 }
 
-class BrokenFarm : public DeviceMap, public ::testing::WithParamInterface<const char*> {};
+INSTANTIATE_TEST_SUITE_P(Files, FarmShapes,
+                         ::testing::Values(FarmShape{"gaps.toml", {0, 3, 32}, {1, 1, 1}, 0},
+                                           FarmShape{"no_trunks.toml", {4, 5}, {0, 1}, 0},
+                                           FarmShape{"big33.toml", allIds(),
+                                                     std::vector<unsigned>(33, 4), 30}));
 
-TEST_P(BrokenFarm, MeansTheBoardServiceIsDown) {
+TEST_F(DeviceMap, BrokenFarmMeansTheBoardServiceIsDownUntilRepaired) {
     const std::string path = ::testing::TempDir() + "broken_unitmap_farm.toml";
-    std::ofstream(path) << GetParam();
+    std::ofstream(path) << "system_name = \"s\"\n[[board]]\nlogical_id = 99\n";
     use(path);
     ::testing::internal::CaptureStderr();
     UM_AUID h = 77;
@@ -406,19 +392,6 @@ TEST_P(BrokenFarm, MeansTheBoardServiceIsDown) {
     use(kFarms + "/default.toml");  // repaired: the service is back
     EXPECT_EQ(um_getHostAU(&h), UM_SUCCESS);
     EXPECT_EQ(text(h, "NAME"), "vx7-demo");
-}
-
-INSTANTIATE_TEST_SUITE_P(Files, BrokenFarm,
-                         ::testing::Values("system_name = \n", "[[board]]\nlogical_id = 1\n",
-                                           "system_name = \"s\"\n[[board]]\nlogical_id = 99\n"));
-
-TEST_F(DeviceMap, MissingFarmMeansTheBoardServiceIsDown) {
-    use(kFarms + "/missing.toml");
-    ::testing::internal::CaptureStderr();
-    UM_AUID h = 0;
-    EXPECT_EQ(um_getHostAU(&h), UM_ERR_SERVICE_DOWN);
-    EXPECT_EQ(::testing::internal::GetCapturedStderr(),
-              kFarms + "/missing.toml: cannot read the farm file: No such file or directory\n");
 }
 
 }  // namespace
