@@ -26,8 +26,13 @@ namespace {
 
 using tolk::Addressable;
 using tolk::CAS;
+using tolk::CHP;
+using tolk::Cluster;
+using tolk::ClusterMgr;
 using tolk::CompAttr_t;
+using tolk::Component;
 using tolk::LCON;
+using tolk::ResourceMgr;
 using tolk::staticList;
 using tolk::StdResource;
 using tolk::TSC;
@@ -566,57 +571,49 @@ std::function<std::unique_ptr<Addressable>(isa::RefPtr<tolk::MsgQueue>&)> maker(
 }
 
 const LookupRow kLookups[] = {
-    {"StdResourceKnowsGetParm", maker<tolk::Component>(), Space::Msg, 0x12,
-     &typeid(tolk::StdResource::MsgGetParm_t)},
-    {"StdResourceHasNoBodyFor0x1F", maker<tolk::Component>(), Space::Msg, 0x1F, nullptr},
-    {"ComponentKnowsNoEvent", maker<tolk::Component>(), Space::Evt, 0x1230, nullptr},
-    {"TSCKnowsItsOwn", maker<tolk::TSC>(), Space::Msg, 0x1214, &typeid(tolk::TSC::MsgMakeCall_t)},
-    {"TSCReplaces0x16", maker<tolk::TSC>(), Space::Msg, 0x16,
-     &typeid(tolk::TSC::MsgDetectEvtSet_t)},
-    {"TSCPassesStandardOnes", maker<tolk::TSC>(), Space::Msg, 0x00,
-     &typeid(tolk::StdResource::MsgError_t)},
-    {"TSCKnowsNothingAt0x2B", maker<tolk::TSC>(), Space::Msg, 0x2B, nullptr},
-    {"TSCHasNoBodyFor0x1208", maker<tolk::TSC>(), Space::Msg, 0x1208, nullptr},
-    {"TSCEventCallState", maker<tolk::TSC>(), Space::Evt, 0x1230,
-     &typeid(tolk::TSC::EvtCallState_t)},
-    {"TSCEventOfLCONUnknown", maker<tolk::TSC>(), Space::Evt, 0x1611, nullptr},
-    {"LCONOwnVParm", maker<tolk::LCON>(), Space::Msg, 0x2F, &typeid(tolk::LCON::Std_MsgSetVParm_t)},
-    {"LCONPassesStandardOnes", maker<tolk::LCON>(), Space::Msg, 0x12,
-     &typeid(tolk::StdResource::MsgGetParm_t)},
-    {"LCONLineStateCompletion", maker<tolk::LCON>(), Space::Msg, 0x1611,
-     &typeid(tolk::LCON::MsgSetLineStateCmplt_t)},
-    {"LCONLineStateEvent", maker<tolk::LCON>(), Space::Evt, 0x1611,
-     &typeid(tolk::LCON::Evt_0x1611_t)},
-    {"CASDialCompletion", maker<tolk::CAS>(), Space::Msg, 0x1416,
-     &typeid(tolk::CAS::MsgDialCmplt_t)},
-    {"CASDetectedSignalIsAMessage", maker<tolk::CAS>(), Space::Msg, 0x140E,
-     &typeid(tolk::CAS::EvtDetectedSignal_t)},
-    {"CASEvent0x1405", maker<tolk::CAS>(), Space::Evt, 0x1405,
-     &typeid(tolk::CAS::EventId_AllSignals_t)},
-    {"CASNoTSCNumbers", maker<tolk::CAS>(), Space::Msg, 0x1214, nullptr},
-    {"CHPKnowsNoMessageNotEvenStandard", maker<tolk::CHP>(), Space::Msg, 0x12, nullptr},
-    {"CHPKnowsNoError", maker<tolk::CHP>(), Space::Msg, 0x00, nullptr},
-    {"CHPEvent5", maker<tolk::CHP>(), Space::Evt, 5, &typeid(tolk::CHP::EvtTrace_t)},
-    {"CHPEvent6", maker<tolk::CHP>(), Space::Evt, 6, &typeid(tolk::CHP::_t)},
-    {"CHPEvent7Unknown", maker<tolk::CHP>(), Space::Evt, 7, nullptr},
-    {"ResourceMgrResult", maker<tolk::ResourceMgr>(), Space::Msg, 0x800007,
-     &typeid(tolk::ResourceMgr::ComponentResult_t)},
-    {"ResourceMgrNoStandard", maker<tolk::ResourceMgr>(), Space::Msg, 0x12, nullptr},
-    {"ClusterMgrFind", maker<tolk::ClusterMgr>(), Space::Msg, 0x800053,
-     &typeid(tolk::ClusterMgr::ClusterFind_t)},
-    {"ClusterMgrNoClusterOps", maker<tolk::ClusterMgr>(), Space::Msg, 0x80001B, nullptr},
+    {"StdResourceKnowsGetParm", maker<Component>(), Space::Msg, 0x12,
+     &typeid(StdResource::MsgGetParm_t)},
+    {"StdResourceHasNoBodyFor0x1F", maker<Component>(), Space::Msg, 0x1F, nullptr},
+    {"ComponentKnowsNoEvent", maker<Component>(), Space::Evt, 0x1230, nullptr},
+    {"TSCKnowsItsOwn", maker<TSC>(), Space::Msg, 0x1214, &typeid(TSC::MsgMakeCall_t)},
+    {"TSCReplaces0x16", maker<TSC>(), Space::Msg, 0x16, &typeid(TSC::MsgDetectEvtSet_t)},
+    {"TSCPassesStandardOnes", maker<TSC>(), Space::Msg, 0x00, &typeid(StdResource::MsgError_t)},
+    {"TSCKnowsNothingAt0x2B", maker<TSC>(), Space::Msg, 0x2B, nullptr},
+    {"TSCHasNoBodyFor0x1208", maker<TSC>(), Space::Msg, 0x1208, nullptr},
+    {"TSCEventCallState", maker<TSC>(), Space::Evt, 0x1230, &typeid(TSC::EvtCallState_t)},
+    {"TSCEventOfLCONUnknown", maker<TSC>(), Space::Evt, 0x1611, nullptr},
+    {"LCONOwnVParm", maker<LCON>(), Space::Msg, 0x2F, &typeid(LCON::Std_MsgSetVParm_t)},
+    {"LCONPassesStandardOnes", maker<LCON>(), Space::Msg, 0x12, &typeid(StdResource::MsgGetParm_t)},
+    {"LCONLineStateCompletion", maker<LCON>(), Space::Msg, 0x1611,
+     &typeid(LCON::MsgSetLineStateCmplt_t)},
+    {"LCONLineStateEvent", maker<LCON>(), Space::Evt, 0x1611, &typeid(LCON::Evt_0x1611_t)},
+    {"CASDialCompletion", maker<CAS>(), Space::Msg, 0x1416, &typeid(CAS::MsgDialCmplt_t)},
+    {"CASDetectedSignalIsAMessage", maker<CAS>(), Space::Msg, 0x140E,
+     &typeid(CAS::EvtDetectedSignal_t)},
+    {"CASEvent0x1405", maker<CAS>(), Space::Evt, 0x1405, &typeid(CAS::EventId_AllSignals_t)},
+    {"CASNoTSCNumbers", maker<CAS>(), Space::Msg, 0x1214, nullptr},
+    {"CHPKnowsNoMessageNotEvenStandard", maker<CHP>(), Space::Msg, 0x12, nullptr},
+    {"CHPKnowsNoError", maker<CHP>(), Space::Msg, 0x00, nullptr},
+    {"CHPEvent5", maker<CHP>(), Space::Evt, 5, &typeid(CHP::EvtTrace_t)},
+    {"CHPEvent6", maker<CHP>(), Space::Evt, 6, &typeid(CHP::_t)},
+    {"CHPEvent7Unknown", maker<CHP>(), Space::Evt, 7, nullptr},
+    {"ResourceMgrResult", maker<ResourceMgr>(), Space::Msg, 0x800007,
+     &typeid(ResourceMgr::ComponentResult_t)},
+    {"ResourceMgrNoStandard", maker<ResourceMgr>(), Space::Msg, 0x12, nullptr},
+    {"ClusterMgrFind", maker<ClusterMgr>(), Space::Msg, 0x800053,
+     &typeid(ClusterMgr::ClusterFind_t)},
+    {"ClusterMgrNoClusterOps", maker<ClusterMgr>(), Space::Msg, 0x80001B, nullptr},
     // A cluster knows its own and the services' answers, but not their commands.
-    {"ClusterOwn", maker<tolk::Cluster>(), Space::Msg, 0x800030,
-     &typeid(tolk::Cluster::ClusterSlotAssign_t)},
-    {"ClusterServiceResult", maker<tolk::Cluster>(), Space::Msg, 0x80002C,
-     &typeid(tolk::ClusterMgr::ClusterResult_t)},
-    {"ClusterComponentResult", maker<tolk::Cluster>(), Space::Msg, 0x800007,
-     &typeid(tolk::ClusterMgr::ComponentResult_t)},
-    {"ClusterNoEvent", maker<tolk::Cluster>(), Space::Evt, 0x1230, nullptr},
-    {"ClusterNoClusterFind", maker<tolk::Cluster>(), Space::Msg, 0x800053, nullptr},
-    {"ClusterNoCompFind", maker<tolk::Cluster>(), Space::Msg, 0x80003D, nullptr},
-    {"ClusterNoClaim", maker<tolk::Cluster>(), Space::Msg, 0x800059, nullptr},
-    {"ClusterNoStandard", maker<tolk::Cluster>(), Space::Msg, 0x12, nullptr},
+    {"ClusterOwn", maker<Cluster>(), Space::Msg, 0x800030, &typeid(Cluster::ClusterSlotAssign_t)},
+    {"ClusterServiceResult", maker<Cluster>(), Space::Msg, 0x80002C,
+     &typeid(ClusterMgr::ClusterResult_t)},
+    {"ClusterComponentResult", maker<Cluster>(), Space::Msg, 0x800007,
+     &typeid(ClusterMgr::ComponentResult_t)},
+    {"ClusterNoEvent", maker<Cluster>(), Space::Evt, 0x1230, nullptr},
+    {"ClusterNoClusterFind", maker<Cluster>(), Space::Msg, 0x800053, nullptr},
+    {"ClusterNoCompFind", maker<Cluster>(), Space::Msg, 0x80003D, nullptr},
+    {"ClusterNoClaim", maker<Cluster>(), Space::Msg, 0x800059, nullptr},
+    {"ClusterNoStandard", maker<Cluster>(), Space::Msg, 0x12, nullptr},
 };
 
 class BodyLookup : public ::testing::TestWithParam<LookupRow> {};
