@@ -441,21 +441,6 @@ TEST(Operations, TheAsynchronousCallControlWaitsOneMillisecondForARefusal) {
     EXPECT_EQ(board.sent()[0].type, 0x1211u);
 }
 
-TEST(Operations, CompletionsAreReadIntoTheCallersBody) {
-    FakeBoard board([](const Sent& s) {
-        return std::vector<Answer>{{s.type + 1, concat({u32(2), u32(0x10), {1}, u32(0x11), {0}})}};
-    });
-    auto queue = newQueue();
-    tolk::TmpInstance found(kLine, queue);
-    Quick<LCON> lcon(static_cast<const tolk::Instance&>(found));
-    auto wanted = listOf({0x10u, 0x11u});
-    LCON::MsgGetAlarmsCmplt_t answer;
-    lcon.GetAlarms(wanted, &answer);
-    ASSERT_EQ(answer.AlarmInfo.length(), 2u);
-    EXPECT_EQ(answer.AlarmInfo.element(0)->State, 1);
-    EXPECT_EQ(answer.AlarmInfo.element(1)->Type, 0x11u);
-}
-
 TEST(Operations, AResourceWithoutManagerCannotClaimAndACopyHasAManagerOfItsOwn) {
     auto queue = newQueue();
     StdResource with(kTarget, queue);
