@@ -9,7 +9,6 @@
 #include <cstring>
 #include <functional>
 #include <memory>
-#include <set>
 #include <sstream>
 #include <string>
 #include <vector>
