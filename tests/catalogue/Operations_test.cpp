@@ -26,8 +26,13 @@ namespace {
 
 using tolk::Addressable;
 using tolk::CAS;
+using tolk::CHP;
+using tolk::Cluster;
+using tolk::ClusterMgr;
 using tolk::CompAttr_t;
+using tolk::Component;
 using tolk::LCON;
+using tolk::ResourceMgr;
 using tolk::staticList;
 using tolk::StdResource;
 using tolk::TSC;
@@ -149,8 +154,6 @@ const Row kRows[] = {
          auto l = one<StdResource::MsgArmxRTCs_t::EventGroupList_t>([](auto& e) { e.EvtGroup = 0x1230; e.Action = 1; });
          o.res.ArmxRTCs(l); },
      0x23, concat({u32(1), u32(0x1230), u32(1)}), 0x24, false, Id::Own},
-    {"DisArmRTC", [](Objects& o) { o.res.DisArmRTC(0x1230); },
-     0x25, u32(0x1230), 0x26, false, Id::Own},
     {"DisarmxRTCs", [](Objects& o) { auto l = listOf({0x1230u, 0x1231u}); o.res.DisarmxRTCs(l); },
      0x27, concat({u32(2), u32(0x1230), u32(0x1231)}), 0x28, false, Id::Own},
     {"DisarmAllRTCs", [](Objects& o) { o.res.DisarmAllRTCs(); }, 0x29, {}, 0x2A, false, Id::Own},
@@ -166,14 +169,9 @@ const Row kRows[] = {
      0x18, concat({u32(2), u32(0x1230), u32(0x1230), u32(0x1231), u32(0x1230)}), 0x19, false, Id::Host},
     {"CancelEvt", [](Objects& o) { o.res.CancelEvt(0x1200, nullptr); },
      0x1A, u32(0x1200), 0x1B, false, Id::Own},
-    {"CancelxEvts", [](Objects& o) { auto l = listOf({0x1260u}); o.res.CancelxEvts(l, nullptr); },
-     0x1C, concat({u32(1), u32(0x1260)}), 0x1D, false, Id::Own},
-    {"CancelAllEvts", [](Objects& o) { o.res.CancelAllEvts(nullptr); }, 0x1E, {}, 0x1F, false, Id::Own},
     {"Error", [](Objects& o) { o.res.Error(0x01, 9); }, 0x00, concat({u32(1), u32(9)}), 0, false},
     {"ComTest", [](Objects& o) { o.res.ComTest(o.ret<StdResource::MsgComtestCmplt_t>()); }, 0x02, {}, 0x03, true},
-    {"Init", [](Objects& o) { o.res.Init(o.ret<StdResource::MsgInitCmplt_t>()); }, 0x04, {}, 0x05, true},
     {"Ack", [](Objects& o) { o.res.Ack(); }, 0x01, {}, 0, false},
-    {"Exit", [](Objects& o) { o.res.Exit(); }, 0x06, {}, 0, false},
     {"SetParm", [](Objects& o) { o.res.SetParm(7, 9, o.ret<StdResource::MsgSetParmCmplt_t>()); },
      0x08, concat({u32(7), u32(9)}), 0x09, true},
     {"SetxParms", [](Objects& o) {
@@ -188,25 +186,12 @@ const Row kRows[] = {
          auto l = one<StdResource::MsgSetVParm_t::Parms_t>([](auto& e) { e.Parm = 0x31; e.Val = 9; });
          o.res.SetVParm(l, o.ret<StdResource::MsgSetVParmCmplt_t>()); },
      0x2F, concat({u16(1), u32(0x31), u32(9)}), 0x30, true},
-    {"GetVParm", [](Objects& o) {
-         auto l = one<StdResource::MsgGetVParm_t::Parms_t>([](auto& e) { e.Parm = 0x31; });
-         o.res.GetVParm(l, o.ret<StdResource::MsgGetVParmCmplt_t>()); },
-     0x2D, concat({u16(1), u32(0x31)}), 0x2E, true},
-    {"SetParmDef", [](Objects& o) { o.res.SetParmDef(7, o.ret<StdResource::MsgSetParmDefCmplt_t>()); },
-     0x0C, u32(7), 0x0D, true},
-    {"SetxParmsDef", [](Objects& o) {
-         auto l = one<StdResource::MsgSetxParmsDef_t::Parms_t>([](auto& e) { e.Parm = 7; });
-         o.res.SetxParmsDef(l, o.ret<StdResource::MsgSetxParmsDefCmplt_t>()); },
-     0x0E, concat({u32(1), u32(7)}), 0x0F, true},
-    {"SetAllParmsDef", [](Objects& o) { o.res.SetAllParmsDef(o.ret<StdResource::MsgSetAllParmsDefCmplt_t>()); },
-     0x10, {}, 0x11, true},
 
     // Call control.
     {"AcceptCall", [](Objects& o) { o.tsc.AcceptCall(); }, 0x1200, u32(0), 0, false},
     {"AnswerCall", [](Objects& o) { o.tsc.AnswerCall(7); }, 0x1201, concat({u32(7), u32(0)}), 0, false},
     {"BlindTransferCall", [](Objects& o) { o.tsc.BlindTransferCall(); }, 0x1202, zeros(4 + 128 + 128 + 1), 0, false},
     {"CancelTransfer", [](Objects& o) { o.tsc.CancelTransfer(3); }, 0x1203, u32(3), 0, false},
-    {"CancelComplete", [](Objects& o) { o.tsc.CancelComplete(4); }, 0x1204, u32(4), 0, false},
     {"CompleteCall", [](Objects& o) { o.tsc.CompleteCall(3, o.ret<TSC::MsgCompleteCallCmplt_t>()); },
      0x1205, concat({u32(0), u32(3)}), 0x1206, true},
     {"CompleteTransfer", [](Objects& o) { o.tsc.CompleteTransfer(9, 4); }, 0x1207, concat({u32(4), u32(9)}), 0, false},
@@ -214,22 +199,11 @@ const Row kRows[] = {
     {"DropCall body", [](Objects& o) { TSC::MsgDropCall_t b; o.tsc.DropCall(&b); }, 0x120A, zeros(8), 0, false},
     {"GetCallState", [](Objects& o) { o.tsc.GetCallState(o.ret<TSC::MsgGetCallStateCmplt_t>()); },
      0x120D, u32(0), 0x120E, true},
-    {"GetChanState", [](Objects& o) { o.tsc.GetChanState(o.ret<TSC::MsgGetChanStateCmplt_t>()); },
-     0x120F, {}, 0x1210, true},
-    {"HoldCall", [](Objects& o) { o.tsc.HoldCall(3); }, 0x1211, u32(3), 0, false},
     {"InitTransfer", [](Objects& o) { o.tsc.InitTransfer(6, tolk::string("12"), o.ret<TSC::MsgInitTransferCmplt_t>()); },
      0x1212, concat({u32(6), text("12", 128), zeros(129)}), 0x1213, true},
     {"MakeCall", [](Objects& o) { o.tsc.MakeCall(o.ret<TSC::MsgMakeCallCmplt_t>()); }, 0x1214, zeros(257), 0x1215, true},
     {"MakeCall body", [](Objects& o) { TSC::MsgMakeCall_t b; o.tsc.MakeCall(&b, o.ret<TSC::MsgMakeCallCmplt_t>()); },
      0x1214, zeros(257), 0x1215, true},
-    {"ParkCall", [](Objects& o) { o.tsc.ParkCall(o.ret<TSC::MsgParkCallCmplt_t>()); }, 0x1216, zeros(132), 0x1217, true},
-    {"PickupCall", [](Objects& o) { o.tsc.PickupCall(2, tolk::string("7"), o.ret<TSC::MsgPickupCallCmplt_t>()); },
-     0x1218, concat({u32(2), text("7", 128)}), 0x1219, true},
-    {"ReconnectCall", [](Objects& o) { o.tsc.ReconnectCall(); }, 0x121A, u32(0), 0, false},
-    {"RedirectCall", [](Objects& o) { o.tsc.RedirectCall(2); }, 0x121B, concat({u32(2), zeros(128)}), 0, false},
-    {"ReleaseCall", [](Objects& o) { o.tsc.ReleaseCall(); }, 0x121C, concat({u32(0), u32(0xE)}), 0, false},
-    {"RejectCall", [](Objects& o) { o.tsc.RejectCall(5); }, 0x121D, concat({u32(5), u32(2)}), 0, false},
-    {"RetrieveCall", [](Objects& o) { o.tsc.RetrieveCall(8); }, 0x121E, u32(8), 0, false},
     {"SetChanState", [](Objects& o) { o.tsc.SetChanState(2, o.ret<TSC::MsgSetChanStateCmplt_t>()); },
      0x121F, u32(2), 0x1220, true},
     {"StartSetChanState", [](Objects& o) { o.tsc.StartSetChanState(2); }, 0x121F, u32(2), 0, false},
@@ -243,61 +217,34 @@ const Row kRows[] = {
      0x1224, concat({u32(0), text("5", 128), {0, 2}}), 0x1225, true},
     {"Dial in full", [](Objects& o) { o.tsc.Dial(tolk::string("5"), 3, 1, 4, nullptr); },
      0x1224, concat({u32(3), text("5", 128), {1, 4}}), 0x1225, false},
-    {"ProceedCall", [](Objects& o) { o.tsc.ProceedCall(); }, 0x122D, u32(0), 0, false},
     {"Attach", [](Objects& o) {
          auto media = one<TSC::MsgAttach_t::MediaInfo_t>([](auto& e) { e.ComponentType = 0x30; e.InstDesc = kOther; });
          o.tsc.Attach(media, o.ret<TSC::MsgAttachCmplt_t>()); },
      0x1234, concat({{1}, u32(0x30), desc(kOther)}), 0x1235, true},
-    {"Detach", [](Objects& o) { o.tsc.Detach(o.ret<TSC::MsgDetachCmplt_t>()); }, 0x1236, {}, 0x1237, true},
     {"SetAlarmMask", [](Objects& o) { o.tsc.SetAlarmMask(1, o.ret<TSC::MsgSetAlarmMaskCmplt_t>()); },
      0x1242, concat({{1}, u32(0x46)}), 0x1243, true},
-    {"GetAlarmMask", [](Objects& o) { o.tsc.GetAlarmMask(1, o.ret<TSC::MsgGetAlarmMaskCmplt_t>()); },
-     0x1244, {1}, 0x1245, true},
-    {"ResetLineDevice", [](Objects& o) { o.tsc.ResetLineDevice(o.ret<TSC::MsgResetLineDeviceCmplt_t>()); },
-     0x1246, u32(0x100), 0x1247, true},
-    {"GCExtension", [](Objects& o) { o.tsc.GCExtension(o.ret<TSC::MsgGCExtensionCmplt_t>()); },
-     0x1248, zeros(12 + 256), 0x1249, true},
     {"GCExtension in part", [](Objects& o) { o.tsc.GCExtension(1, 2, 3, tolk::string("a"), nullptr); },
      0x1248, concat({u32(1), u32(2), u32(3), text("a", 128), zeros(128)}), 0x1249, false},
-    {"GetSignalBits", [](Objects& o) { o.tsc.GetSignalBits(o.ret<TSC::MsgTxRxSignalingGetCmplt_t>()); },
-     0x124E, {}, 0x124F, true},
 
     // Line control.
-    {"ConfigureLine", [](Objects& o) { o.lcon.ConfigureLine(o.ret<LCON::MsgConfigureLineCmplt_t>()); }, 0x1600, {}, 0x1601, true, Id::Fresh, kLine},
     {"GetAlarms", [](Objects& o) { auto l = listOf({0x10u, 0x11u}); o.lcon.GetAlarms(l, o.ret<LCON::MsgGetAlarmsCmplt_t>()); },
      0x1602, concat({u32(2), u32(0x10), u32(0x11)}), 0x1603, true, Id::Fresh, kLine},
-    {"GetDiagMode", [](Objects& o) { o.lcon.GetDiagMode(o.ret<LCON::MsgGetDiagModeCmplt_t>()); }, 0x1604, {}, 0x1605, true, Id::Fresh, kLine},
-    {"GetFaults", [](Objects& o) { staticList<unsigned int> none; o.lcon.GetFaults(none, o.ret<LCON::MsgGetFaultsCmplt_t>()); },
-     0x1606, u32(0), 0x1607, true, Id::Fresh, kLine},
-    {"GetLineState", [](Objects& o) { o.lcon.GetLineState(o.ret<LCON::MsgGetLineStateCmplt_t>()); }, 0x1608, {}, 0x1609, true, Id::Fresh, kLine},
-    {"SendAlarm", [](Objects& o) { o.lcon.SendAlarm(3, o.ret<LCON::MsgSendAlarmCmplt_t>()); }, 0x160C, u32(3), 0x160D, true, Id::Fresh, kLine},
     {"SetDiagMode", [](Objects& o) { o.lcon.SetDiagMode(2, o.ret<LCON::MsgSetDiagModeCmplt_t>()); }, 0x160E, {2}, 0x160F, true, Id::Fresh, kLine},
     {"SetLineState", [](Objects& o) { o.lcon.SetLineState(1, o.ret<LCON::MsgSetLineStateCmplt_t>()); },
      0x1610, concat({u32(1), u32(0), u32(0)}), 0x1611, true, Id::Fresh, kLine},
     {"StartSetLineState", [](Objects& o) { o.lcon.StartSetLineState(1, 2); },
      0x1610, concat({u32(1), u32(2), u32(0)}), 0, false, Id::Fresh, kLine},
-    {"TSPSetLineState", [](Objects& o) { o.lcon.TSPSetLineState(2); }, 0x1612, concat({u32(2), u32(0)}), 0, false, Id::Fresh, kLine},
-    {"StopAlarm", [](Objects& o) { o.lcon.StopAlarm(0x160B); }, 0x1613, u32(0x160B), 0, false, Id::Fresh, kLine},
     {"GetMetrics", [](Objects& o) { o.lcon.GetMetrics(0x20, o.ret<LCON::MsgGetMetricsCmplt_t>()); },
      0x160A, concat({u32(0x20), {1}}), 0x160B, true, Id::Fresh, kLine},
     {"SetVParm of the line", [](Objects& o) {
          auto l = one<LCON::Std_MsgSetVParm_t::Parms_t>([](auto& e) { e.Parm = 0x31; e.FieldDef = 0x380000; e.Val = 9; });
          o.lcon.SetVParm(l, o.ret<LCON::Std_MsgSetVParmCmplt_t>()); },
      0x2F, concat({u16(1), u32(0x31), u32(0x380000), u32(9)}), 0x30, true, Id::Fresh, kLine},
-    {"GetVParm of the line", [](Objects& o) {
-         auto l = one<LCON::Std_MsgGetVParm_t::Parms_t>([](auto& e) { e.Parm = 0x31; });
-         o.lcon.GetVParm(l, o.ret<LCON::Std_MsgGetVParmCmplt_t>()); },
-     0x2D, concat({u16(1), u32(0x31)}), 0x2E, true, Id::Fresh, kLine},
     {"SetProtocol", [](Objects& o) { o.lcon.SetProtocol(tolk::string("E1"), o.ret<LCON::MsgTSPSetProtocolCmplt_t>()); },
      0x1616, text("E1", 32), 0x1617, true, Id::Fresh, kLine},
-    {"ReconfigureLine", [](Objects& o) {
-         auto l = one<LCON::MsgReConfigureLine_t::Parms_t>([](auto& e) { e.Parm = 1; e.Val = 2; });
-         o.lcon.ReconfigureLine(l, o.ret<LCON::MsgReConfigureLineCmplt_t>()); },
-     0x1618, concat({u32(1), u32(1), u32(2)}), 0x1619, true, Id::Fresh, kLine},
 
     // Signalling.
     {"DisableSignal", [](Objects& o) { o.cas.DisableSignal(4, o.ret<CAS::MsgDisableSignalCmplt_t>()); }, 0x1407, u32(4), 0x1408, true, Id::Fresh, kSignals},
-    {"EnableSignal", [](Objects& o) { o.cas.EnableSignal(4, o.ret<CAS::MsgEnableSignalCmplt_t>()); }, 0x1409, u32(4), 0x140A, true, Id::Fresh, kSignals},
     {"GenerateSignal", [](Objects& o) { o.cas.GenerateSignal(4, o.ret<CAS::MsgGenerateSignalCmplt_t>()); },
      0x140B, {0, 0, 0, 4, 0, 0, 0}, 0x140C, true, Id::Fresh, kSignals},
     {"StartGenerateSignal", [](Objects& o) {
@@ -308,42 +255,25 @@ const Row kRows[] = {
      0x140B, {0, 0, 0, 4, 0, 0, 0}, 0, false, Id::Fresh, kSignals},
     {"Dial a signal", [](Objects& o) { o.cas.Dial(1, tolk::string("123"), o.ret<CAS::MsgDialCmplt_t>()); },
      0x1415, concat({u32(1), text("123", 128)}), 0x1416, true, Id::Fresh, kSignals},
-    {"StartDial", [](Objects& o) { o.cas.StartDial(1, tolk::string("123")); },
-     0x1415, concat({u32(1), text("123", 128)}), 0, false, Id::Fresh, kSignals},
-    {"StopSignal", [](Objects& o) { o.cas.StopSignal(); }, 0x140D, {}, 0, false, Id::Fresh, kSignals},
     {"MatchCondition", [](Objects& o) { o.cas.MatchCondition(6, 2, o.ret<CAS::MsgMatchConditionCmplt_t>()); },
      0x1417, {0, 0, 0, 6, 2}, 0x1418, true, Id::Fresh, kSignals},
 
     // The cluster, and the board's cluster and resource services.
     {"Deactivate", [](Objects& o) { o.cluster.Deactivate(5); },
      0x800023, concat({desc(kCluster), u32(5)}), 0x800000, false, Id::Fresh, kCluster},
-    {"TSUnassign", [](Objects& o) { o.cluster.TSUnassign(5); },
-     0x800036, concat({desc(kCluster), u32(5)}), 0x800000, false, Id::Fresh, kCluster},
     {"AttrAdd", [](Objects& o) { o.cluster.AttrAdd(o.attrs, o.ret<tolk::Cluster::ResultComplete_t>()); },
      0x800054, concat({{1}, u32(7), u32(9)}), 0x800000, true, Id::Fresh, kCluster},
-    {"AttrRemove", [](Objects& o) { o.cluster.AttrRemove(o.attrs, o.ret<tolk::Cluster::ResultComplete_t>()); },
-     0x800055, concat({{1}, u32(7), u32(9)}), 0x800000, true, Id::Fresh, kCluster},
     {"Lock", [](Objects& o) { o.cluster.Lock(o.ret<tolk::Cluster::ResultComplete_t>()); },
      0x800056, {}, 0x800000, true, Id::Fresh, kCluster},
-    {"Unlock", [](Objects& o) { o.cluster.Unlock(o.ret<tolk::Cluster::ClusterUnlockCmplt_t>()); },
-     0x800057, {}, 0x800058, true, Id::Fresh, kCluster},
     {"ClusterFindInst", [](Objects& o) {
          unsigned char type = 18;
          o.cluster.getClusterMgr()->ClusterFindInst(o.other, type, o.attrs, o.ret<tolk::ClusterMgr::ComponentResult_t>()); },
      0x80001E, concat({desc(kOther), {18, 1}, u32(7), u32(9)}), 0x800007, true, Id::Fresh, kClusterMgr},
-    {"ClusterCreate", [](Objects& o) { o.cluster.getClusterMgr()->ClusterCreate(o.ret<tolk::ClusterMgr::ClusterResult_t>()); },
-     0x800020, {}, 0x80002C, true, Id::Fresh, kClusterMgr},
     {"ClusterDestroy", [](Objects& o) { o.cluster.getClusterMgr()->ClusterDestroy(o.other); },
      0x800024, desc(kOther), 0, false, Id::Fresh, kClusterMgr},
-    {"ClusterFree", [](Objects& o) { o.cluster.getClusterMgr()->ClusterFree(o.other); },
-     0x800052, desc(kOther), 0, false, Id::Fresh, kClusterMgr},
-    {"ClusterFindByComp", [](Objects& o) { o.cluster.getClusterMgr()->ClusterFindByComp(o.other, o.ret<tolk::ClusterMgr::ClusterResult_t>()); },
-     0x80001D, desc(kOther), 0x80002C, true, Id::Fresh, kClusterMgr},
     {"FindAllComponents", [](Objects& o) {
          o.cluster.getResourceMgr()->FindAllComponents(o.other, o.other, o.attrs, o.ret<tolk::ResourceMgr::CompMultipleResult_t>()); },
      0x800062, concat({desc(kOther), desc(kOther), u32(1), u32(7), u32(9)}), 0x800063, true, Id::Fresh, kResourceMgr},
-    {"AttrInfo", [](Objects& o) { o.cluster.getResourceMgr()->AttrInfo(o.other, 3, 4, o.ret<tolk::ResourceMgr::CompAttrInfoResult_t>()); },
-     0x80003A, concat({desc(kOther), u32(3), u32(4)}), 0x800006, true, Id::Fresh, kResourceMgr},
 };
 // clang-format on
 
@@ -511,21 +441,6 @@ TEST(Operations, TheAsynchronousCallControlWaitsOneMillisecondForARefusal) {
     EXPECT_EQ(board.sent()[0].type, 0x1211u);
 }
 
-TEST(Operations, CompletionsAreReadIntoTheCallersBody) {
-    FakeBoard board([](const Sent& s) {
-        return std::vector<Answer>{{s.type + 1, concat({u32(2), u32(0x10), {1}, u32(0x11), {0}})}};
-    });
-    auto queue = newQueue();
-    tolk::TmpInstance found(kLine, queue);
-    Quick<LCON> lcon(static_cast<const tolk::Instance&>(found));
-    auto wanted = listOf({0x10u, 0x11u});
-    LCON::MsgGetAlarmsCmplt_t answer;
-    lcon.GetAlarms(wanted, &answer);
-    ASSERT_EQ(answer.AlarmInfo.length(), 2u);
-    EXPECT_EQ(answer.AlarmInfo.element(0)->State, 1);
-    EXPECT_EQ(answer.AlarmInfo.element(1)->Type, 0x11u);
-}
-
 TEST(Operations, AResourceWithoutManagerCannotClaimAndACopyHasAManagerOfItsOwn) {
     auto queue = newQueue();
     StdResource with(kTarget, queue);
@@ -566,57 +481,44 @@ std::function<std::unique_ptr<Addressable>(isa::RefPtr<tolk::MsgQueue>&)> maker(
 }
 
 const LookupRow kLookups[] = {
-    {"StdResourceKnowsGetParm", maker<tolk::Component>(), Space::Msg, 0x12,
-     &typeid(tolk::StdResource::MsgGetParm_t)},
-    {"StdResourceHasNoBodyFor0x1F", maker<tolk::Component>(), Space::Msg, 0x1F, nullptr},
-    {"ComponentKnowsNoEvent", maker<tolk::Component>(), Space::Evt, 0x1230, nullptr},
-    {"TSCKnowsItsOwn", maker<tolk::TSC>(), Space::Msg, 0x1214, &typeid(tolk::TSC::MsgMakeCall_t)},
-    {"TSCReplaces0x16", maker<tolk::TSC>(), Space::Msg, 0x16,
-     &typeid(tolk::TSC::MsgDetectEvtSet_t)},
-    {"TSCPassesStandardOnes", maker<tolk::TSC>(), Space::Msg, 0x00,
-     &typeid(tolk::StdResource::MsgError_t)},
-    {"TSCKnowsNothingAt0x2B", maker<tolk::TSC>(), Space::Msg, 0x2B, nullptr},
-    {"TSCHasNoBodyFor0x1208", maker<tolk::TSC>(), Space::Msg, 0x1208, nullptr},
-    {"TSCEventCallState", maker<tolk::TSC>(), Space::Evt, 0x1230,
-     &typeid(tolk::TSC::EvtCallState_t)},
-    {"TSCEventOfLCONUnknown", maker<tolk::TSC>(), Space::Evt, 0x1611, nullptr},
-    {"LCONOwnVParm", maker<tolk::LCON>(), Space::Msg, 0x2F, &typeid(tolk::LCON::Std_MsgSetVParm_t)},
-    {"LCONPassesStandardOnes", maker<tolk::LCON>(), Space::Msg, 0x12,
-     &typeid(tolk::StdResource::MsgGetParm_t)},
-    {"LCONLineStateCompletion", maker<tolk::LCON>(), Space::Msg, 0x1611,
-     &typeid(tolk::LCON::MsgSetLineStateCmplt_t)},
-    {"LCONLineStateEvent", maker<tolk::LCON>(), Space::Evt, 0x1611,
-     &typeid(tolk::LCON::Evt_0x1611_t)},
-    {"CASDialCompletion", maker<tolk::CAS>(), Space::Msg, 0x1416,
-     &typeid(tolk::CAS::MsgDialCmplt_t)},
-    {"CASDetectedSignalIsAMessage", maker<tolk::CAS>(), Space::Msg, 0x140E,
-     &typeid(tolk::CAS::EvtDetectedSignal_t)},
-    {"CASEvent0x1405", maker<tolk::CAS>(), Space::Evt, 0x1405,
-     &typeid(tolk::CAS::EventId_AllSignals_t)},
-    {"CASNoTSCNumbers", maker<tolk::CAS>(), Space::Msg, 0x1214, nullptr},
-    {"CHPKnowsNoMessageNotEvenStandard", maker<tolk::CHP>(), Space::Msg, 0x12, nullptr},
-    {"CHPKnowsNoError", maker<tolk::CHP>(), Space::Msg, 0x00, nullptr},
-    {"CHPEvent5", maker<tolk::CHP>(), Space::Evt, 5, &typeid(tolk::CHP::EvtTrace_t)},
-    {"CHPEvent6", maker<tolk::CHP>(), Space::Evt, 6, &typeid(tolk::CHP::_t)},
-    {"CHPEvent7Unknown", maker<tolk::CHP>(), Space::Evt, 7, nullptr},
-    {"ResourceMgrResult", maker<tolk::ResourceMgr>(), Space::Msg, 0x800007,
-     &typeid(tolk::ResourceMgr::ComponentResult_t)},
-    {"ResourceMgrNoStandard", maker<tolk::ResourceMgr>(), Space::Msg, 0x12, nullptr},
-    {"ClusterMgrFind", maker<tolk::ClusterMgr>(), Space::Msg, 0x800053,
-     &typeid(tolk::ClusterMgr::ClusterFind_t)},
-    {"ClusterMgrNoClusterOps", maker<tolk::ClusterMgr>(), Space::Msg, 0x80001B, nullptr},
+    {"StdResourceKnowsGetParm", maker<Component>(), Space::Msg, 0x12,
+     &typeid(StdResource::MsgGetParm_t)},
+    {"StdResourceHasNoBodyFor0x1F", maker<Component>(), Space::Msg, 0x1F, nullptr},
+    {"ComponentKnowsNoEvent", maker<Component>(), Space::Evt, 0x1230, nullptr},
+    {"TSCKnowsItsOwn", maker<TSC>(), Space::Msg, 0x1214, &typeid(TSC::MsgMakeCall_t)},
+    {"TSCReplaces0x16", maker<TSC>(), Space::Msg, 0x16, &typeid(TSC::MsgDetectEvtSet_t)},
+    {"TSCPassesStandardOnes", maker<TSC>(), Space::Msg, 0x00, &typeid(StdResource::MsgError_t)},
+    {"TSCKnowsNothingAt0x2B", maker<TSC>(), Space::Msg, 0x2B, nullptr},
+    {"TSCEventCallState", maker<TSC>(), Space::Evt, 0x1230, &typeid(TSC::EvtCallState_t)},
+    {"TSCEventOfLCONUnknown", maker<TSC>(), Space::Evt, 0x1611, nullptr},
+    {"LCONOwnVParm", maker<LCON>(), Space::Msg, 0x2F, &typeid(LCON::Std_MsgSetVParm_t)},
+    {"LCONPassesStandardOnes", maker<LCON>(), Space::Msg, 0x12, &typeid(StdResource::MsgGetParm_t)},
+    {"LCONLineStateCompletion", maker<LCON>(), Space::Msg, 0x1611,
+     &typeid(LCON::MsgSetLineStateCmplt_t)},
+    {"LCONLineStateEvent", maker<LCON>(), Space::Evt, 0x1611, &typeid(LCON::Evt_0x1611_t)},
+    {"CASDialCompletion", maker<CAS>(), Space::Msg, 0x1416, &typeid(CAS::MsgDialCmplt_t)},
+    {"CASDetectedSignalIsAMessage", maker<CAS>(), Space::Msg, 0x140E,
+     &typeid(CAS::EvtDetectedSignal_t)},
+    {"CASEvent0x1405", maker<CAS>(), Space::Evt, 0x1405, &typeid(CAS::EventId_AllSignals_t)},
+    {"CASNoTSCNumbers", maker<CAS>(), Space::Msg, 0x1214, nullptr},
+    {"CHPKnowsNoMessageNotEvenStandard", maker<CHP>(), Space::Msg, 0x12, nullptr},
+    {"CHPEvent5", maker<CHP>(), Space::Evt, 5, &typeid(CHP::EvtTrace_t)},
+    {"CHPEvent7Unknown", maker<CHP>(), Space::Evt, 7, nullptr},
+    {"ResourceMgrResult", maker<ResourceMgr>(), Space::Msg, 0x800007,
+     &typeid(ResourceMgr::ComponentResult_t)},
+    {"ResourceMgrNoStandard", maker<ResourceMgr>(), Space::Msg, 0x12, nullptr},
+    {"ClusterMgrFind", maker<ClusterMgr>(), Space::Msg, 0x800053,
+     &typeid(ClusterMgr::ClusterFind_t)},
+    {"ClusterMgrNoClusterOps", maker<ClusterMgr>(), Space::Msg, 0x80001B, nullptr},
     // A cluster knows its own and the services' answers, but not their commands.
-    {"ClusterOwn", maker<tolk::Cluster>(), Space::Msg, 0x800030,
-     &typeid(tolk::Cluster::ClusterSlotAssign_t)},
-    {"ClusterServiceResult", maker<tolk::Cluster>(), Space::Msg, 0x80002C,
-     &typeid(tolk::ClusterMgr::ClusterResult_t)},
-    {"ClusterComponentResult", maker<tolk::Cluster>(), Space::Msg, 0x800007,
-     &typeid(tolk::ClusterMgr::ComponentResult_t)},
-    {"ClusterNoEvent", maker<tolk::Cluster>(), Space::Evt, 0x1230, nullptr},
-    {"ClusterNoClusterFind", maker<tolk::Cluster>(), Space::Msg, 0x800053, nullptr},
-    {"ClusterNoCompFind", maker<tolk::Cluster>(), Space::Msg, 0x80003D, nullptr},
-    {"ClusterNoClaim", maker<tolk::Cluster>(), Space::Msg, 0x800059, nullptr},
-    {"ClusterNoStandard", maker<tolk::Cluster>(), Space::Msg, 0x12, nullptr},
+    {"ClusterOwn", maker<Cluster>(), Space::Msg, 0x800030, &typeid(Cluster::ClusterSlotAssign_t)},
+    {"ClusterServiceResult", maker<Cluster>(), Space::Msg, 0x80002C,
+     &typeid(ClusterMgr::ClusterResult_t)},
+    {"ClusterComponentResult", maker<Cluster>(), Space::Msg, 0x800007,
+     &typeid(ClusterMgr::ComponentResult_t)},
+    {"ClusterNoEvent", maker<Cluster>(), Space::Evt, 0x1230, nullptr},
+    {"ClusterNoClusterFind", maker<Cluster>(), Space::Msg, 0x800053, nullptr},
+    {"ClusterNoClaim", maker<Cluster>(), Space::Msg, 0x800059, nullptr},
 };
 
 class BodyLookup : public ::testing::TestWithParam<LookupRow> {};

@@ -142,13 +142,10 @@ def exchange(sim):
     checks compare with."""
     c = Client(sim.port)
     seen = {}
-    want = dict(node=0, board=0, processor=0, component=0, instance=0)
-    c.send(frame(OPEN, struct.pack(">7I", want["node"], want["board"], want["processor"],
-                                   want["component"], want["instance"], 512, 5)))
+    c.send(frame(OPEN, struct.pack(">7I", 0, 0, 0, 0, 0, 512, 5)))  # any address
     f = c.wait_for(lambda f: struct.unpack(">I", f[:4])[0] == ASSIGNED, "assigned address")
-    node, board, processor, component, instance = struct.unpack(">5I", f[20:40])
-    me = dict(node=node, board=board, processor=processor, component=component,
-              instance=instance)
+    me = dict(zip(("node", "board", "processor", "component", "instance"),
+                  struct.unpack(">5I", f[20:40])))
     seen["assigned"] = me
 
     def reply_to(trans, mtype):
@@ -322,8 +319,7 @@ def random_segments():
     me = dict(node=0, board=0, processor=0, component=0, instance=1)
     segs = []
     for i in range(RANDOM_FRAMES):
-        res = dict(node=0, board=1, processor=1, component=rnd.choice([0, 2, 18, 19, 20, 22]),
-                   instance=rnd.choice([1, 5, 8, 33]))
+        res = on1(rnd.choice([0, 2, 18, 19, 20, 22]), rnd.choice([1, 5, 8, 33]))
         body = bytes(rnd.randrange(256) for _ in range(rnd.choice([0, 1, 3, 4, 8, 14, 40, 300])))
         mtype = 0x20 if rnd.random() < 0.3 else rnd.choice(types)
         if mtype == 0x20 and len(body) >= 4:

@@ -56,11 +56,16 @@ class ModelTest : public testing::Test {
     Model m{testFarm()};
     std::vector<Event> ev;
     Channel& ch(int c) { return *m.channel(1, 1, c); }
+    // A call from channel c to `to` that must be taken: its id.
+    std::uint32_t dial(int c, const char* to, const char* from = "1000") {
+        std::uint32_t id = 0;
+        EXPECT_EQ(m.makeCall(ch(c), to, from, id, ev), 0u);
+        return id;
+    }
 };
 
 TEST_F(ModelTest, CallOutsideTheFarmDialsProceedsAlertsConnects) {
-    std::uint32_t id = 0;
-    ASSERT_EQ(m.makeCall(ch(1), "9999", "1000", id, ev), 0u);
+    std::uint32_t id = dial(1, "9999");
     EXPECT_NE(id, 0u);
     std::vector<Seen> want = {{1, call::Dialing, 0},
                               {1, call::Proceeding, 0},
@@ -73,8 +78,7 @@ TEST_F(ModelTest, CallOutsideTheFarmDialsProceedsAlertsConnects) {
 }
 
 TEST_F(ModelTest, CallToAFarmNumberRingsThatChannelAndAnswerConnectsBoth) {
-    std::uint32_t id = 0;
-    ASSERT_EQ(m.makeCall(ch(1), "1003", "1000", id, ev), 0u);
+    std::uint32_t id = dial(1, "1003");
     std::vector<Seen> want = {{1, call::Dialing, 0},
                               {1, call::Proceeding, 0},
                               {1, call::Alerting, 0},
@@ -117,8 +121,7 @@ TEST_F(ModelTest, CallToABusyChannelIsDisconnectedDestBusy) {
 }
 
 TEST_F(ModelTest, FarEndHangupOfAFarmCallIdlesThePeerAndDisconnectsTheChannel) {
-    std::uint32_t id = 0;
-    ASSERT_EQ(m.makeCall(ch(1), "1003", "1000", id, ev), 0u);
+    dial(1, "1003");
     ASSERT_EQ(m.answerCall(ch(4), 0, ev), 0u);
     ev.clear();
     ASSERT_EQ(m.farEndHangup(ch(1), ev), 0u);
@@ -140,8 +143,7 @@ std::vector<std::pair<std::uint32_t, std::uint32_t>> idsAndStates(const std::vec
 }
 
 TEST_F(ModelTest, SupervisedTransferHoldsTheCallConsultsAndHandsTheFarEndOver) {
-    std::uint32_t id = 0;
-    ASSERT_EQ(m.makeCall(ch(1), "1003", "1000", id, ev), 0u);
+    std::uint32_t id = dial(1, "1003");
     ASSERT_EQ(m.answerCall(ch(4), 0, ev), 0u);
     std::uint32_t farId = ch(4).call->id;
     EXPECT_EQ(m.completeTransfer(ch(1), id, 0, ev), kErrNoSuchCall);  // nothing under way
@@ -175,8 +177,7 @@ TEST_F(ModelTest, SupervisedTransferHoldsTheCallConsultsAndHandsTheFarEndOver) {
 }
 
 TEST_F(ModelTest, CancelledTransferEndsTheConsultationAndTakesTheCallBack) {
-    std::uint32_t id = 0, consult = 0;
-    ASSERT_EQ(m.makeCall(ch(2), "9999", "1001", id, ev), 0u);
+    std::uint32_t id = dial(2, "9999", "1001"), consult = 0;
     EXPECT_EQ(m.cancelTransfer(ch(2), id, ev), kErrBadState);
     ASSERT_EQ(m.initTransfer(ch(2), id, consult, ev), 0u);
     ev.clear();
@@ -198,16 +199,14 @@ TEST_F(ModelTest, CancelledTransferEndsTheConsultationAndTakesTheCallBack) {
 
 TEST_F(ModelTest, AnswerAndRejectNeedARingingCall) {
     EXPECT_EQ(m.answerCall(ch(1), 0, ev), kErrNoSuchCall);
-    std::uint32_t id = 0;
-    ASSERT_EQ(m.makeCall(ch(1), "9999", "1000", id, ev), 0u);
+    std::uint32_t id = dial(1, "9999");
     EXPECT_EQ(m.answerCall(ch(1), id, ev), kErrBadState);
     EXPECT_EQ(m.rejectCall(ch(1), id, 2, ev), kErrBadState);
     EXPECT_EQ(m.answerCall(ch(1), id + 1000, ev), kErrNoSuchCall);
 }
 
 TEST_F(ModelTest, LineOutOfServiceTakesItsChannelsAndCallsDown) {
-    std::uint32_t id = 0;
-    ASSERT_EQ(m.makeCall(ch(1), "9999", "1000", id, ev), 0u);
+    std::uint32_t id = dial(1, "9999");
     ev.clear();
     Line& l = *m.line(1, 1);
     ASSERT_EQ(m.setLineState(l, kOutOfService, 4, ev), 0u);
@@ -263,8 +262,7 @@ TEST_F(ModelTest, SubscriptionToAGroupTakesEveryTypeOfIt) {
     Subscription one{kGroupCallState + call::Connected, kGroupCallState, host, 1002, host};
     m.subscribe(ch(1).tsc, all);
     m.subscribe(ch(1).tsc, one);
-    std::uint32_t id = 0;
-    ASSERT_EQ(m.makeCall(ch(1), "9999", "1000", id, ev), 0u);
+    dial(1, "9999");
     std::vector<const Subscription*> to;
     int toAll = 0, toOne = 0;
     for (const Event& e : ev) {

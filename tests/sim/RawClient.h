@@ -19,6 +19,9 @@
 #include <thread>
 #include <vector>
 
+#include "BoardEvents.h"
+#include "catalogue/generated/stdresource_bodies.h"
+#include "framework/Addressable.h"
 #include "transport/TKSFrame.h"
 
 namespace sim {
@@ -84,6 +87,16 @@ class RawClient {
         return read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES).size() ==
                TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES;
     }
+    // Reads a frame header: the frame's type, or 0 when none came.
+    std::uint32_t nextType() {
+        std::vector<unsigned char> head = read(TKS_FRAME_HEADER_SIZE);
+        msg_t h;
+        if (head.size() != TKS_FRAME_HEADER_SIZE) {
+            return 0;
+        }
+        tksDecodeFrameHeader(head.data(), h);
+        return h.type;
+    }
     // Reads n bytes; fewer if the server closed.
     std::vector<unsigned char> read(std::size_t n) {
         std::vector<unsigned char> out(n);
@@ -105,6 +118,21 @@ class RawClient {
     int fd = -1;
     bool connected = false;
 };
+
+// A message frame whose header is 12 bytes instead of 56.
+inline const std::vector<unsigned char> kShortHeaderFrame = {0,  0, 0x03, 0xE9, 0, 0, 0, 0, 0, 0, 0,
+                                                             12, 0, 0,    0,    0, 0, 0, 0, 0, 1, 2,
+                                                             3,  4, 5,    6,    7, 8, 9, 0, 1, 2};
+
+// Subscribes the events of `group` that `a`'s target raises, handed to BoardEvents.
+inline void subscribe(tolk::Addressable& a, std::uint32_t group) {
+    a.asyncRegisterEvtGroup(group, &testsupport::BoardEvents::take);
+    tolk::StdResource_Bodies::MsgDetectEvt_t sub;
+    sub.RetAddr = a.getMsgQueue()->getHostDesc();
+    sub.EvtType = group;
+    sub.EvtGroup = 0;
+    a.request(0x16, &sub, 0x17, nullptr, a.getId());
+}
 
 // The server's log, written on its thread and read by the test while it runs.
 class LockedLog : public std::streambuf {

@@ -1,9 +1,7 @@
 // vx7sim's server over TCP: the framework's remote transport on one side, raw sockets for what a
-// well-behaved client never sends.
+// well-behaved client never sends; and one connection's framing alone, over a socket pair.
 #include "sim/RelayServer.h"
 
-#include <arpa/inet.h>
-#include <netinet/in.h>
 #include <sys/resource.h>
 #include <sys/socket.h>
 #include <unistd.h>
@@ -11,25 +9,19 @@
 #include <gtest/gtest.h>
 
 #include <chrono>
-#include <condition_variable>
-#include <cstring>
 #include <memory>
-#include <mutex>
 #include <set>
-#include <sstream>
-#include <streambuf>
 #include <string>
 #include <thread>
 
 #include "BoardEvents.h"
 #include "RawClient.h"
 #include "catalogue/generated/lcon_bodies.h"
-#include "catalogue/generated/stdresource_bodies.h"
 #include "catalogue/generated/tsc_bodies.h"
 #include "framework/Addressable.h"
-#include "framework/Msg.h"
 #include "platform/farm/ActiveFarm.h"
 #include "platform/farm/Addresses.h"
+#include "sim/RelayConnection.h"
 #include "transport/TKSFrame.h"
 
 namespace sim {
@@ -43,8 +35,6 @@ using testsupport::BoardEvents;
 using testsupport::cd;
 using testsupport::Event;
 using tolk::Addressable;
-using tolk::CompDesc_t;
-using Std = tolk::StdResource_Bodies;
 using Tsc = tolk::TSC_Bodies;
 using Lcon = tolk::LCON_Bodies;
 
@@ -110,15 +100,9 @@ class RelayTest : public testing::Test {
     std::shared_ptr<const farm::Farm> farm_;
 };
 
-TEST_F(RelayTest, ClientsGetTheirOwnAddressesAndAnswers) {
+// Every client's own address is checked on the hundreds of connections below.
+TEST_F(RelayTest, AClientsRequestIsAnsweredAndCounted) {
     Addressable a(cd(farm::channelComponentAddress(1, 1, 2, farm::kTSC)));
-    Addressable b(cd(farm::channelComponentAddress(1, 1, 2, farm::kTSC)));
-    CompDesc_t ha = a.getMsgQueue()->getHostDesc();
-    CompDesc_t hb = b.getMsgQueue()->getHostDesc();
-    EXPECT_EQ(ha.board, 0xFF);
-    EXPECT_EQ(hb.board, 0xFF);
-    EXPECT_NE(ha.instance, hb.instance);
-
     Tsc::MsgGetChanStateCmplt_t st;
     a.request(0x120F, &getChan, 0x1210, &st);
     EXPECT_EQ(st.ChanState, 1u);
@@ -127,12 +111,7 @@ TEST_F(RelayTest, ClientsGetTheirOwnAddressesAndAnswers) {
 
 TEST_F(RelayTest, ControlAlarmReachesTheSubscriber) {
     Addressable lcon(cd(farm::lconAddress(1, 2)));
-    lcon.asyncRegisterEvtGroup(0x1600, &BoardEvents::take);
-    Std::MsgDetectEvt_t sub;
-    sub.RetAddr = lcon.getMsgQueue()->getHostDesc();
-    sub.EvtType = 0x1600;
-    sub.EvtGroup = 0;
-    lcon.request(0x16, &sub, 0x17, nullptr, lcon.getId());
+    subscribe(lcon, 0x1600);
     EXPECT_EQ(server->control("alarm 1 2 red on"), "ok");
     EXPECT_TRUE(BoardEvents::get().waitUntil([](const Event& e) {
         const auto& w = e.words;
@@ -145,14 +124,8 @@ TEST_F(RelayTest, ControlAlarmReachesTheSubscriber) {
 TEST_F(RelayTest, FarEndCallBetweenTwoChannelsOfTwoClients) {
     Addressable caller(cd(farm::channelComponentAddress(1, 1, 1, farm::kTSC)));
     Addressable called(cd(farm::channelComponentAddress(1, 1, 23, farm::kTSC)));
-    for (Addressable* a : {&caller, &called}) {
-        a->asyncRegisterEvtGroup(0x1230, &BoardEvents::take);
-        Std::MsgDetectEvt_t sub;
-        sub.RetAddr = a->getMsgQueue()->getHostDesc();
-        sub.EvtType = 0x1230;
-        sub.EvtGroup = 0;
-        a->request(0x16, &sub, 0x17, nullptr, a->getId());
-    }
+    subscribe(caller, 0x1230);
+    subscribe(called, 0x1230);
     Tsc::MsgMakeCall_t mk;
     testsupport::setText(mk.DestAddr, "5551234");
     testsupport::setText(mk.OrigAddr, "5551212");
@@ -188,10 +161,7 @@ TEST_F(RelayTest, MalformedFrameClosesOnlyThatConnection) {
     bad.send(bad.open());
     std::vector<unsigned char> assigned = bad.read(TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
     ASSERT_EQ(assigned.size(), TKS_FRAME_HEADER_SIZE + TKS_ASSIGNED_BODY_BYTES);
-    // A message frame whose header is 12 bytes instead of 56.
-    std::vector<unsigned char> frame = {0, 0, 0x03, 0xE9, 0, 0, 0, 0, 0, 0, 0, 12, 0, 0, 0, 0,
-                                        0, 0, 0,    0,    1, 2, 3, 4, 5, 6, 7, 8,  9, 0, 1, 2};
-    bad.send(frame);
+    bad.send(kShortHeaderFrame);
     EXPECT_TRUE(bad.closedByServer());
     EXPECT_NE(logBuf.text().find("malformed message frame"), std::string::npos);
 
@@ -270,8 +240,7 @@ TEST_F(RelayTest, OutOfDescriptorsAWaitingConnectionIsRefusedAndTheOthersServed)
     {
         RawClient bad(port);
         ASSERT_TRUE(bad.opened());
-        bad.send(std::vector<unsigned char>{0, 0, 0x03, 0xE9, 0, 0, 0, 0, 0, 0, 0, 12, 0, 0, 0, 0,
-                                            0, 0, 0,    0,    1, 2, 3, 4, 5, 6, 7, 8,  9, 0, 1, 2});
+        bad.send(kShortHeaderFrame);
         ASSERT_TRUE(bad.closedByServer());
     }
 
@@ -306,11 +275,7 @@ TEST_F(RelayTest, CloseIsAcknowledged) {
     msg_t m;
     m.type = TKS_FRAME_CLOSE;
     c.send(tksEncodeFrame(m));
-    std::vector<unsigned char> ack = c.read(TKS_FRAME_HEADER_SIZE);
-    ASSERT_EQ(ack.size(), TKS_FRAME_HEADER_SIZE);
-    msg_t h;
-    tksDecodeFrameHeader(ack.data(), h);
-    EXPECT_EQ(h.type, TKS_FRAME_CLOSE_ACK);
+    EXPECT_EQ(c.nextType(), TKS_FRAME_CLOSE_ACK);
     ::close(c.fd);
     c.fd = -1;
     EXPECT_TRUE(waitConnections(0));
@@ -338,11 +303,7 @@ TEST_F(RelayTest, IdleConnectionsDoNotLockOutAClientThatOpens) {
     EXPECT_TRUE(waitConnections(1));
     EXPECT_NE(logBuf.text().find("did not open within 600 ms"), std::string::npos);
     late.send(RawClient::request(farm::lconAddress(1, 1), Lcon::MsgGetLineState_t::MsgType));
-    msg_t h;
-    std::vector<unsigned char> reply = late.read(TKS_FRAME_HEADER_SIZE);
-    ASSERT_EQ(reply.size(), TKS_FRAME_HEADER_SIZE);
-    tksDecodeFrameHeader(reply.data(), h);
-    EXPECT_EQ(h.type, TKS_FRAME_MESSAGE);
+    EXPECT_EQ(late.nextType(), TKS_FRAME_MESSAGE);
 }
 
 // A counter of the relay's "stats" line.
@@ -419,12 +380,7 @@ TEST_F(RelayTest, TraceNamesEachRoutedMessageOnOneLine) {
     ASSERT_EQ(c.read(TKS_FRAME_HEADER_SIZE).size(), TKS_FRAME_HEADER_SIZE);
 
     Addressable lcon(cd(farm::lconAddress(1, 2)));
-    lcon.asyncRegisterEvtGroup(0x1600, &BoardEvents::take);
-    Std::MsgDetectEvt_t sub;
-    sub.RetAddr = lcon.getMsgQueue()->getHostDesc();
-    sub.EvtType = 0x1600;
-    sub.EvtGroup = 0;
-    lcon.request(0x16, &sub, 0x17, nullptr, lcon.getId());
+    subscribe(lcon, 0x1600);
     EXPECT_EQ(server->control("alarm 1 2 yellow on"), "ok");
     ASSERT_TRUE(BoardEvents::get().waitUntil([](const Event& e) {
         const auto& w = e.words;
@@ -475,6 +431,118 @@ TEST_F(RelayTest, TheTailOfAnOverlongControlLineDoesNotRun) {
     ::close(p[1]);
     restart(defaults());
     ::close(p[0]);
+}
+
+// A connection on one end of a socket pair; the test plays the client on the other.
+class RelayConnectionTest : public ::testing::Test {
+  protected:
+    void SetUp() override {
+        ASSERT_EQ(::socketpair(AF_UNIX, SOCK_STREAM | SOCK_NONBLOCK, 0, fds), 0);
+        conn = std::make_unique<RelayConnection>(fds[0], 7, Clock::now());
+    }
+    void TearDown() override {
+        ::close(fds[0]);
+        if (fds[1] >= 0) {
+            ::close(fds[1]);
+        }
+    }
+    void Write(const std::vector<unsigned char>& bytes) {
+        ASSERT_EQ(::write(fds[1], bytes.data(), bytes.size()), static_cast<ssize_t>(bytes.size()));
+    }
+    static std::vector<unsigned char> Frame(std::uint32_t type, std::string body, std::string ex) {
+        msg_t m;
+        m.type = type;
+        m.size = static_cast<std::uint32_t>(body.size());
+        m.ex_size = static_cast<std::uint32_t>(ex.size());
+        m.body = reinterpret_cast<unsigned char*>(body.data());
+        m.ex = reinterpret_cast<unsigned char*>(ex.data());
+        return tksEncodeFrame(m);
+    }
+
+    int fds[2] = {-1, -1};
+    std::unique_ptr<RelayConnection> conn;
+};
+
+TEST_F(RelayConnectionTest, AFrameComesOutOnlyWhenWholeAndTwoInOneReadBothDo) {
+    const std::vector<unsigned char> first = Frame(1001, "head", "payload");
+    RelayConnection::Frame f;
+    for (std::size_t i = 0; i + 1 < first.size(); ++i) {
+        Write({first[i]});
+        ASSERT_EQ(conn->receive().bytes, 1u);
+        ASSERT_EQ(conn->nextFrame(f), RelayConnection::FrameStatus::Partial) << "byte " << i;
+    }
+    std::vector<unsigned char> rest = {first.back()};
+    const std::vector<unsigned char> second = Frame(2000, "", "");
+    rest.insert(rest.end(), second.begin(), second.end());
+    Write(rest);
+    ASSERT_EQ(conn->receive().bytes, rest.size());
+
+    ASSERT_EQ(conn->nextFrame(f), RelayConnection::FrameStatus::Ready);
+    EXPECT_EQ(f.header.type, 1001u);
+    EXPECT_EQ(std::string(reinterpret_cast<const char*>(f.body), f.header.size), "head");
+    EXPECT_EQ(std::string(reinterpret_cast<const char*>(f.ex), f.header.ex_size), "payload");
+    ASSERT_EQ(conn->nextFrame(f), RelayConnection::FrameStatus::Ready);
+    EXPECT_EQ(f.header.type, 2000u);
+    EXPECT_EQ(conn->nextFrame(f), RelayConnection::FrameStatus::Partial);
+}
+
+TEST_F(RelayConnectionTest, AHeaderOverTheLimitIsRefusedBeforeItsPartsArrive) {
+    msg_t m;
+    m.type = 1001;
+    m.size = 0;
+    m.ex_size = TKS_FRAME_MAX_PART + 1;
+    std::vector<unsigned char> header(TKS_FRAME_HEADER_SIZE);
+    tksEncodeFrameHeader(m, header.data());
+    Write(header);
+    conn->receive();
+    RelayConnection::Frame f;
+    EXPECT_EQ(conn->nextFrame(f), RelayConnection::FrameStatus::Oversized);
+    EXPECT_EQ(f.header.ex_size, TKS_FRAME_MAX_PART + 1);
+}
+
+TEST_F(RelayConnectionTest, APeerThatLeavesMidFrameIsToldApartFromOneThatLeavesBetween) {
+    const std::vector<unsigned char> frame = Frame(1001, "x", "y");
+    Write(std::vector<unsigned char>(frame.begin(), frame.begin() + 5));
+    conn->receive();
+    ::close(fds[1]);
+    fds[1] = -1;
+    const RelayConnection::Read r = conn->receive();
+    EXPECT_TRUE(r.ended);
+    EXPECT_EQ(r.why, "closed in the middle of a frame");
+
+    int other[2];
+    ASSERT_EQ(::socketpair(AF_UNIX, SOCK_STREAM | SOCK_NONBLOCK, 0, other), 0);
+    RelayConnection clean(other[0], 8, Clock::now());
+    ::close(other[1]);
+    const RelayConnection::Read between = clean.receive();
+    EXPECT_TRUE(between.ended);
+    EXPECT_EQ(between.why, "");
+    ::close(other[0]);
+}
+
+TEST_F(RelayConnectionTest, QueuedFramesLeaveWholeAndInOrder) {
+    EXPECT_EQ(conn->receive().bytes, 0u) << "nothing sent yet";
+    const std::vector<unsigned char> a = Frame(1002, "abcd", "");
+    const std::vector<unsigned char> b = Frame(2001, "", "");
+    EXPECT_EQ(conn->queueFrame(1002, a.data() + TKS_FRAME_HEADER_SIZE, 4, nullptr, 0), a.size());
+    EXPECT_EQ(conn->queueFrame(2001, nullptr, 0, nullptr, 0), b.size());
+    EXPECT_EQ(conn->pending(), a.size() + b.size());
+
+    std::size_t sent = 0;
+    std::string why;
+    ASSERT_TRUE(conn->send(sent, why)) << why;
+    EXPECT_EQ(sent, a.size() + b.size());
+    EXPECT_EQ(conn->pending(), 0u);
+    std::vector<unsigned char> got(sent + 1);
+    ASSERT_EQ(::read(fds[1], got.data(), got.size()), static_cast<ssize_t>(sent));
+    got.resize(sent);
+    std::vector<unsigned char> want = a;
+    want.insert(want.end(), b.begin(), b.end());
+    EXPECT_EQ(got, want);
+
+    conn->queueFrame(2001, nullptr, 0, nullptr, 0);
+    EXPECT_EQ(conn->discardOutput(), b.size());
+    EXPECT_EQ(conn->pending(), 0u);
 }
 
 }  // namespace
