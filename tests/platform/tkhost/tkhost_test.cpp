@@ -200,17 +200,9 @@ TEST_P(TkVarFieldCount, MovesCountElementsOfTheirWidth) {
     unsigned int bytes = c.elements * c.width;
     Block b(bytes + 8);
     std::vector<unsigned char> host(bytes + 8);
-    // Elements 1, 2, 3... in host form.
+    // Elements 1, 2, 3... in host (little-endian) form: the low byte first.
     for (unsigned int i = 0; i < c.elements; ++i) {
-        std::uint32_t v = i + 1;
-        if (c.width == 1) {
-            host[i] = static_cast<unsigned char>(v);
-        } else if (c.width == 2) {
-            std::uint16_t s = static_cast<std::uint16_t>(v);
-            std::memcpy(&host[i * 2], &s, 2);
-        } else {
-            std::memcpy(&host[i * 4], &v, 4);
-        }
+        host[i * c.width] = static_cast<unsigned char>(i + 1);
     }
     unsigned int offset = 4;
     ASSERT_EQ(TK_OK, tkMsgVarFieldPut(b.m, 1, &offset, c.desc, host.data()));
