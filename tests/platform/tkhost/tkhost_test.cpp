@@ -410,6 +410,26 @@ struct BoundQueue {
     ~BoundQueue() { tkQueueClose(q); }
 };
 
+TEST(TkSwitchBlocking, ReadWakesWhenABlockArrives) {
+    BoundQueue a;
+    std::atomic<unsigned int> type{0};
+    std::thread reader([&] {
+        TKMsg32Bit* m = nullptr;
+        if (tkMsgRead(a.q, 0, &m) == TK_OK) {
+            type = m->type;
+            tkMsgFree(m);
+        }
+    });
+    std::this_thread::sleep_for(20ms);
+    TKMsg32Bit* m = nullptr;
+    tkMsgAllocate(4, &m);
+    m->type = 99;
+    tkMsgFieldPut(m, TK_FIELD_TGT, &a.addr);
+    ASSERT_EQ(TK_OK, tkMsgWrite(a.q, m, 0));
+    reader.join();
+    EXPECT_EQ(99u, type.load());
+}
+
 class TkSwitchWake : public ::testing::TestWithParam<bool> {};
 
 TEST_P(TkSwitchWake, CloseOrUnbindWakesABlockedReader) {
