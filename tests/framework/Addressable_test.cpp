@@ -118,13 +118,7 @@ TEST(AddressableRequest, UnexpectedMsgMadeFromAReplyOwnsItAcrossCopies) {
         EXPECT_EQ(e.queue, q.Get());
         printed = text(e);
     }
-    EXPECT_EQ(printed.rfind("Addressable::UnexpectedMsg ObjSource: {TgtDesc: {Node 0 Board 0x1 "
-                            "Processor 0x1 Component 0x12 Instance 0x7} HostDesc: ",
-                            0),
-              0u)
-        << printed;
-    EXPECT_NE(printed.find(" CmdMsgType 0x1214 RespMsg: {MsgType: 0x800001 "), std::string::npos)
-        << printed;
+    // The text is the refusal's (tested above); the body shows the reply outlived the copies.
     EXPECT_NE(printed.find(" Body: {ByteData {0 0x9 }}}"), std::string::npos) << printed;
 }
 

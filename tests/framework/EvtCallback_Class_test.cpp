@@ -169,15 +169,6 @@ TEST_F(Dispatcher, CallbacksRunInRegistrationOrderEachWithItsOwnMessage) {
     EXPECT_EQ(seen[2].who, "member");
 }
 
-TEST_F(Dispatcher, BodyCallbackGetsADefaultBodyForAnUnknownType) {
-    comp.asyncRegisterMsgType(0x52, bodyFn, 0);
-    send(0x52, {7, 8});
-    waitSeen(1);
-    ASSERT_EQ(seenCount(), 1u);
-    EXPECT_EQ(seen[0].number, 0x52u);
-    EXPECT_EQ(seen[0].body, "default{ByteData {7 8 }}");
-}
-
 TEST_F(Dispatcher, NullEntryDropsTheMessageSilently) {
     comp.asyncRegisterMsgType(0x1220, static_cast<EvtCallback::MsgFn>(nullptr), 0);
     comp.asyncUnregisteredMsgType(unregistered, 0);
@@ -192,16 +183,21 @@ TEST_F(Dispatcher, NullEntryDropsTheMessageSilently) {
     EXPECT_EQ(seen[0].number, 0x53u);
 }
 
-TEST_F(Dispatcher, EventsGoByGroupWithFallBacks) {
+TEST_F(Dispatcher, BodiesGoByTypeAndEventsByGroupWithFallBacks) {
+    comp.asyncRegisterMsgType(0x52, bodyFn, 0);
     comp.asyncRegisterEvtGroup(0x1299, bodyFn, 0);
     comp.asyncUnregisteredEvtGroup(unregistered, 0);
+    send(0x52, {7, 8});
     send(0x20, evt(0x1299, {5}));
     send(0x20, evt(0x1300));
-    waitSeen(2);
-    ASSERT_EQ(seenCount(), 2u);
-    EXPECT_EQ(seen[0].number, 0x20u);
-    EXPECT_EQ(seen[0].body, "evt{EvtGroup 4761 Data {5}}");
-    EXPECT_EQ(seen[1].who, "unregistered");
+    waitSeen(3);
+    ASSERT_EQ(seenCount(), 3u);
+    // A type without a body of its own is read as bytes.
+    EXPECT_EQ(seen[0].number, 0x52u);
+    EXPECT_EQ(seen[0].body, "default{ByteData {7 8 }}");
+    EXPECT_EQ(seen[1].number, 0x20u);
+    EXPECT_EQ(seen[1].body, "evt{EvtGroup 4761 Data {5}}");
+    EXPECT_EQ(seen[2].who, "unregistered");
 }
 
 TEST_F(Dispatcher, CancellingTheLastCallbackSendsTheTypeToTheUnregisteredHandler) {

