@@ -327,7 +327,8 @@ TEST(ShutdownTerminal, HangUpAtThePromptEndsThroughTheShutdown) {
 }
 
 // Boards that answer slowly make the views slow to stop, not stuck: the shutdown waits for
-// them, however long all of it takes (here six requests of 3 s each), and stops every view.
+// them, however long all of it takes (here four requests of 3 s each, past the stall limit
+// of 10 s), and stops every view.
 TEST(ShutdownTerminal, SlowButProgressingShutdownIsNotCut) {
     const std::string farm = LINEPROBE_FARMS_DIR "/default.toml";
     SimServer sim(farm);
@@ -338,7 +339,6 @@ TEST(ShutdownTerminal, SlowButProgressingShutdownIsNotCut) {
     CommandRunner commands(session);
     ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
     ASSERT_TRUE(commands.Run("trunk 1 1"));
-    ASSERT_TRUE(commands.Run("trunk 1 2"));
     ASSERT_TRUE(commands.Run("phone 1 1 1"));
     ASSERT_EQ(commands.Result(), "phone view creaed successfully");
     ASSERT_EQ(sim.Control("delay 3000").rfind("ok", 0), 0u);
@@ -350,7 +350,7 @@ TEST(ShutdownTerminal, SlowButProgressingShutdownIsNotCut) {
     ASSERT_TRUE(log.has_value());
     EXPECT_TRUE(LogHasInOrder(
         *log, {"terninating app due to SIGUSR1", "PhoneView::Stop() called: board=1 line=1 chan=1",
-               "Stopping Trunk Viev: board=1 line=1", "Stopping Trunk Viev: board=1 line=2"}))
+               "Stopping Trunk Viev: board=1 line=1"}))
         << *log;
 }
 

@@ -8,6 +8,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <variant>
 #include <vector>
 
 #include "LogCapture.h"
@@ -110,13 +111,95 @@ TEST(ScanCommandLine, LongWordAndTextAreCutToTheirBuffers) {
 
 using Key = LineEditor::EditKey;
 
+// A key sequence: strings are typed character by character, numbers pressed as keys.
+std::vector<int> Keys(std::initializer_list<std::variant<const char*, int>> parts) {
+    std::vector<int> keys;
+    for (const auto& part : parts) {
+        if (const char* const* text = std::get_if<const char*>(&part)) {
+            for (const char* c = *text; *c != '\0'; ++c) {
+                keys.push_back(static_cast<unsigned char>(*c));
+            }
+        } else {
+            keys.push_back(std::get<int>(part));
+        }
+    }
+    return keys;
+}
+
+constexpr std::size_t ANY_CURSOR = ~std::size_t{0};
+
+struct EditCase {
+    std::vector<int> keys;
+    std::string line;
+    std::size_t cursor;
+    std::size_t limit = 1024;
+};
+
+// Each case feeds one editor; an entered line begins the next one as the prompt does, so the
+// later keys of a case meet the lines it entered in the history.
+TEST(LineEditor, KeysEditTheLineAndWalkTheHistory) {
+    const int up = Key::Up;
+    const int down = Key::Down;
+    const int left = Key::Left;
+    const EditCase cases[] = {
+        {Keys({"phone\t5\t1\t1\r"}), "phone 5 1 1", ANY_CURSOR},
+        {Keys({"bo", 0x00, 0x07, 0x0c, 0x1b, 0x80, 0xff, 0x1000, Key::Delete, "gus"}), "bogus", 5},
+        // Home and End, and Ctrl-A and Ctrl-E that do the same.
+        {Keys({"phone 1 1", left, "2", Key::Home, "x", Key::End, "0"}), "xphone 1 210", 12},
+        {Keys({"xphone", 0x01, Key::Right, Key::Delete, 0x05}), "xhone", 5},
+        // The cursor stops at both ends, where Delete and Backspace have nothing to take.
+        {Keys({"abc", Key::Right, Key::Delete}), "abc", 3},
+        {Keys({"abc", Key::Home, left, Key::Backspace}), "abc", 0},
+        {Keys({"abcd", left, Key::Backspace}), "abd", 2},
+        {Keys({"abcd", left, Key::Backspace, 0x7f, 0x08}), "d", 0},
+        // Ctrl-U kills up to the cursor, Ctrl-W the word and blanks behind it.
+        {Keys({"makecall 1 1 3", left, left, 0x15}), " 3", 0},
+        {Keys({"makecall 1 1 3", 0x15}), "", 0},
+        {Keys({"makecall 12 1  ", 0x17}), "makecall 12 ", 12},
+        {Keys({"makecall 12 1  ", 0x17, 0x17}), "makecall ", 9},
+        {Keys({"makecall ", left, left, left, left, left, 0x17}), "call ", 0},
+        {Keys({"makecall ", Key::Home, 0x17}), "makecall ", 0},
+        // Typing past the limit is dropped, wherever the cursor is.
+        {Keys({"abcdefg"}), "abcde", 5, 5},
+        {Keys({"abcdefg", Key::Home, "x"}), "abcde", 0, 5},
+        // Up and Down walk the entered lines and come back to the draft.
+        {Keys({"phone 1 1 1\ntrunk 1 1\nmake", up}), "trunk 1 1", 9},
+        {Keys({"phone 1 1 1\ntrunk 1 1\nmake", up, up, up}), "phone 1 1 1", 11},
+        {Keys({"phone 1 1 1\ntrunk 1 1\nmake", up, up, down}), "trunk 1 1", 9},
+        {Keys({"phone 1 1 1\ntrunk 1 1\nmake", up, down, down}), "make", 4},
+        // A recalled line edited is entered as edited, and the old one stays.
+        {Keys({"phone 1 1 1\n", up, Key::Backspace, "2\n"}), "phone 1 1 2", ANY_CURSOR},
+        {Keys({"phone 1 1 1\n", up, Key::Backspace, "2\n", up}), "phone 1 1 2", 11},
+        {Keys({"phone 1 1 1\n", up, Key::Backspace, "2\n", up, up}), "phone 1 1 1", 11},
+        // Blank lines and repeats are not kept.
+        {Keys({"quit 1\n\n   \nquit 1\nhelp\n", up, up, up}), "quit 1", 6},
+        {Keys({"quit 1\n\n   \nquit 1\nhelp\n", up, up, up, down}), "help", 4},
+    };
+    for (const EditCase& c : cases) {
+        SCOPED_TRACE("'" + c.line + "'");
+        LineEditor editor;
+        editor.Start(c.limit);
+        for (std::size_t i = 0; i < c.keys.size(); ++i) {
+            const bool enters = c.keys[i] == '\n' || c.keys[i] == '\r';
+            ASSERT_EQ(editor.Feed(c.keys[i]) == LineEditor::Result::Entered, enters) << i;
+            if (enters && i + 1 < c.keys.size()) {
+                editor.Start(c.limit);
+            }
+        }
+        EXPECT_EQ(editor.Line(), c.line);
+        if (c.cursor != ANY_CURSOR) {
+            EXPECT_EQ(editor.Cursor(), c.cursor);
+        }
+    }
+}
+
 class LineEditorTest : public ::testing::Test {
   protected:
     void SetUp() override { editor.Start(1024); }
 
     void Type(const std::string& text) {
         for (char c : text) {
-            EXPECT_EQ(editor.Feed(static_cast<unsigned char>(c)), LineEditor::Result::Editing);
+            editor.Feed(static_cast<unsigned char>(c));
         }
     }
     void Press(std::initializer_list<int> keys) {
@@ -124,137 +207,13 @@ class LineEditorTest : public ::testing::Test {
             editor.Feed(key);
         }
     }
-    // Enters a line and begins the next one, as the prompt does.
     void Enter(const std::string& text) {
-        Type(text);
-        ASSERT_EQ(editor.Feed('\n'), LineEditor::Result::Entered);
+        Type(text + "\n");
         editor.Start(1024);
     }
 
     LineEditor editor;
 };
-
-TEST_F(LineEditorTest, TabIsABlankAndCarriageReturnEntersTheLine) {
-    Type("phone\t5\t1\t1");
-    EXPECT_EQ(editor.Line(), "phone 5 1 1");
-    EXPECT_EQ(editor.Feed('\r'), LineEditor::Result::Entered);
-    EXPECT_EQ(editor.Line(), "phone 5 1 1");
-}
-
-TEST_F(LineEditorTest, ControlCharactersAndForeignBytesAreIgnored) {
-    Type("bo");
-    Press({0x00, 0x07, 0x0c, 0x1b, 0x80, 0xff, 0x1000, Key::Delete});
-    Type("gus");
-    EXPECT_EQ(editor.Line(), "bogus");
-    EXPECT_EQ(editor.Cursor(), 5u);
-}
-
-TEST_F(LineEditorTest, CursorKeysMoveWithinTheLineAndStopAtBothEnds) {
-    Type("phone 1 1");
-    Press({Key::Left});
-    Type("2");
-    EXPECT_EQ(editor.Line(), "phone 1 21");
-    Press({Key::Home});
-    Type("x");
-    EXPECT_EQ(editor.Line(), "xphone 1 21");
-    Press({Key::End});
-    Type("0");
-    EXPECT_EQ(editor.Line(), "xphone 1 210");
-    // Ctrl-A and Ctrl-E do what Home and End do.
-    Press({0x01, Key::Right, Key::Delete, 0x05});
-    EXPECT_EQ(editor.Line(), "xhone 1 210");
-    EXPECT_EQ(editor.Cursor(), editor.Line().size());
-
-    Press({Key::Right, Key::Delete});
-    EXPECT_EQ(editor.Cursor(), editor.Line().size());
-    EXPECT_EQ(editor.Line(), "xhone 1 210");
-    Press({Key::Home, Key::Left, Key::Backspace});
-    EXPECT_EQ(editor.Cursor(), 0u);
-    EXPECT_EQ(editor.Line(), "xhone 1 210");
-}
-
-TEST_F(LineEditorTest, EveryBackspaceCodeErasesBeforeTheCursor) {
-    Type("abcd");
-    Press({Key::Left, Key::Backspace});
-    EXPECT_EQ(editor.Line(), "abd");
-    Press({0x7f});
-    EXPECT_EQ(editor.Line(), "ad");
-    Press({0x08});
-    EXPECT_EQ(editor.Line(), "d");
-    EXPECT_EQ(editor.Cursor(), 0u);
-}
-
-TEST_F(LineEditorTest, CtrlUKillsToTheCursorAndCtrlWTheWordBehindIt) {
-    Type("makecall 1 1 3");
-    Press({Key::Left, Key::Left, 0x15});
-    EXPECT_EQ(editor.Line(), " 3");
-    EXPECT_EQ(editor.Cursor(), 0u);
-    Press({Key::End, 0x15});
-    EXPECT_EQ(editor.Line(), "");
-
-    Type("makecall 12 1  ");
-    Press({0x17});
-    EXPECT_EQ(editor.Line(), "makecall 12 ");
-    Press({0x17});
-    EXPECT_EQ(editor.Line(), "makecall ");
-    // Within a word it takes only the part behind the cursor.
-    Press({Key::Left, Key::Left, Key::Left, Key::Left, Key::Left, 0x17});
-    EXPECT_EQ(editor.Line(), "call ");
-    EXPECT_EQ(editor.Cursor(), 0u);
-    Press({0x17});
-    EXPECT_EQ(editor.Line(), "call ");
-}
-
-TEST_F(LineEditorTest, TypingPastTheLimitIsDropped) {
-    editor.Start(5);
-    Type("abcdefg");
-    EXPECT_EQ(editor.Line(), "abcde");
-    Press({Key::Home});
-    Type("x");
-    EXPECT_EQ(editor.Line(), "abcde");
-}
-
-TEST_F(LineEditorTest, UpAndDownWalkTheEnteredLinesAndComeBackToTheDraft) {
-    Enter("phone 1 1 1");
-    Enter("trunk 1 1");
-    Type("make");
-    Press({Key::Up});
-    EXPECT_EQ(editor.Line(), "trunk 1 1");
-    EXPECT_EQ(editor.Cursor(), editor.Line().size());
-    Press({Key::Up, Key::Up});
-    EXPECT_EQ(editor.Line(), "phone 1 1 1");
-    Press({Key::Down});
-    EXPECT_EQ(editor.Line(), "trunk 1 1");
-    Press({Key::Down, Key::Down});
-    EXPECT_EQ(editor.Line(), "make");
-}
-
-TEST_F(LineEditorTest, AnEditedRecalledLineIsEnteredAsEditedAndTheOldOneStays) {
-    Enter("phone 1 1 1");
-    Press({Key::Up, Key::Backspace});
-    Type("2");
-    ASSERT_EQ(editor.Feed('\n'), LineEditor::Result::Entered);
-    EXPECT_EQ(editor.Line(), "phone 1 1 2");
-    editor.Start(1024);
-    Press({Key::Up});
-    EXPECT_EQ(editor.Line(), "phone 1 1 2");
-    Press({Key::Up});
-    EXPECT_EQ(editor.Line(), "phone 1 1 1");
-}
-
-TEST_F(LineEditorTest, BlankLinesAndRepeatsAreNotKept) {
-    Enter("quit 1");
-    Enter("");
-    Enter("   ");
-    Enter("quit 1");
-    Enter("help");
-    Press({Key::Up, Key::Up});
-    EXPECT_EQ(editor.Line(), "quit 1");
-    Press({Key::Up});
-    EXPECT_EQ(editor.Line(), "quit 1");  // the oldest: Up goes no further
-    Press({Key::Down});
-    EXPECT_EQ(editor.Line(), "help");
-}
 
 TEST_F(LineEditorTest, TheLatestHundredLinesAreKept) {
     for (int i = 0; i <= 100; ++i) {
@@ -269,35 +228,25 @@ TEST_F(LineEditorTest, TheLatestHundredLinesAreKept) {
 }
 
 TEST_F(LineEditorTest, ALongLineScrollsToKeepTheCursorInView) {
+    auto shown = [&](std::size_t width) {
+        const LineEditor::Visible visible = editor.Show(width);
+        return visible.text + "|" + std::to_string(visible.cursor);
+    };
     Type("abcdefghij");
-    LineEditor::Visible shown = editor.Show(4);
     // The cursor at the end takes the last cell.
-    EXPECT_EQ(shown.text, "hij");
-    EXPECT_EQ(shown.cursor, 3u);
-
+    EXPECT_EQ(shown(4), "hij|3");
     Press({Key::Left, Key::Left, Key::Left, Key::Left, Key::Left, Key::Left});
-    shown = editor.Show(4);
-    EXPECT_EQ(shown.text, "efgh");
-    EXPECT_EQ(shown.cursor, 0u);
-
+    EXPECT_EQ(shown(4), "efgh|0");
     // Moving right within the shown part does not scroll.
     Press({Key::Right, Key::Right});
-    shown = editor.Show(4);
-    EXPECT_EQ(shown.text, "efgh");
-    EXPECT_EQ(shown.cursor, 2u);
-
+    EXPECT_EQ(shown(4), "efgh|2");
     Press({Key::Home});
-    shown = editor.Show(4);
-    EXPECT_EQ(shown.text, "abcd");
-    EXPECT_EQ(shown.cursor, 0u);
-
+    EXPECT_EQ(shown(4), "abcd|0");
     // Shortening the line brings text back into view.
     Press({Key::End, 0x17});
-    shown = editor.Show(4);
-    EXPECT_EQ(shown.text, "");
-    EXPECT_EQ(shown.cursor, 0u);
+    EXPECT_EQ(shown(4), "|0");
     Type("xy");
-    EXPECT_EQ(editor.Show(4).text, "xy");
+    EXPECT_EQ(shown(4), "xy|2");
     EXPECT_EQ(editor.Show(0).text, "");
 }
 

@@ -27,7 +27,6 @@ inline constexpr int SEPARATOR_ROWS[] = {11, 23, 35};
 // Screen rows of the views windows: window row r of the phone views window is screen row
 // PHONE_ROW0 + r, of the trunk views window TRUNK_ROW0 + r; window column c is screen
 // column c + 1.
-inline constexpr int SYSVIEW_ROW0 = 0;
 inline constexpr int PHONE_ROW0 = 12;
 inline constexpr int TRUNK_ROW0 = 24;
 inline constexpr int WINDOW_COL0 = 1;
