@@ -40,11 +40,6 @@ class RecordingObserver : public vx7diag::Observer {
         return texts;
     }
 
-    std::size_t Count() {
-        std::lock_guard<std::mutex> guard(mutex);
-        return texts.size();
-    }
-
   private:
     std::mutex mutex;
     std::condition_variable changed;

@@ -100,19 +100,11 @@ std::vector<std::string> AllTypes() {
     return types;
 }
 
-TerminalOptions ThroughRelay(const SimServer& sim) {
-    TerminalOptions options;
-    options.env.emplace_back("REMOTE_TKHOST", sim.Address());
-    options.env.emplace_back("VX7_FARM", FARM);
-    options.unsetEnv.push_back("CORVO_ORVANE_DIR");
-    return options;
-}
-
 class FaultRun : public ::testing::Test {
   protected:
     FaultRun()
         : sim(FARM),
-          session(ThroughRelay(sim)),
+          session(ThroughRelay(sim, FARM)),
           commands(session),
           full(EnvNumber("LINEPROBE_FAULT_FULL", 0) != 0) {}
 
@@ -177,16 +169,11 @@ class FaultRun : public ::testing::Test {
 };
 
 TEST_F(FaultRun, RefusedSilentAndDroppedRelay) {
-    const auto runStart = Clock::now();
     std::string phases;
-    auto last = runStart;
+    auto last = Clock::now();
     auto phase = [&](const char* name) {
-        const auto now = Clock::now();
-        phases += std::string(" ") + name + " " +
-                  std::to_string(
-                      std::chrono::duration_cast<std::chrono::milliseconds>(now - last).count()) +
-                  " ms;";
-        last = now;
+        phases += std::string(" ") + name + " " + std::to_string(MsSince(last)) + " ms;";
+        last = Clock::now();
     };
 
     // Refused: every command that sends a message leaves a report of the failure, naming
@@ -289,7 +276,7 @@ TEST_F(FaultRun, RefusedSilentAndDroppedRelay) {
     // A lineprobe started again gets working views from the relay that dropped it. Its phone
     // is another channel: the commands after the drop worked, and left channel 1.1.1 with a
     // call and out of service.
-    TerminalSession again(ThroughRelay(sim));
+    TerminalSession again(ThroughRelay(sim, FARM));
     ASSERT_TRUE(again.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << again.Dump();
     CommandRunner commandsAgain(again);
     ASSERT_TRUE(commandsAgain.Run("trunk 1 1", std::chrono::seconds(30)).returned) << again.Dump();

@@ -1,7 +1,7 @@
 #pragma once
 
-// Helpers shared by the whole-tool runs: the resident memory of the lineprobe process, and
-// settings that lengthen a run by hand.
+// Helpers shared by the whole-tool runs: how lineprobe is started against vx7sim, the
+// resident memory of the lineprobe process, and settings that lengthen a run by hand.
 #include <sys/types.h>
 
 #include <chrono>
@@ -11,6 +11,8 @@
 #include <string>
 
 #include "ConsoleScreen.h"
+#include "SimServer.h"
+#include "TerminalSession.h"
 
 namespace lineprobe::testing {
 
@@ -34,6 +36,19 @@ inline long EnvNumber(const char* name, long fallback) {
     char* end = nullptr;
     const long value = std::strtol(text, &end, 10);
     return *end == '\0' ? value : fallback;
+}
+
+// A lineprobe whose boards are behind the relay, with the relay's farm as its device map.
+inline TerminalOptions ThroughRelay(const SimServer& sim, const std::string& farm) {
+    TerminalOptions options;
+    options.env.emplace_back("REMOTE_TKHOST", sim.Address());
+    options.env.emplace_back("VX7_FARM", farm);
+    options.unsetEnv.push_back("CORVO_ORVANE_DIR");
+    return options;
+}
+
+inline long long MsSince(Clock::time_point start) {
+    return std::chrono::duration_cast<std::chrono::milliseconds>(Clock::now() - start).count();
 }
 
 // VmRSS of a process in KiB, or nothing once the process is gone.
