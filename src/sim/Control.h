@@ -31,7 +31,7 @@ struct ControlCommand {
     unsigned int board = 0;
     unsigned int trunk = 0;
     unsigned int channel = 0;
-    std::string from{};  // Call: the calling number
+    std::string from{};         // Call: the calling number
     std::uint32_t alarmId = 0;  // Alarm: the alarm number the name stands for
     bool on = false;            // Alarm: on; Line: in service
     std::uint32_t count = 0;    // Bpv, Ferr
