@@ -503,25 +503,6 @@ INSTANTIATE_TEST_SUITE_P(
 
 // ---- the core alone ----
 
-TKMsg32Bit* block(std::uint32_t type, const farm::Address& tgt, std::uint32_t trans,
-                  const std::vector<unsigned char>& body) {
-    TKMsg32Bit* b = nullptr;
-    EXPECT_EQ(tkMsgAllocate(static_cast<unsigned int>(body.size()), &b), 0);
-    b->type = type;
-    b->transTag = trans << 8;
-    b->srcBoard = 0xFF;
-    b->srcInstance = 1;
-    b->tgtInstance = tgt.instance;
-    b->tgtBoard = tgt.board;
-    b->tgtProcessor = tgt.processor;
-    b->tgtComponent = tgt.component;
-    b->tgtNode = tgt.node;
-    if (!body.empty()) {
-        std::memcpy(tkMsgBody(b), body.data(), body.size());
-    }
-    return b;
-}
-
 // Every block the emulation sends, header and body, as bytes.
 std::vector<std::vector<unsigned char>> drain(Emulation& emu) {
     std::vector<std::vector<unsigned char>> out;
@@ -554,11 +535,14 @@ TEST(EmulationCore, WhatItCannotAnswerIsLoggedByTypeAndTarget) {
     std::ostringstream log;
     Emulation emu(defaultFarm(), log);
     // No such board: nobody is there to answer, so nothing comes back.
-    emu.receive(block(0x1214, farm::channelComponentAddress(9, 1, 1, farm::kTSC), 1, {}));
+    emu.receive(
+        RawClient::block(0x1214, farm::channelComponentAddress(9, 1, 1, farm::kTSC), 1, {}));
     EXPECT_TRUE(drain(emu).empty());
     // A message this channel's TSC does not play (ParkCall) and one a CHP does not take.
-    emu.receive(block(0x1216, farm::channelComponentAddress(1, 1, 2, farm::kTSC), 2, {}));
-    emu.receive(block(0x1415, farm::channelComponentAddress(1, 1, 2, farm::kCHP), 3, {}));
+    emu.receive(
+        RawClient::block(0x1216, farm::channelComponentAddress(1, 1, 2, farm::kTSC), 2, {}));
+    emu.receive(
+        RawClient::block(0x1415, farm::channelComponentAddress(1, 1, 2, farm::kCHP), 3, {}));
     auto out = drain(emu);
     ASSERT_EQ(out.size(), 2u);
     for (const auto& b : out) {
@@ -578,13 +562,13 @@ TEST(EmulationCore, WhatItCannotAnswerIsLoggedByTypeAndTarget) {
 TEST(EmulationCore, TheBoardItselfAnswersNothingAndMediaTakeOnlyStandardOperations) {
     std::ostringstream log;
     Emulation emu(defaultFarm(), log);
-    emu.receive(block(0x02, farm::boardAddress(1), 1, {}));
+    emu.receive(RawClient::block(0x02, farm::boardAddress(1), 1, {}));
     EXPECT_TRUE(drain(emu).empty());
     EXPECT_NE(log.str().find("the board itself takes no messages"), std::string::npos) << log.str();
 
     const farm::Address media = farm::mediaAddress(2, 11, farm::Media::SigDet);
-    emu.receive(block(0x02, media, 2, {}));
-    emu.receive(block(0x1415, media, 3, {}));
+    emu.receive(RawClient::block(0x02, media, 2, {}));
+    emu.receive(RawClient::block(0x1415, media, 3, {}));
     auto out = drain(emu);
     ASSERT_EQ(out.size(), 2u);
     EXPECT_EQ(reinterpret_cast<const TKMsg32Bit*>(out[0].data())->type, 0x03u);
@@ -607,12 +591,12 @@ TEST(EmulationCore, SameRequestsAndControlLinesGiveTheSameBytes) {
             sub.RetAddr = CompDesc_t(1, 0xFF, 0, 0, 0);
             sub.EvtType = group;
             sub.EvtGroup = group;
-            emu.receive(block(0x16, target, 7, bytesOf(sub)));
+            emu.receive(RawClient::block(0x16, target, 7, bytesOf(sub)));
         }
         std::vector<unsigned char> call(128 + 128 + 1, 0);
         std::memcpy(call.data(), "5551234", 7);
         std::memcpy(call.data() + 128, "5551212", 7);
-        emu.receive(block(0x1214, tsc, 8, call));
+        emu.receive(RawClient::block(0x1214, tsc, 8, call));
         emu.control("alarm 1 1 red on");
         emu.control("bpv 1 2 5");
         emu.control("call 1 2 3 777");

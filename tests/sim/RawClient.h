@@ -65,20 +65,32 @@ class RawClient {
         m.body = body;
         return tksEncodeFrame(m);
     }
+    // A block from the host to `to` carrying `body`, as a client would send it (the relay
+    // stamps its own source on it); the caller frees it.
+    static TKMsg32Bit* block(std::uint32_t type, const farm::Address& to, std::uint32_t trans,
+                             const std::vector<unsigned char>& body = {}) {
+        TKMsg32Bit* b = nullptr;
+        EXPECT_EQ(tkMsgAllocate(static_cast<unsigned int>(body.size()), &b), 0);
+        b->type = type;
+        b->transTag = trans << 8;
+        b->srcBoard = 0xFF;
+        b->srcInstance = 1;
+        b->tgtInstance = to.instance;
+        b->tgtBoard = to.board;
+        b->tgtProcessor = to.processor;
+        b->tgtComponent = to.component;
+        b->tgtNode = to.node;
+        if (!body.empty()) {
+            std::memcpy(tkMsgBody(b), body.data(), body.size());
+        }
+        return b;
+    }
     // A message frame of a request without a body.
     static std::vector<unsigned char> request(const farm::Address& to, std::uint32_t type) {
-        TKMsg32Bit* block = nullptr;
-        EXPECT_EQ(tkMsgAllocate(0, &block), 0);
-        block->type = type;
-        block->transTag = 0x4200;
-        block->tgtInstance = to.instance;
-        block->tgtBoard = to.board;
-        block->tgtProcessor = to.processor;
-        block->tgtComponent = to.component;
-        block->tgtNode = to.node;
+        TKMsg32Bit* b = block(type, to, 0x42);
         std::vector<unsigned char> frame;
-        EXPECT_TRUE(tksEncodeMessageFrame(block, frame));
-        tkMsgFree(block);
+        EXPECT_TRUE(tksEncodeMessageFrame(b, frame));
+        tkMsgFree(b);
         return frame;
     }
     // Sends the open and reads the whole assigned-address frame: true when it came.
