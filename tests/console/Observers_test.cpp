@@ -174,12 +174,9 @@ TEST_F(PhoneObserverTest, CurrentStateDrawsInItsOrderWithoutRefreshOrCallId) {
 
 constexpr int TRUNK_ROW = 2;
 
-class TrunkObserverFixture {
-  protected:
-    TrunkObserverFixture()
-        : observer(1, 1, TRUNK_ROW, 1), publisher(new VX7EventPublisher(1, 1, 1)) {
-        observer.SetView(&view);
-    }
+// A trunk observer that draws on a view of its own.
+struct TrunkRow {
+    TrunkRow() { observer.SetView(&view); }
 
     void Alarm(unsigned int code, unsigned char state) {
         auto* event = new tolk::LCON::Evt_0x1600_t();
@@ -198,8 +195,8 @@ class TrunkObserverFixture {
     }
 
     RecordingView view;
-    ConsoleTrunkObserver observer;
-    isa::RefPtr<VX7EventPublisher> publisher;
+    ConsoleTrunkObserver observer{1, 1, TRUNK_ROW, 1};
+    isa::RefPtr<VX7EventPublisher> publisher{new VX7EventPublisher(1, 1, 1)};
     AllAlarms alarms;
     TrunkState trunkState;
 };
@@ -212,37 +209,37 @@ struct AlarmCase {
     const char* whenClear;
 };
 
-class AlarmColumnTest : public TrunkObserverFixture, public ::testing::TestWithParam<AlarmCase> {};
-
-TEST_P(AlarmColumnTest, EachAlarmMarksItsColumnWithItsSense) {
-    const AlarmCase& c = GetParam();
-    Alarm(c.code, 1);
-    EXPECT_EQ(view.At(TRUNK_ROW, c.col, 1), c.whenActive);
-    Alarm(c.code, 0);
-    EXPECT_EQ(view.At(TRUNK_ROW, c.col, 1), c.whenClear);
-    // Any state but 1 counts as clear.
-    Alarm(c.code, 1);
-    Alarm(c.code, 2);
-    EXPECT_EQ(view.At(TRUNK_ROW, c.col, 1), c.whenClear);
-    // No other column changes.
-    std::string row = view.Row(TRUNK_ROW);
-    row[static_cast<std::size_t>(c.col)] = ' ';
-    EXPECT_EQ(row, std::string(100, ' '));
-    EXPECT_EQ(view.Refreshes(), 4);
+TEST(TrunkObserver, EachAlarmMarksItsColumnWithItsSense) {
+    // "Sig" and "DChan" tell that the signal or the D channel is good: their sense is reversed.
+    const AlarmCase cases[] = {
+        {5633, 54, "X", " "},  // Red
+        {5634, 60, "X", " "},  // Yellow
+        {5635, 72, "X", " "},  // AIS
+        {5636, 42, " ", "X"},  // loss of signal
+        {5637, 48, "X", " "},  // loopback
+        {5638, 66, "X", " "},  // RAI CRC
+        {5642, 78, " ", "X"},  // D channel
+    };
+    for (const AlarmCase& c : cases) {
+        SCOPED_TRACE(c.code);
+        TrunkRow t;
+        t.Alarm(c.code, 1);
+        EXPECT_EQ(t.view.At(TRUNK_ROW, c.col, 1), c.whenActive);
+        t.Alarm(c.code, 0);
+        EXPECT_EQ(t.view.At(TRUNK_ROW, c.col, 1), c.whenClear);
+        // Any state but 1 counts as clear.
+        t.Alarm(c.code, 1);
+        t.Alarm(c.code, 2);
+        EXPECT_EQ(t.view.At(TRUNK_ROW, c.col, 1), c.whenClear);
+        // No other column changes.
+        std::string row = t.view.Row(TRUNK_ROW);
+        row[static_cast<std::size_t>(c.col)] = ' ';
+        EXPECT_EQ(row, std::string(100, ' '));
+        EXPECT_EQ(t.view.Refreshes(), 4);
+    }
 }
 
-// "Sig" and "DChan" tell that the signal or the D channel is good: their sense is reversed.
-INSTANTIATE_TEST_SUITE_P(Alarms, AlarmColumnTest,
-                         ::testing::Values(AlarmCase{5633, 54, "X", " "},  // Red
-                                           AlarmCase{5634, 60, "X", " "},  // Yellow
-                                           AlarmCase{5635, 72, "X", " "},  // AIS
-                                           AlarmCase{5636, 42, " ", "X"},  // loss of signal
-                                           AlarmCase{5637, 48, "X", " "},  // loopback
-                                           AlarmCase{5638, 66, "X", " "},  // RAI CRC
-                                           AlarmCase{5642, 78, " ", "X"}   // D channel
-                                           ));
-
-class TrunkObserverTest : public TrunkObserverFixture, public ::testing::Test {};
+class TrunkObserverTest : public ::testing::Test, protected TrunkRow {};
 
 // The counters go up on every event whatever its state, and a loopback clear leaves them
 // alone.

@@ -128,6 +128,17 @@ std::vector<int> Keys(std::initializer_list<std::variant<const char*, int>> part
 
 constexpr std::size_t ANY_CURSOR = ~std::size_t{0};
 
+// Feeds the keys to the editor; a line entered begins the next one, as the prompt does.
+void Feed(LineEditor& editor, const std::vector<int>& keys, std::size_t limit = 1024) {
+    for (std::size_t i = 0; i < keys.size(); ++i) {
+        const bool enters = keys[i] == '\n' || keys[i] == '\r';
+        ASSERT_EQ(editor.Feed(keys[i]) == LineEditor::Result::Entered, enters) << i;
+        if (enters && i + 1 < keys.size()) {
+            editor.Start(limit);
+        }
+    }
+}
+
 struct EditCase {
     std::vector<int> keys;
     std::string line;
@@ -135,8 +146,8 @@ struct EditCase {
     std::size_t limit = 1024;
 };
 
-// Each case feeds one editor; an entered line begins the next one as the prompt does, so the
-// later keys of a case meet the lines it entered in the history.
+// Each case feeds one editor, so the later keys of a case meet the lines it entered in the
+// history.
 TEST(LineEditor, KeysEditTheLineAndWalkTheHistory) {
     const int up = Key::Up;
     const int down = Key::Down;
@@ -179,13 +190,7 @@ TEST(LineEditor, KeysEditTheLineAndWalkTheHistory) {
         SCOPED_TRACE("'" + c.line + "'");
         LineEditor editor;
         editor.Start(c.limit);
-        for (std::size_t i = 0; i < c.keys.size(); ++i) {
-            const bool enters = c.keys[i] == '\n' || c.keys[i] == '\r';
-            ASSERT_EQ(editor.Feed(c.keys[i]) == LineEditor::Result::Entered, enters) << i;
-            if (enters && i + 1 < c.keys.size()) {
-                editor.Start(c.limit);
-            }
-        }
+        Feed(editor, c.keys, c.limit);
         EXPECT_EQ(editor.Line(), c.line);
         if (c.cursor != ANY_CURSOR) {
             EXPECT_EQ(editor.Cursor(), c.cursor);
@@ -193,67 +198,44 @@ TEST(LineEditor, KeysEditTheLineAndWalkTheHistory) {
     }
 }
 
-class LineEditorTest : public ::testing::Test {
-  protected:
-    void SetUp() override { editor.Start(1024); }
-
-    void Type(const std::string& text) {
-        for (char c : text) {
-            editor.Feed(static_cast<unsigned char>(c));
-        }
-    }
-    void Press(std::initializer_list<int> keys) {
-        for (int key : keys) {
-            editor.Feed(key);
-        }
-    }
-    void Enter(const std::string& text) {
-        Type(text + "\n");
-        editor.Start(1024);
-    }
-
+TEST(LineEditor, TheLatestHundredLinesAreKept) {
     LineEditor editor;
-};
-
-TEST_F(LineEditorTest, TheLatestHundredLinesAreKept) {
+    editor.Start(1024);
+    std::string lines;
     for (int i = 0; i <= 100; ++i) {
-        Enter("line " + std::to_string(i));
+        lines += "line " + std::to_string(i) + "\n";
     }
-    for (int i = 0; i < 100; ++i) {
-        Press({Key::Up});
-    }
-    EXPECT_EQ(editor.Line(), "line 1");
-    Press({Key::Up});
+    Feed(editor, Keys({lines.c_str()}));
+    editor.Start(1024);
+    Feed(editor, std::vector<int>(101, Key::Up));
     EXPECT_EQ(editor.Line(), "line 1");
 }
 
-TEST_F(LineEditorTest, ALongLineScrollsToKeepTheCursorInView) {
-    auto shown = [&](std::size_t width) {
-        const LineEditor::Visible visible = editor.Show(width);
+TEST(LineEditor, ALongLineScrollsToKeepTheCursorInView) {
+    LineEditor editor;
+    editor.Start(1024);
+    auto shown = [&](const std::vector<int>& keys) {
+        Feed(editor, keys);
+        const LineEditor::Visible visible = editor.Show(4);
         return visible.text + "|" + std::to_string(visible.cursor);
     };
-    Type("abcdefghij");
     // The cursor at the end takes the last cell.
-    EXPECT_EQ(shown(4), "hij|3");
-    Press({Key::Left, Key::Left, Key::Left, Key::Left, Key::Left, Key::Left});
-    EXPECT_EQ(shown(4), "efgh|0");
+    EXPECT_EQ(shown(Keys({"abcdefghij"})), "hij|3");
+    EXPECT_EQ(shown(std::vector<int>(6, Key::Left)), "efgh|0");
     // Moving right within the shown part does not scroll.
-    Press({Key::Right, Key::Right});
-    EXPECT_EQ(shown(4), "efgh|2");
-    Press({Key::Home});
-    EXPECT_EQ(shown(4), "abcd|0");
+    EXPECT_EQ(shown({Key::Right, Key::Right}), "efgh|2");
+    EXPECT_EQ(shown({Key::Home}), "abcd|0");
     // Shortening the line brings text back into view.
-    Press({Key::End, 0x17});
-    EXPECT_EQ(shown(4), "|0");
-    Type("xy");
-    EXPECT_EQ(shown(4), "xy|2");
+    EXPECT_EQ(shown({Key::End, 0x17}), "|0");
+    EXPECT_EQ(shown(Keys({"xy"})), "xy|2");
     EXPECT_EQ(editor.Show(0).text, "");
 }
 
-TEST(CmdProcessor, RegistersEachNameOnceAndTracesIt) {
+TEST(CmdProcessor, RegistersEachNameOnceTracesItAndFindsItExactly) {
     CmdProcessor processor(nullptr);
     Command first("phone");
     Command second("phone");
+    Command quit("quit");
     LogCapture out;
 
     EXPECT_EQ(processor.RegisterCommand(nullptr), -2);
@@ -261,20 +243,11 @@ TEST(CmdProcessor, RegistersEachNameOnceAndTracesIt) {
     EXPECT_EQ(processor.RegisterCommand(&first), 0);
     EXPECT_EQ(out.Text(), "Calling CmdProcessor::RegisterCommand\ncommand name: phone\n");
     EXPECT_EQ(processor.RegisterCommand(&second), -1);
-    EXPECT_EQ(processor.FindCommand("phone"), &first);
-}
-
-TEST(CmdProcessor, FindTracesTheWordAndMatchesExactly) {
-    CmdProcessor processor(nullptr);
-    Command quit("quit");
-    Command trunk("trunk");
-    LogCapture out;
     processor.RegisterCommand(&quit);
-    processor.RegisterCommand(&trunk);
 
+    EXPECT_EQ(processor.FindCommand("phone"), &first);
     EXPECT_EQ(processor.FindCommand("quit"), &quit);
-    EXPECT_EQ(processor.FindCommand("trunk"), &trunk);
-    for (const char* miss : {"QUIT", "Quit", "qui", "quit ", "trunk_ins", ""}) {
+    for (const char* miss : {"QUIT", "Quit", "qui", "quit ", "phone_ins", ""}) {
         EXPECT_EQ(processor.FindCommand(miss), nullptr) << "'" << miss << "'";
     }
     EXPECT_NE(out.Text().find("Calling CmdProcessor::FindCommand: cmdStr= QUIT\n"),

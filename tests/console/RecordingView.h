@@ -1,5 +1,7 @@
 #pragma once
 
+#include <algorithm>
+#include <iterator>
 #include <string>
 #include <vector>
 
@@ -56,19 +58,13 @@ class RecordingView : public View {
     }
     std::string Row(int row) const { return screen_[static_cast<std::size_t>(row)]; }
     int Refreshes() const {
-        int n = 0;
-        for (const Call& c : calls) {
-            n += c.what == "refresh" ? 1 : 0;
-        }
-        return n;
+        return static_cast<int>(std::count_if(calls.begin(), calls.end(),
+                                              [](const Call& c) { return c.what == "refresh"; }));
     }
     std::vector<Call> Prints() const {
         std::vector<Call> out;
-        for (const Call& c : calls) {
-            if (c.what == "print") {
-                out.push_back(c);
-            }
-        }
+        std::copy_if(calls.begin(), calls.end(), std::back_inserter(out),
+                     [](const Call& c) { return c.what == "print"; });
         return out;
     }
 

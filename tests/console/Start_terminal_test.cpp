@@ -49,9 +49,7 @@ TEST(Startup, EarlyEndsShowTheirTextAndLeaveTheLogsAlone) {
             TerminalOptions().Size(c.rows, c.cols).Args(c.args).File("lineprobe.log", EARLIER_RUN));
         ASSERT_EQ(session.WaitForExit(), std::optional<int>(c.status)) << session.Dump();
         for (std::size_t row = 0; row < c.screen.size(); ++row) {
-            EXPECT_TRUE(session.WaitForRow(static_cast<int>(row), c.screen[row]))
-                << "row " << row << " should read '" << c.screen[row] << "':\n"
-                << session.Dump();
+            EXPECT_TRUE(session.WaitForRow(static_cast<int>(row), c.screen[row]));
         }
         EXPECT_EQ(session.ReadLog(), std::optional<std::string>(EARLIER_RUN));
         EXPECT_FALSE(session.ReadErrLog().has_value());
@@ -66,13 +64,9 @@ TEST(Startup, DrawsTheLayoutIntoFreshLogs) {
                                 .Size(40, 100)
                                 .File("lineprobe.log", "stale trace line\n")
                                 .File("lineprobe_err.log", "stale error line\n"));
-    ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << session.Dump();
-    const std::vector<std::string> screen = session.Screen();
-    for (int row : SEPARATOR_ROWS) {
-        EXPECT_TRUE(IsSeparatorRow(screen[static_cast<std::size_t>(row)])) << "row " << row << "\n"
-                                                                           << session.Dump();
-    }
-    EXPECT_EQ(screen[PROMPT_ROW].substr(0, 5), "  -> ");
+    ASSERT_TRUE(session.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT));
+    EXPECT_TRUE(SeparatorsDrawn(session));
+    EXPECT_EQ(session.Row(PROMPT_ROW).substr(0, 5), "  -> ");
     ASSERT_TRUE(session.WaitForLogLine("lineprobe.log", "command name: stoprai"));
     const std::optional<std::string> log = session.ReadLog();
     ASSERT_TRUE(log);
@@ -126,8 +120,8 @@ TEST(Startup, UnusableRelayIsReportedOnARestoredTerminal) {
         const std::string modes = session.TerminalModes();
         EXPECT_NE(modes.find(" icanon"), std::string::npos) << modes;
         EXPECT_NE(modes.find(" echo "), std::string::npos) << modes;
-        EXPECT_TRUE(session.WaitForText("lineprobe: " + cause, 2s)) << session.Dump();
-        EXPECT_TRUE(session.WaitForText(c.reason, 0ms)) << session.Dump();
+        EXPECT_TRUE(session.WaitForText("lineprobe: " + cause, 2s));
+        EXPECT_TRUE(session.WaitForText(c.reason, 0ms));
         EXPECT_FALSE(session.WaitForText("terminate called", 0ms)) << session.Dump();
         const auto errors = session.ReadErrLog();
         ASSERT_TRUE(errors);

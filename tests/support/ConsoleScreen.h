@@ -6,6 +6,7 @@
 #include <optional>
 #include <string>
 #include <thread>
+#include <vector>
 
 #include "TerminalSession.h"
 
@@ -36,15 +37,19 @@ inline constexpr const char* LOOKUP_TRACE = "Calling CmdProcessor::FindCommand: 
 // A separator line: the first 100 columns all hold one and the same line character
 // (how a line-drawing character reads back depends on the terminal type).
 inline bool IsSeparatorRow(const std::string& row) {
-    if (row.size() < 100 || row[0] == ' ') {
-        return false;
-    }
-    for (std::size_t col = 0; col < 100; ++col) {
-        if (row[col] != row[0]) {
-            return false;
+    return row.size() >= 100 && row[0] != ' ' && row.find_first_not_of(row[0]) >= 100;
+}
+
+// Passes when the separator rows of the layout are whole.
+inline ::testing::AssertionResult SeparatorsDrawn(TerminalSession& session) {
+    const std::vector<std::string> screen = session.Screen();
+    for (int row : SEPARATOR_ROWS) {
+        if (!IsSeparatorRow(screen[static_cast<std::size_t>(row)])) {
+            return ::testing::AssertionFailure() << "no separator on row " << row << ":\n"
+                                                 << session.Dump();
         }
     }
-    return true;
+    return ::testing::AssertionSuccess();
 }
 
 inline std::size_t CountOccurrences(const std::string& text, const std::string& what) {
@@ -115,6 +120,12 @@ class CommandRunner {
     void TypeOnly(const std::string& line) {
         session_.TypeLine(line);
         ++lookups_;
+    }
+
+    // Runs the line and gives its result row; why it did not run, when it did not.
+    std::string Output(const std::string& line) {
+        const ::testing::AssertionResult ran = Run(line);
+        return ran ? Result() : std::string("(did not run) ") + ran.message();
     }
 
     // The result row of the command window, without the trailing blanks.

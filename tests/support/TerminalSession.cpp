@@ -1,19 +1,16 @@
 #include "TerminalSession.h"
 
-#include <fcntl.h>
-#include <spawn.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <atomic>
 #include <csignal>
+#include <cstdio>
 #include <cstdlib>
 #include <fstream>
 #include <sstream>
 #include <stdexcept>
 #include <thread>
-
-extern char** environ;
 
 namespace lineprobe::testing {
 
@@ -34,96 +31,52 @@ std::string ShellQuote(const std::string& text) {
     return quoted + "'";
 }
 
-// The environment of the tmux client and so of its server and panes: a plain C locale,
-// so that line-drawing characters are read back one byte per column, and no trace of a
-// tmux the tests themselves may run in.
-std::vector<std::string> ClientEnvironment() {
-    std::vector<std::string> env;
-    for (char** entry = environ; *entry != nullptr; ++entry) {
-        const std::string text = *entry;
-        const std::string name = text.substr(0, text.find('='));
-        if (name == "TMUX" || name == "TMUX_PANE" || name == "LANG" || name.rfind("LC_", 0) == 0) {
-            continue;
-        }
-        env.push_back(text);
-    }
-    env.push_back("LC_ALL=C");
-    return env;
-}
-
+// Runs the command without a shell's reading of its words. The tmux client, and so its server
+// and panes, gets a plain C locale, so that line-drawing characters are read back one byte per
+// column, and no trace of a tmux the tests themselves may run in.
 std::string RunCapture(const std::vector<std::string>& argv, int* status) {
-    int pipeFds[2];
-    if (pipe2(pipeFds, O_CLOEXEC) != 0) {
-        throw std::runtime_error("pipe failed");
-    }
-    posix_spawn_file_actions_t actions;
-    posix_spawn_file_actions_init(&actions);
-    posix_spawn_file_actions_adddup2(&actions, pipeFds[1], STDOUT_FILENO);
-    posix_spawn_file_actions_addopen(&actions, STDERR_FILENO, "/dev/null", O_WRONLY, 0);
-    posix_spawn_file_actions_addopen(&actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
-
-    std::vector<char*> args;
+    std::string command = "env -u TMUX -u TMUX_PANE LC_ALL=C";
     for (const std::string& arg : argv) {
-        args.push_back(const_cast<char*>(arg.c_str()));
+        command += " " + ShellQuote(arg);
     }
-    args.push_back(nullptr);
-    std::vector<std::string> envText = ClientEnvironment();
-    std::vector<char*> env;
-    for (std::string& entry : envText) {
-        env.push_back(entry.data());
-    }
-    env.push_back(nullptr);
-
-    pid_t child = -1;
-    const int spawned = posix_spawnp(&child, args[0], &actions, nullptr, args.data(), env.data());
-    posix_spawn_file_actions_destroy(&actions);
-    close(pipeFds[1]);
-    if (spawned != 0) {
-        close(pipeFds[0]);
-        throw std::runtime_error("cannot run " + argv[0]);
-    }
-    std::string output;
-    char buffer[4096];
-    for (;;) {
-        const ssize_t got = read(pipeFds[0], buffer, sizeof buffer);
-        if (got > 0) {
-            output.append(buffer, static_cast<std::size_t>(got));
-        } else if (got == 0 || errno != EINTR) {
-            break;
-        }
-    }
-    close(pipeFds[0]);
-    int waitStatus = 0;
-    while (waitpid(child, &waitStatus, 0) < 0 && errno == EINTR) {
-    }
-    if (status != nullptr) {
-        *status = WIFEXITED(waitStatus) ? WEXITSTATUS(waitStatus) : -1;
-    }
-    return output;
+    return ShellOutput(command + " 2>/dev/null </dev/null", status);
 }
 
 template <typename Predicate>
 bool PollUntil(std::chrono::milliseconds timeout, Predicate done) {
     const auto deadline = std::chrono::steady_clock::now() + timeout;
-    for (;;) {
-        if (done()) {
-            return true;
-        }
+    while (!done()) {
         if (std::chrono::steady_clock::now() >= deadline) {
             return false;
         }
         std::this_thread::sleep_for(POLL_STEP);
     }
+    return true;
 }
 
 std::string Trimmed(std::string text) {
-    while (!text.empty() && (text.back() == '\n' || text.back() == ' ')) {
-        text.pop_back();
-    }
+    text.erase(text.find_last_not_of(" \n") + 1);
     return text;
 }
 
 }  // namespace
+
+std::string ShellOutput(const std::string& command, int* status) {
+    std::string output;
+    FILE* pipe = popen(command.c_str(), "r");
+    if (pipe == nullptr) {
+        throw std::runtime_error("cannot run " + command);
+    }
+    char buffer[4096];
+    for (std::size_t got; (got = fread(buffer, 1, sizeof buffer, pipe)) > 0;) {
+        output.append(buffer, got);
+    }
+    const int waitStatus = pclose(pipe);
+    if (status != nullptr) {
+        *status = WIFEXITED(waitStatus) ? WEXITSTATUS(waitStatus) : -1;
+    }
+    return output;
+}
 
 std::optional<std::string> ReadWholeFile(const std::filesystem::path& path) {
     std::ifstream file(path, std::ios::binary);
@@ -311,13 +264,22 @@ std::string TerminalSession::Dump() {
     return out.str();
 }
 
-bool TerminalSession::WaitForTextAt(int row, int col, const std::string& text,
-                                    std::chrono::milliseconds timeout) {
-    return PollUntil(timeout, [&] { return TextAt(row, col, text.size()) == text; });
+::testing::AssertionResult TerminalSession::Waited(bool found, const std::string& what) {
+    if (found) {
+        return ::testing::AssertionSuccess();
+    }
+    return ::testing::AssertionFailure() << "no " << what << " on the screen:\n" << Dump();
 }
 
-bool TerminalSession::WaitForText(const std::string& text, std::chrono::milliseconds timeout) {
-    return PollUntil(timeout, [&] {
+::testing::AssertionResult TerminalSession::WaitForTextAt(int row, int col, const std::string& text,
+                                                          std::chrono::milliseconds timeout) {
+    const bool found = PollUntil(timeout, [&] { return TextAt(row, col, text.size()) == text; });
+    return Waited(found, "'" + text + "' at " + std::to_string(row) + "," + std::to_string(col));
+}
+
+::testing::AssertionResult TerminalSession::WaitForText(const std::string& text,
+                                                        std::chrono::milliseconds timeout) {
+    const bool found = PollUntil(timeout, [&] {
         for (const std::string& line : Screen()) {
             if (line.find(text) != std::string::npos) {
                 return true;
@@ -325,23 +287,28 @@ bool TerminalSession::WaitForText(const std::string& text, std::chrono::millisec
         }
         return false;
     });
+    return Waited(found, "'" + text + "'");
 }
 
-bool TerminalSession::WaitForRow(int row, const std::string& text,
-                                 std::chrono::milliseconds timeout) {
-    return PollUntil(timeout, [&] { return Trimmed(Row(row)) == text; });
+::testing::AssertionResult TerminalSession::WaitForRow(int row, const std::string& text,
+                                                       std::chrono::milliseconds timeout) {
+    const bool found = PollUntil(timeout, [&] { return Trimmed(Row(row)) == text; });
+    return Waited(found, "row " + std::to_string(row) + " reading '" + text + "'");
 }
 
 std::optional<std::string> TerminalSession::ReadFile(const std::string& name) const {
     return ReadWholeFile(workDir_ / name);
 }
 
-bool TerminalSession::WaitForLogLine(const std::string& file, const std::string& text,
-                                     std::chrono::milliseconds timeout) {
-    return PollUntil(timeout, [&] {
-        const std::optional<std::string> content = ReadFile(file);
-        return content && HasLine(*content, text);
-    });
+::testing::AssertionResult TerminalSession::WaitForLogLine(const std::string& file,
+                                                           const std::string& text,
+                                                           std::chrono::milliseconds timeout) {
+    std::optional<std::string> content;
+    if (PollUntil(timeout, [&] { return (content = ReadFile(file)) && HasLine(*content, text); })) {
+        return ::testing::AssertionSuccess();
+    }
+    return ::testing::AssertionFailure() << "no line '" << text << "' in " << file << ":\n"
+                                         << content.value_or("(no file)");
 }
 
 bool TerminalSession::AlternateScreen() {

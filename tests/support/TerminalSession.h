@@ -77,19 +77,21 @@ class TerminalSession {
     // The whole screen with row numbers, for failure messages.
     std::string Dump();
 
-    bool WaitForTextAt(int row, int col, const std::string& text,
-                       std::chrono::milliseconds timeout = DEFAULT_WAIT);
-    bool WaitForText(const std::string& text, std::chrono::milliseconds timeout = DEFAULT_WAIT);
+    // The waits fail with what they looked for and the screen as it was.
+    ::testing::AssertionResult WaitForTextAt(int row, int col, const std::string& text,
+                                             std::chrono::milliseconds timeout = DEFAULT_WAIT);
+    ::testing::AssertionResult WaitForText(const std::string& text,
+                                           std::chrono::milliseconds timeout = DEFAULT_WAIT);
     // Waits for the row to read exactly `text` followed by blanks only.
-    bool WaitForRow(int row, const std::string& text,
-                    std::chrono::milliseconds timeout = DEFAULT_WAIT);
+    ::testing::AssertionResult WaitForRow(int row, const std::string& text,
+                                          std::chrono::milliseconds timeout = DEFAULT_WAIT);
 
     std::optional<std::string> ReadFile(const std::string& name) const;
     std::optional<std::string> ReadLog() const { return ReadFile("lineprobe.log"); }
     std::optional<std::string> ReadErrLog() const { return ReadFile("lineprobe_err.log"); }
-    // Waits until the file holds `text` as a whole line.
-    bool WaitForLogLine(const std::string& file, const std::string& text,
-                        std::chrono::milliseconds timeout = DEFAULT_WAIT);
+    // Waits until the file holds `text` as a whole line; fails with what the file holds.
+    ::testing::AssertionResult WaitForLogLine(const std::string& file, const std::string& text,
+                                              std::chrono::milliseconds timeout = DEFAULT_WAIT);
 
     // Whether the pane shows the alternate screen (a curses program that has not ended
     // curses), and the modes of its terminal as `stty -a` prints them.
@@ -113,6 +115,7 @@ class TerminalSession {
   private:
     std::string Tmux(const std::vector<std::string>& args, int* status = nullptr);
     std::string PaneFormat(const std::string& format);
+    ::testing::AssertionResult Waited(bool found, const std::string& what);
 
     std::filesystem::path root_;
     std::filesystem::path workDir_;
@@ -121,6 +124,9 @@ class TerminalSession {
     int cols_;
     pid_t pid_ = -1;
 };
+
+// What a shell command prints on its standard output; its exit status in `status`.
+std::string ShellOutput(const std::string& command, int* status = nullptr);
 
 // Reads a whole file; nothing if it cannot be opened.
 std::optional<std::string> ReadWholeFile(const std::filesystem::path& path);
