@@ -109,12 +109,6 @@ TEST_F(PromptTest, LookupFieldCountsAndTheResultRowUpToQuit) {
     Enter("   ", "quit", ++quits);
     EXPECT_EQ(ResultRow().find_first_not_of(' '), std::string::npos) << session_.Dump();
 
-    // The word of a line of a thousand characters is cut safely, and the echo stays on the
-    // prompt row: nothing spills onto the rows below.
-    Enter(std::string(1000, 'x'), std::string(255, 'x'));
-    EXPECT_TRUE(session_.WaitForRow(RESULT_ROW, "  Unrecgnized Command"));
-    EXPECT_TRUE(session_.WaitForRow(RESULT_ROW + 1, ""));
-
     // Without the directory of the help file help comes straight back, silently.
     Enter("help", "help");
     ExpectScreenIntact(session_);

@@ -342,13 +342,11 @@ TEST(ProcessCmdLineArgs, PrintsAndStops) {
         {{"-v", "-h"}, version + usage, 2},
         {{"-h", "-v"}, usage + version, 2},
         {{"-x"}, invalid, 0},
+        {{"-V"}, invalid, 0},
         {{"-v", "bogus"}, version + invalid, 1},
         // An unknown argument stops the walk.
         {{"bogus", "-v"}, invalid, 0},
-        {{"-V"}, invalid, 0},
         {{"-v", "-h", "-v"}, count, 0},
-        {{"a", "b", "c"}, count, 0},
-        {{"-v", "-v", "-v", "-v"}, count, 0},
     };
     for (const OptionCase& c : cases) {
         std::vector<std::string> args = c.args;
