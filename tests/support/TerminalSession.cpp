@@ -33,13 +33,15 @@ std::string ShellQuote(const std::string& text) {
 
 // Runs the command without a shell's reading of its words. The tmux client, and so its server
 // and panes, gets a plain C locale, so that line-drawing characters are read back one byte per
-// column, and no trace of a tmux the tests themselves may run in.
+// column, and no trace of a tmux the tests themselves may run in. A command that succeeds
+// writes nothing on its standard error, so the two are read together: a redirection of the
+// shell to a file would create that file if it were missing.
 std::string RunCapture(const std::vector<std::string>& argv, int* status) {
     std::string command = "env -u TMUX -u TMUX_PANE LC_ALL=C";
     for (const std::string& arg : argv) {
         command += " " + ShellQuote(arg);
     }
-    return ShellOutput(command + " 2>/dev/null </dev/null", status);
+    return ShellOutput(command + " 2>&1 </dev/null", status);
 }
 
 template <typename Predicate>
