@@ -114,53 +114,46 @@ TEST(TkMsgBlock, ReallocateKeepsPrefixAndZeroesTheRestAndTooLargeFails) {
     EXPECT_EQ(nullptr, m);
 }
 
-struct FieldCase {
-    const char* name;
-    unsigned int desc;
-    std::uint32_t value;  // low bytes hold the host value for narrow types
-    Bytes wire;
-};
-
-class TkVarFieldScalar : public ::testing::TestWithParam<FieldCase> {};
-
-TEST_P(TkVarFieldScalar, WritesBigEndianAndReadsBack) {
-    const FieldCase& c = GetParam();
-    Block b(16);
-    unsigned char host[4];
-    std::memcpy(host, &c.value, 4);
-    unsigned int offset = 3;
-    ASSERT_EQ(TK_OK, tkMsgVarFieldPut(b.m, 1, &offset, c.desc, host));
-    EXPECT_EQ(3u + c.wire.size(), offset);
-    Bytes expected(16, 0);
-    std::copy(c.wire.begin(), c.wire.end(), expected.begin() + 3);
-    EXPECT_TRUE(BytesAt(b.body(), expected));
-
-    unsigned char back[4] = {0xEE, 0xEE, 0xEE, 0xEE};
-    offset = 3;
-    ASSERT_EQ(TK_OK, tkMsgVarFieldGet(b.m, 1, &offset, c.desc, back));
-    EXPECT_EQ(3u + c.wire.size(), offset);
-    EXPECT_EQ(0, std::memcmp(back, host, c.wire.size()));
-    // Only the element's own width is written into the host value.
-    for (std::size_t i = c.wire.size(); i < 4; ++i) {
-        EXPECT_EQ(0xEE, back[i]);
+TEST(TkVarField, EveryTypeCodeWritesBigEndianAndReadsBack) {
+    struct {
+        unsigned int desc;
+        std::uint32_t value;  // low bytes hold the host value for narrow types
+        Bytes wire;
+    } const cases[] = {
+        {0x000000, 0xFE, {0xFE}},                          // s8
+        {0x080000, 0xFFFE, {0xFF, 0xFE}},                  // s16
+        {0x100000, 0x01020304, {0x01, 0x02, 0x03, 0x04}},  // word2
+        {0x180000, 0xFFFFFFFE, {0xFF, 0xFF, 0xFF, 0xFE}},  // s32
+        {0x200000, 0xAB, {0xAB}},                          // u8
+        {0x280000, 0xABCD, {0xAB, 0xCD}},                  // u16
+        {0x300000, 0xDEADBEEF, {0xDE, 0xAD, 0xBE, 0xEF}},  // word6
+        {0x380000, 0x80000001, {0x80, 0x00, 0x00, 0x01}},  // u32
+        {0x500000, 'Z', {0x5A}},                           // char
+        {0x880000, 0x0A0B0C0D, {0x0A, 0x0B, 0x0C, 0x0D}},  // word17
+        {0x400000, 0x11223344, {0x11, 0x22, 0x33, 0x44}},  // code8
+        {0xF80000, 0x55667788, {0x55, 0x66, 0x77, 0x88}},  // code31
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(testing::Message() << std::hex << c.desc);
+        Block b(16);
+        unsigned char host[4];
+        std::memcpy(host, &c.value, 4);
+        unsigned int offset = 3;
+        ASSERT_EQ(TK_OK, tkMsgVarFieldPut(b.m, 1, &offset, c.desc, host));
+        EXPECT_EQ(3u + c.wire.size(), offset);
+        Bytes expected(16, 0);
+        std::copy(c.wire.begin(), c.wire.end(), expected.begin() + 3);
+        EXPECT_TRUE(BytesAt(b.body(), expected));
+        // Only the element's own width is written into the host value.
+        Bytes want(host, host + c.wire.size());
+        want.resize(4, 0xEE);
+        unsigned char back[4] = {0xEE, 0xEE, 0xEE, 0xEE};
+        offset = 3;
+        ASSERT_EQ(TK_OK, tkMsgVarFieldGet(b.m, 1, &offset, c.desc, back));
+        EXPECT_EQ(3u + c.wire.size(), offset);
+        EXPECT_TRUE(BytesAt(back, want));
     }
 }
-
-INSTANTIATE_TEST_SUITE_P(
-    EveryTypeCode, TkVarFieldScalar,
-    ::testing::Values(FieldCase{"s8", 0x000000, 0xFE, {0xFE}},
-                      FieldCase{"s16", 0x080000, 0xFFFE, {0xFF, 0xFE}},
-                      FieldCase{"word2", 0x100000, 0x01020304, {0x01, 0x02, 0x03, 0x04}},
-                      FieldCase{"s32", 0x180000, 0xFFFFFFFE, {0xFF, 0xFF, 0xFF, 0xFE}},
-                      FieldCase{"u8", 0x200000, 0xAB, {0xAB}},
-                      FieldCase{"u16", 0x280000, 0xABCD, {0xAB, 0xCD}},
-                      FieldCase{"word6", 0x300000, 0xDEADBEEF, {0xDE, 0xAD, 0xBE, 0xEF}},
-                      FieldCase{"u32", 0x380000, 0x80000001, {0x80, 0x00, 0x00, 0x01}},
-                      FieldCase{"char", 0x500000, 'Z', {0x5A}},
-                      FieldCase{"word17", 0x880000, 0x0A0B0C0D, {0x0A, 0x0B, 0x0C, 0x0D}},
-                      FieldCase{"code8", 0x400000, 0x11223344, {0x11, 0x22, 0x33, 0x44}},
-                      FieldCase{"code31", 0xF80000, 0x55667788, {0x55, 0x66, 0x77, 0x88}}),
-    [](const ::testing::TestParamInfo<FieldCase>& info) { return std::string(info.param.name); });
 
 TEST(TkVarField, ZeroOffsetComesBackZero) {
     Block b(8);
@@ -187,47 +180,37 @@ TEST(TkVarField, SeveralFieldsInOneCallArePacked) {
     EXPECT_TRUE(BytesAt(b.body(), {0x00, 0x00, 0x01, 0x02, 0x03, 0x04, 0x05, 0x06, 0x00, 0x00}));
 }
 
-struct CountCase {
-    unsigned int desc;
-    unsigned int elements;
-    unsigned int width;
-};
-
-class TkVarFieldCount : public ::testing::TestWithParam<CountCase> {};
-
-TEST_P(TkVarFieldCount, MovesCountElementsOfTheirWidth) {
-    const CountCase& c = GetParam();
-    unsigned int bytes = c.elements * c.width;
-    Block b(bytes + 8);
-    std::vector<unsigned char> host(bytes + 8);
-    // Elements 1, 2, 3... in host (little-endian) form: the low byte first.
-    for (unsigned int i = 0; i < c.elements; ++i) {
-        host[i * c.width] = static_cast<unsigned char>(i + 1);
-    }
-    unsigned int offset = 4;
-    ASSERT_EQ(TK_OK, tkMsgVarFieldPut(b.m, 1, &offset, c.desc, host.data()));
-    EXPECT_EQ(4 + bytes, offset);
-    // Last element, big-endian, right before the untouched tail.
-    unsigned char* last = b.body() + 4 + bytes - c.width;
-    EXPECT_EQ(static_cast<unsigned char>(c.elements), last[c.width - 1]);
-    if (c.width > 1) {
-        EXPECT_EQ(0, last[0]);
-    }
-    for (unsigned int i = 4 + bytes; i < bytes + 8; ++i) {
-        EXPECT_EQ(0, b.body()[i]);
+TEST(TkVarField, CountMovesThatManyElementsOfTheirWidth) {
+    // The type code with its count, the count and the element width.
+    const unsigned int cases[][3] = {
+        {0x201000, 3, 1},    // u8 x3
+        {0x27F000, 255, 1},  // u8 x255
+        {0x57F000, 255, 1},  // char x255
+        {0x53F800, 128, 1},  // char x128
+        {0x2FF000, 255, 2},  // u16 x255
+        {0x3FF000, 255, 4},  // u32 x255
+        {0x07F000, 255, 1},  // s8 x255
+        {0x27F800, 256, 1},  // u8 x256
+    };
+    for (const auto& [desc, elements, width] : cases) {
+        SCOPED_TRACE(testing::Message() << std::hex << desc);
+        unsigned int bytes = elements * width;
+        Block b(bytes + 8);
+        std::vector<unsigned char> host(bytes + 8);
+        // Elements 1, 2, 3... in host (little-endian) form: the low byte first.
+        for (unsigned int i = 0; i < elements; ++i) {
+            host[i * width] = static_cast<unsigned char>(i + 1);
+        }
+        unsigned int offset = 4;
+        ASSERT_EQ(TK_OK, tkMsgVarFieldPut(b.m, 1, &offset, desc, host.data()));
+        EXPECT_EQ(4 + bytes, offset);
+        // Last element, big-endian, right before the untouched tail.
+        Bytes last(width, 0);
+        last.back() = static_cast<unsigned char>(elements);
+        last.resize(width + 4, 0);
+        EXPECT_TRUE(BytesAt(b.body() + 4 + bytes - width, last));
     }
 }
-
-INSTANTIATE_TEST_SUITE_P(Chunks, TkVarFieldCount,
-                         ::testing::Values(CountCase{0x201000, 3, 1},    // u8 x3
-                                           CountCase{0x27F000, 255, 1},  // u8 x255
-                                           CountCase{0x57F000, 255, 1},  // char x255
-                                           CountCase{0x53F800, 128, 1},  // char x128
-                                           CountCase{0x2FF000, 255, 2},  // u16 x255
-                                           CountCase{0x3FF000, 255, 4},  // u32 x255
-                                           CountCase{0x07F000, 255, 1},  // s8 x255
-                                           CountCase{0x27F800, 256, 1}   // u8 x256
-                                           ));
 
 TEST(TkVarField, ReadPastTheEndYieldsZeros) {
     Block b(4);
@@ -430,27 +413,25 @@ TEST(TkSwitchBlocking, ReadWakesWhenABlockArrives) {
     EXPECT_EQ(99u, type.load());
 }
 
-class TkSwitchWake : public ::testing::TestWithParam<bool> {};
-
-TEST_P(TkSwitchWake, CloseOrUnbindWakesABlockedReader) {
-    BoundQueue a;
-    std::atomic<int> status{-1};
-    std::thread reader([&] {
-        TKMsg32Bit* m = nullptr;
-        status = tkMsgRead(a.q, 0, &m);
-        tkMsgFree(m);
-    });
-    std::this_thread::sleep_for(20ms);
-    if (GetParam()) {
-        tkQueueClose(a.q);
-    } else {
-        tkQueueUnbind(a.q, a.addr);
+TEST(TkSwitchBlocking, CloseOrUnbindWakesABlockedReader) {
+    for (bool close : {true, false}) {
+        BoundQueue a;
+        std::atomic<int> status{-1};
+        std::thread reader([&] {
+            TKMsg32Bit* m = nullptr;
+            status = tkMsgRead(a.q, 0, &m);
+            tkMsgFree(m);
+        });
+        std::this_thread::sleep_for(20ms);
+        if (close) {
+            tkQueueClose(a.q);
+        } else {
+            tkQueueUnbind(a.q, a.addr);
+        }
+        reader.join();
+        EXPECT_EQ(TK_ERR_CLOSED, status.load()) << (close ? "close" : "unbind");
     }
-    reader.join();
-    EXPECT_EQ(TK_ERR_CLOSED, status.load());
 }
-
-INSTANTIATE_TEST_SUITE_P(CloseAndUnbind, TkSwitchWake, ::testing::Bool());
 
 TEST(TkSwitchBlocking, ManyWritersOneReaderLoseNothing) {
     BoundQueue a;
