@@ -4,6 +4,7 @@
 
 #include <cstring>
 
+#include "CompDesc.h"
 #include "ScriptedRelay.h"
 
 namespace {
@@ -34,16 +35,9 @@ TKMsg32Bit* sampleBlock(unsigned int bodySize) {
     tkMsgAllocate(bodySize, &b);
     b->transTag = (0x123456u << 8) | 0x5Au;
     b->type = 0x1214;
-    b->srcInstance = 0x0102;
-    b->srcBoard = 3;
-    b->srcProcessor = 4;
-    b->srcComponent = 5;
-    b->srcNode = 6;
-    b->tgtInstance = 0x0708;
-    b->tgtBoard = 9;
-    b->tgtProcessor = 10;
-    b->tgtComponent = 11;
-    b->tgtNode = 12;
+    TKCompDesc src = compDesc(0x0102, 3, 4, 5, 6), tgt = compDesc(0x0708, 9, 10, 11, 12);
+    tkMsgFieldPut(b, TK_FIELD_SRC, &src);
+    tkMsgFieldPut(b, TK_FIELD_TGT, &tgt);
     for (unsigned int i = 0; i < bodySize; ++i) {
         tkMsgBody(b)[i] = static_cast<unsigned char>(0xAB + i);
     }
@@ -107,11 +101,7 @@ TEST(TKSFrame, MessageRoundTripKeepsTheFirstWord) {
 
 TEST(TKSFrame, OpenAndAssignedBodiesAreGolden) {
     TKSOpenRequest req;
-    req.addr.node = 1;
-    req.addr.board = 2;
-    req.addr.processor = 3;
-    req.addr.component = 4;
-    req.addr.instance = 0x0506;
+    req.addr = compDesc(0x0506, 2, 3, 4, 1);
     req.maxRetMsgSize = 512;
     req.depth = 5;
     const Bytes open =

@@ -15,6 +15,7 @@
 #include <utility>
 #include <vector>
 
+#include "CompDesc.h"
 #include "ScriptedRelay.h"
 #include "platform/tkhost/tkhost_switch.h"
 #include "transport/TKSRemoteMsgQueue.h"
@@ -217,9 +218,7 @@ TEST_F(LocalQueue, ZeroTimeOutSendsAndReturnsAnEmptyMessage) {
 
 TEST_F(LocalQueue, UndeliverableRequestTimesOutWithoutLeaking) {
     tkSwitchResetUndeliverableCount();
-    TKCompDesc nowhere{};
-    nowhere.board = 31;
-    TKSMsgRef req = makeRequest(nowhere, 13);
+    TKSMsgRef req = makeRequest(compDesc(0, 31), 13);
     EXPECT_EQ(nullptr, queue->request(req, 30, kCompletion, 0).getMsgRef());
     EXPECT_EQ(1u, tkSwitchUndeliverableCount());
 }
@@ -344,20 +343,8 @@ TKMsg32Bit* blockFor(TKCompDesc to, unsigned int type, unsigned int trans, unsig
     return b;
 }
 
-TKCompDesc boardOne() {
-    TKCompDesc d{};
-    d.board = 1;
-    return d;
-}
-
 TKSMsgQueue* openQueue(const ScriptedRelay& relay) {
-    TKCompDesc want{};
-    want.node = 1;
-    want.board = 2;
-    want.processor = 3;
-    want.component = 4;
-    want.instance = 0x0506;
-    return new TKSMsgQueue(want, 512, 5, relay.address().c_str());
+    return new TKSMsgQueue(compDesc(0x0506, 2, 3, 4, 1), 512, 5, relay.address().c_str());
 }
 
 void discard(sock&, TKMsg32Bit* b) {
@@ -383,8 +370,7 @@ TEST(RemoteQueue, OpenRequestAndReplyTravelAsFramesAndTheCloseIsAcknowledged) {
         ScriptedRelay::serve(conn, discard);
     });
     std::unique_ptr<TKSMsgQueue> q(openQueue(relay));
-    EXPECT_TRUE(q->getHostDesc() == ScriptedRelay::assignedAddress());
-    TKSMsgRef req(blockFor(boardOne(), kCommand, 0x2345, 3));
+    TKSMsgRef req(blockFor(compDesc(0, 1), kCommand, 0x2345, 3));
     req.getMsgRef()->transTag |= 0x5A;
     TKSMsgRef reply = q->request(req, 5000, kCompletion, 0);
     ASSERT_NE(nullptr, reply.getMsgRef());
@@ -536,7 +522,7 @@ TEST(RemoteReconnect, LostConnectionComesBackWithItsNewAddressAndRequestsFailAtO
     ASSERT_TRUE(waitUntil([&] { return q->transportFailed(); }, 5s));
     for (unsigned int type : {kCommand, 0x1216u}) {
         // Awaiting a completion or not, nothing is sent and nobody waits.
-        TKSMsgRef cutOff(blockFor(boardOne(), type, 77, 0));
+        TKSMsgRef cutOff(blockFor(compDesc(0, 1), type, 77, 0));
         auto t0 = Clock::now();
         EXPECT_EQ(nullptr,
                   q->request(cutOff, 5000, type == kCommand ? kCompletion : 0, 0).getMsgRef());
@@ -549,7 +535,7 @@ TEST(RemoteReconnect, LostConnectionComesBackWithItsNewAddressAndRequestsFailAtO
     cv.notify_all();
     ASSERT_TRUE(waitUntil([&] { return !q->transportFailed(); }, 10s));
     EXPECT_TRUE(q->getHostDesc() == secondAddress());
-    TKSMsgRef again(blockFor(boardOne(), kCommand, 79, 0));
+    TKSMsgRef again(blockFor(compDesc(0, 1), kCommand, 79, 0));
     TKSMsgRef reply = q->request(again, 5000, kCompletion, 0);
     ASSERT_NE(nullptr, reply.getMsgRef());
     EXPECT_EQ(kCompletion, reply.getMsgType());
@@ -583,7 +569,7 @@ TEST(RemoteReconnect, RequestWaitingWhenTheConnectionBreaksEndsAtOnce) {
         2);
     testing::internal::CaptureStderr();
     std::unique_ptr<TKSMsgQueue> q(openQueue(relay));
-    TKSMsgRef req(blockFor(boardOne(), kCommand, 80, 0));
+    TKSMsgRef req(blockFor(compDesc(0, 1), kCommand, 80, 0));
     auto t0 = Clock::now();
     EXPECT_EQ(nullptr, q->request(req, 5000, kCompletion, 0).getMsgRef());
     EXPECT_LT(Clock::now() - t0, 1s);
