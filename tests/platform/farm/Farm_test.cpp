@@ -384,6 +384,7 @@ TEST(FarmParser, ReadsEveryFieldOfABoard) {
     EXPECT_EQ(a.routing, Routing::Fixed);
     EXPECT_TRUE(a.media.empty());
     EXPECT_EQ(a.trunks, (std::vector<Trunk>{{1, 4, 4, Signaling::CAS, ""}}));
+    EXPECT_TRUE(a.analog());
     EXPECT_EQ(f->channelForNumber("0123"), (ChannelRef{1, 1, 24}));
     EXPECT_FALSE(f->channelForNumber("0124"));
     EXPECT_EQ(f->numbers.size(), 24u);
