@@ -4,32 +4,23 @@
 
 #include <cstring>
 
-namespace {
+#include "CompDesc.h"
 
-TKCompDesc addr(std::uint16_t instance, std::uint8_t board, std::uint8_t processor,
-                std::uint8_t component, std::uint8_t node) {
-    TKCompDesc d{};
-    d.instance = instance;
-    d.board = board;
-    d.processor = processor;
-    d.component = component;
-    d.node = node;
-    return d;
-}
+namespace {
 
 TEST(TKSMsgRef, HeaderAccessorsReachTheBlock) {
     TKSMsgRef r(6u);
     r.setMsgType(0x1214);
     r.setTrans(0x123456);
-    r.setSrcAddr(addr(1, 2, 3, 4, 5));
-    r.setTgtAddr(addr(6, 7, 8, 9, 10));
+    r.setSrcAddr(compDesc(1, 2, 3, 4, 5));
+    r.setTgtAddr(compDesc(6, 7, 8, 9, 10));
     TKMsg32Bit* b = r.getMsgRef();
     EXPECT_EQ(6u, r.getSize());
     EXPECT_EQ(0x1214u, b->type);
     EXPECT_EQ(0x12345600u, b->transTag);
     EXPECT_EQ(0x123456u, r.getTrans());
-    EXPECT_EQ(addr(1, 2, 3, 4, 5), r.getSrcAddr());
-    EXPECT_EQ(addr(6, 7, 8, 9, 10), r.getTgtAddr());
+    EXPECT_EQ(compDesc(1, 2, 3, 4, 5), r.getSrcAddr());
+    EXPECT_EQ(compDesc(6, 7, 8, 9, 10), r.getTgtAddr());
     EXPECT_EQ(4, b->srcComponent);
     EXPECT_EQ(10, b->tgtNode);
     r.free();
@@ -79,13 +70,13 @@ TEST(TKSMsgRefDeathTest, HeaderAccessOnAnEmptyHandleStops) {
 }
 
 TEST(TKCompDescEquality, DiffersOnEachOfTheFiveFields) {
-    TKCompDesc base = addr(1, 2, 3, 4, 5);
-    EXPECT_EQ(base, addr(1, 2, 3, 4, 5));
-    EXPECT_NE(base, addr(9, 2, 3, 4, 5));
-    EXPECT_NE(base, addr(1, 9, 3, 4, 5));
-    EXPECT_NE(base, addr(1, 2, 9, 4, 5));
-    EXPECT_NE(base, addr(1, 2, 3, 9, 5));
-    EXPECT_NE(base, addr(1, 2, 3, 4, 9));
+    TKCompDesc base = compDesc(1, 2, 3, 4, 5);
+    EXPECT_EQ(base, compDesc(1, 2, 3, 4, 5));
+    EXPECT_NE(base, compDesc(9, 2, 3, 4, 5));
+    EXPECT_NE(base, compDesc(1, 9, 3, 4, 5));
+    EXPECT_NE(base, compDesc(1, 2, 9, 4, 5));
+    EXPECT_NE(base, compDesc(1, 2, 3, 9, 5));
+    EXPECT_NE(base, compDesc(1, 2, 3, 4, 9));
     TKCompDesc padded = base;
     padded.reserved0 = 0x77;
     EXPECT_EQ(base, padded);

@@ -6,27 +6,22 @@
 #include <cstdio>
 #include <iostream>
 #include <string>
+#include <tuple>
 
 #include "transport/TKSCommon.h"
 
 namespace {
 
-TEST(TKSSockText, StnReadsDecimalAndHex) {
+TEST(TKSSockText, NumbersNamesAndAddresses) {
     EXPECT_EQ(7000, stn("7000"));
     EXPECT_EQ(6912, stn("0x1b00"));
     EXPECT_EQ(6912, stn("0X1B00"));
     EXPECT_EQ(-16, stn("-0x10"));
     EXPECT_EQ(0, stn("zx"));
-}
-
-TEST(TKSSockText, IsDnTellsNamesFromDottedAddresses) {
     EXPECT_FALSE(is_dn("10.0.0.1"));
     EXPECT_TRUE(is_dn("relay"));
     EXPECT_TRUE(is_dn("10.0.0.1a"));
     EXPECT_FALSE(is_dn(""));
-}
-
-TEST(TKSSockText, DntoipResolvesOrLeavesEmpty) {
     char dst[16] = "x";
     dntoip(dst, "localhost");
     EXPECT_EQ(std::string("127.0.0.1"), dst);
@@ -57,27 +52,20 @@ TEST(TKSSockText, FrameDiagnosticsPrintTheirFixedLayout) {
               "0x1 0xab 0x0 \n");
 }
 
-struct HostCase {
-    const char* text;
-    const char* address;
-    int port;
-};
-
-class TKSSockHost : public ::testing::TestWithParam<HostCase> {};
-
-TEST_P(TKSSockHost, ParsesHostAndPort) {
-    const HostCase& c = GetParam();
-    sock s(c.text, 6554);
-    ASSERT_FALSE(s.isFailed());
-    EXPECT_EQ(c.port, s.getPort());
-    EXPECT_EQ(std::string(c.address), inet_ntoa(s.getPeer().sin_addr));
+TEST(TKSSockHost, ParsesHostAndPort) {
+    const std::tuple<const char*, const char*, int> cases[] = {
+        {"10.0.0.1:7000", "10.0.0.1", 7000},
+        {"localhost:0x1b00", "127.0.0.1", 6912},
+        {"localhost", "127.0.0.1", 6554},
+        {"127.0.0.1:1:2", "127.0.0.1", 2},
+    };
+    for (auto [text, address, port] : cases) {
+        sock s(text, 6554);
+        ASSERT_FALSE(s.isFailed()) << text;
+        EXPECT_EQ(port, s.getPort()) << text;
+        EXPECT_EQ(std::string(address), inet_ntoa(s.getPeer().sin_addr));
+    }
 }
-
-INSTANTIATE_TEST_SUITE_P(Texts, TKSSockHost,
-                         ::testing::Values(HostCase{"10.0.0.1:7000", "10.0.0.1", 7000},
-                                           HostCase{"localhost:0x1b00", "127.0.0.1", 6912},
-                                           HostCase{"localhost", "127.0.0.1", 6554},
-                                           HostCase{"127.0.0.1:1:2", "127.0.0.1", 2}));
 
 TEST(TKSSockHost, UnknownNameFailsWithoutASocket) {
     sock s("no-such-host.invalid:7000", 6554);
