@@ -20,13 +20,9 @@ import re
 import sys
 
 SOURCE_EXT = (".h", ".hpp", ".c", ".cc", ".cpp")
-HEX_FROM = 0x1000
-DECIMAL_FROM = 0x1000
-
-# Lines whose text the product prints or logs with a wire number written into it, fixed as
-# they are: (path suffix, the line as it stands). None needs it today: the texts print numbers
-# through formats. An entry must name a text, never a number the code computes with.
-ALLOWED = []
+# Below this, hex or decimal, numbers are mostly sizes, counts and codes: only the positions
+# that say "a type" are looked at.
+LOOK_EVERYWHERE_FROM = 0x1000
 
 NUMBER = re.compile(r"(?<![\w.])(0[xX][0-9A-Fa-f]+|[0-9]+)(?:[uU][lL]{0,2}|[lL]{1,2}[uU]?)?(?![\w.])")
 CALL_FIRST_ARG = re.compile(
@@ -89,19 +85,11 @@ def scan_text(text, declared, types):
             value = int(lit, 16) if is_hex else int(lit, 10 if lit == "0" or lit[0] != "0" else 8)
             if value not in declared:
                 continue
-            if is_hex and value >= HEX_FROM:
-                hit = True
-            elif not is_hex and value >= DECIMAL_FROM:
-                hit = True
-            else:
-                hit = is_hex and value in types and CALL_FIRST_ARG.search(line[: m.start()]) is not None
-            if hit:
+            if value >= LOOK_EVERYWHERE_FROM or (
+                is_hex and value in types and CALL_FIRST_ARG.search(line[: m.start()])
+            ):
                 found.append((lineno, lit, line.strip()))
     return found
-
-
-def allowed(path, line):
-    return any(path.endswith(suffix) and line == text for suffix, text in ALLOWED)
 
 
 def scan_tree(src, declared, types):
@@ -114,9 +102,7 @@ def scan_tree(src, declared, types):
             path = os.path.join(root, name)
             rel = os.path.relpath(path, os.path.dirname(os.path.abspath(src)))
             text = open(path, encoding="utf-8", errors="replace").read()
-            for lineno, lit, line in scan_text(text, declared, types):
-                if not allowed(rel, line):
-                    found.append(f"{rel}:{lineno}: {lit}: {line}")
+            found += [f"{rel}:{n}: {lit}: {line}" for n, lit, line in scan_text(text, declared, types)]
     return found
 
 
