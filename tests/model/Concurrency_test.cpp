@@ -1,7 +1,10 @@
+// Event publishers while events flow on their readers' threads, and the relay restore's tasks.
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <chrono>
 #include <memory>
+#include <stdexcept>
 #include <string>
 #include <thread>
 #include <vector>
@@ -9,6 +12,7 @@
 #include "RecordingObserver.h"
 #include "SimFixture.h"
 #include "model/AllAlarms.h"
+#include "model/RelayRestore.h"
 #include "model/TSCCallState.h"
 #include "model/TrunkState.h"
 #include "model/VX7EventPublisher.h"
@@ -101,6 +105,59 @@ TEST_F(PublisherConcurrency, PublisherDestroyedWhileEventsFlow) {
     EXPECT_EQ(static_cast<RecordingObserver*>(watcher.Get())->WaitFor("Trunk State"),
               "Trunk State board=1 trunk=2 state=Out Of Service reason=Diagnostic");
     Control("line 1 2 in 0");
+}
+
+using namespace std::chrono_literals;
+
+bool WaitFor(const std::atomic<int>& value, int atLeast) {
+    const auto deadline = std::chrono::steady_clock::now() + 5s;
+    while (value.load() < atLeast) {
+        if (std::chrono::steady_clock::now() > deadline) {
+            return false;
+        }
+        std::this_thread::sleep_for(1ms);
+    }
+    return true;
+}
+
+// A view's task captures the view: once the view has removed it, it must neither be running
+// (the view is about to be freed) nor run again.
+TEST(RelayRestore, RemovedTaskHasFinishedAndNeverRunsAgain) {
+    std::atomic<int> begun{0};
+    std::atomic<int> ended{0};
+    int id = vx7diag::RelayRestore::Add([&] {
+        ++begun;
+        std::this_thread::sleep_for(200ms);
+        ++ended;
+    });
+    vx7diag::RelayRestore::RunAll();
+    ASSERT_TRUE(WaitFor(begun, 1));
+    vx7diag::RelayRestore::Remove(id);
+    EXPECT_EQ(1, ended.load());
+
+    std::atomic<int> other{0};
+    int later = vx7diag::RelayRestore::Add([&] { ++other; });
+    vx7diag::RelayRestore::RunAll();
+    ASSERT_TRUE(WaitFor(other, 1));
+    EXPECT_EQ(1, begun.load());
+    vx7diag::RelayRestore::Remove(later);
+}
+
+TEST(RelayRestore, TasksRunInTheOrderTheyCameAndAFailingOneStopsNoOther) {
+    std::vector<std::string> order;
+    std::atomic<int> done{0};
+    int first = vx7diag::RelayRestore::Add([&] { order.push_back("first"); });
+    int failing = vx7diag::RelayRestore::Add([] { throw std::runtime_error("board gone"); });
+    int last = vx7diag::RelayRestore::Add([&] {
+        order.push_back("last");
+        ++done;
+    });
+    vx7diag::RelayRestore::RunAll();
+    ASSERT_TRUE(WaitFor(done, 1));
+    EXPECT_EQ(std::vector<std::string>({"first", "last"}), order);
+    for (int id : {first, failing, last}) {
+        vx7diag::RelayRestore::Remove(id);
+    }
 }
 
 }  // namespace
