@@ -13,7 +13,6 @@
 #include "SimFixture.h"
 #include "model/AllAlarms.h"
 #include "model/RelayRestore.h"
-#include "model/TSCCallState.h"
 #include "model/TrunkState.h"
 #include "model/VX7EventPublisher.h"
 #include "model/VX7EventZLGLogger.h"
@@ -25,14 +24,9 @@ using namespace vx7diag;
 class PublisherConcurrency : public SimFixture {
   protected:
     static void SetUpTestSuite() { UseFarm(""); }
-    static AllAlarms allAlarms;
-    static TrunkState trunkState;
-    static TSCCallState callState;
+    static inline AllAlarms allAlarms;
+    static inline TrunkState trunkState;
 };
-
-AllAlarms PublisherConcurrency::allAlarms;
-TrunkState PublisherConcurrency::trunkState;
-TSCCallState PublisherConcurrency::callState;
 
 // Observers come and go on the console thread while a burst of events is being delivered on the
 // publisher's reader thread: every event that reaches an observer is whole and of its trunk.
@@ -70,20 +64,20 @@ TEST_F(PublisherConcurrency, TwoTrunksOneAspect) {
     ASSERT_TRUE(first.Attach(logger, &allAlarms));
     ASSERT_TRUE(second.Attach(logger, &allAlarms));
     testing::internal::CaptureStdout();
-    Control("ferr 1 1 200");
-    Control("ferr 1 2 200");
+    Control("ferr 1 1 300");
+    Control("ferr 1 2 300");
     auto& r1 = *static_cast<RecordingObserver*>(one.Get());
     auto& r2 = *static_cast<RecordingObserver*>(two.Get());
-    for (int i = 0; i < 300 && (r1.Texts().size() < 200 || r2.Texts().size() < 200); ++i) {
+    for (int i = 0; i < 500 && (r1.Texts().size() < 300 || r2.Texts().size() < 300); ++i) {
         std::this_thread::sleep_for(std::chrono::milliseconds(10));
     }
     testing::internal::GetCapturedStdout();
     EXPECT_EQ(r1.Texts(),
               std::vector<std::string>(
-                  200, "Alarm Event:  board=1 trunk=1 type=Frame Error Saturation state=Active"));
+                  300, "Alarm Event:  board=1 trunk=1 type=Frame Error Saturation state=Active"));
     EXPECT_EQ(r2.Texts(),
               std::vector<std::string>(
-                  200, "Alarm Event:  board=1 trunk=2 type=Frame Error Saturation state=Active"));
+                  300, "Alarm Event:  board=1 trunk=2 type=Frame Error Saturation state=Active"));
 }
 
 // A view that goes while its line is busy: the publisher is destroyed with events in flight,
@@ -125,38 +119,38 @@ bool WaitFor(const std::atomic<int>& value, int atLeast) {
 TEST(RelayRestore, RemovedTaskHasFinishedAndNeverRunsAgain) {
     std::atomic<int> begun{0};
     std::atomic<int> ended{0};
-    int id = vx7diag::RelayRestore::Add([&] {
+    int id = RelayRestore::Add([&] {
         ++begun;
         std::this_thread::sleep_for(200ms);
         ++ended;
     });
-    vx7diag::RelayRestore::RunAll();
+    RelayRestore::RunAll();
     ASSERT_TRUE(WaitFor(begun, 1));
-    vx7diag::RelayRestore::Remove(id);
+    RelayRestore::Remove(id);
     EXPECT_EQ(1, ended.load());
 
     std::atomic<int> other{0};
-    int later = vx7diag::RelayRestore::Add([&] { ++other; });
-    vx7diag::RelayRestore::RunAll();
+    int later = RelayRestore::Add([&] { ++other; });
+    RelayRestore::RunAll();
     ASSERT_TRUE(WaitFor(other, 1));
     EXPECT_EQ(1, begun.load());
-    vx7diag::RelayRestore::Remove(later);
+    RelayRestore::Remove(later);
 }
 
 TEST(RelayRestore, TasksRunInTheOrderTheyCameAndAFailingOneStopsNoOther) {
     std::vector<std::string> order;
     std::atomic<int> done{0};
-    int first = vx7diag::RelayRestore::Add([&] { order.push_back("first"); });
-    int failing = vx7diag::RelayRestore::Add([] { throw std::runtime_error("board gone"); });
-    int last = vx7diag::RelayRestore::Add([&] {
+    int first = RelayRestore::Add([&] { order.push_back("first"); });
+    int failing = RelayRestore::Add([] { throw std::runtime_error("board gone"); });
+    int last = RelayRestore::Add([&] {
         order.push_back("last");
         ++done;
     });
-    vx7diag::RelayRestore::RunAll();
+    RelayRestore::RunAll();
     ASSERT_TRUE(WaitFor(done, 1));
     EXPECT_EQ(std::vector<std::string>({"first", "last"}), order);
     for (int id : {first, failing, last}) {
-        vx7diag::RelayRestore::Remove(id);
+        RelayRestore::Remove(id);
     }
 }
 

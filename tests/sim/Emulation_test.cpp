@@ -42,6 +42,7 @@
 #include "platform/tkhost/tkhost.h"
 #include "sim/Builtin.h"
 #include "sim/ErrorCodes.h"
+#include "sim/RelayConnection.h"
 #include "sim/RelayServer.h"
 #include "transport/TKSFrame.h"
 
@@ -374,8 +375,14 @@ TEST_F(EmulationTest, AttachingMediaPutsAFlexibleChannelInServiceAndDetachTakesI
     EXPECT_EQ(refusal(tsc, 0x1234, &attach, 0x1235), kErrNoSuchComponent);
 }
 
-TEST_F(EmulationTest, DelayHoldsAnswersBack) {
+// A refusal carries the code it was given, until normal undoes it; a delay holds answers back.
+TEST_F(EmulationTest, OverridesRefuseWithTheirCodeAndDelayAnswers) {
     Proxy tsc(cd(tscOf(1, 2, 2)));
+    EXPECT_EQ(builtinControl("refuse 120f 77"), "ok");
+    EXPECT_EQ(refusal(tsc, 0x120F, &getChan, 0x1210), 0x77u);
+    EXPECT_EQ(builtinControl("normal 120f"), "ok");
+    EXPECT_EQ(chanState(tsc), 1u);
+
     EXPECT_EQ(builtinControl("delay 300"), "ok");
     Tsc::MsgGetChanStateCmplt_t st;
     tsc.setResponseTimeout(100);
@@ -641,14 +648,19 @@ class RelayTest : public testing::Test {
         halt();
         start(o, controlFd, controlOut);
     }
-    bool waitConnections(std::size_t n) {
-        for (int i = 0; i < 500; ++i) {
-            if (server->connectionCount() == n) {
-                return true;
-            }
+    // Whether `done` comes true within five seconds.
+    template <class P>
+    static bool eventually(P done) {
+        for (int i = 0; i < 500 && !done(); ++i) {
             std::this_thread::sleep_for(std::chrono::milliseconds(10));
         }
-        return false;
+        return done();
+    }
+    bool waitConnections(std::size_t n) {
+        return eventually([&] { return server->connectionCount() == n; });
+    }
+    bool logged(const std::string& text) {
+        return eventually([&] { return logBuf.text().find(text) != std::string::npos; });
     }
 
     LockedLog logBuf;
@@ -739,7 +751,7 @@ TEST_F(RelayTest, ClientVanishingMidFrameCostsNothing) {
         c.send(open);
     }
     EXPECT_TRUE(waitConnections(0));
-    EXPECT_NE(logBuf.text().find("closed in the middle of a frame"), std::string::npos);
+    EXPECT_TRUE(logged("closed in the middle of a frame"));
     Addressable a(cd(farm::lconAddress(3, 1)));
     Lcon::MsgGetLineStateCmplt_t st;
     a.request(0x1608, &getLine, 0x1609, &st);
@@ -791,7 +803,7 @@ TEST_F(RelayTest, OutOfDescriptorsAWaitingConnectionIsRefusedAndTheOthersServed)
         bad.send(kShortHeaderFrame);
         ASSERT_TRUE(bad.closedByServer());
     }
-    EXPECT_NE(logBuf.text().find("malformed message frame"), std::string::npos);
+    EXPECT_TRUE(logged("malformed message frame"));
 
     // Leave the process exactly one free descriptor: the next client takes it, so the server
     // cannot accept that client.
@@ -810,7 +822,7 @@ TEST_F(RelayTest, OutOfDescriptorsAWaitingConnectionIsRefusedAndTheOthersServed)
     }
     ASSERT_EQ(setrlimit(RLIMIT_NOFILE, &old), 0);
     EXPECT_TRUE(closed);
-    EXPECT_NE(logBuf.text().find("out of descriptors, refusing a connection"), std::string::npos);
+    EXPECT_TRUE(logged("out of descriptors, refusing a connection"));
 
     // The loop is not left spinning on the listening socket, and serves old and new
     // connections.
@@ -852,7 +864,7 @@ TEST_F(RelayTest, IdleConnectionsDoNotLockOutAClientThatOpens) {
         EXPECT_TRUE(c->closedByServer());
     }
     EXPECT_TRUE(waitConnections(1));
-    EXPECT_NE(logBuf.text().find("did not open within 600 ms"), std::string::npos);
+    EXPECT_TRUE(logged("did not open within 600 ms"));
     late.send(RawClient::request(farm::lconAddress(1, 1), Lcon::MsgGetLineState_t::MsgType));
     EXPECT_EQ(late.nextType(), TKS_FRAME_MESSAGE);
 }
@@ -901,7 +913,7 @@ TEST_F(RelayTest, QueuedOutputOfAllClientsIsCappedByCuttingTheWorstReader) {
     pipeline(2, [&] { return server->connectionCount() < 3; });
     ASSERT_TRUE(waitConnections(2));
     EXPECT_LE(statsCounter(*server, "queued"), 6 * kMiB);
-    EXPECT_NE(logBuf.text().find("most unread"), std::string::npos);
+    EXPECT_TRUE(logged("most unread"));
 
     // The two others get every answer; the first one's stop short.
     std::vector<unsigned char> head = c[1]->read(TKS_FRAME_HEADER_SIZE);
@@ -983,6 +995,48 @@ TEST_F(RelayTest, TheTailOfAnOverlongControlLineDoesNotRun) {
     ::close(p[1]);
     restart(defaults());
     ::close(p[0]);
+}
+
+// One connection's framing alone, over a socket pair on which the test plays the client: with
+// nothing to read the connection goes on; a frame comes out only when whole, two in one read
+// both do.
+TEST(RelayConnection, AFrameComesOutOnlyWhenWholeAndTwoInOneReadBothDo) {
+    int fds[2];
+    ASSERT_EQ(::socketpair(AF_UNIX, SOCK_STREAM | SOCK_NONBLOCK, 0, fds), 0);
+    RelayConnection conn(fds[0], 7, Clock::now());
+    const RelayConnection::Read none = conn.receive();
+    EXPECT_EQ(none.bytes, 0u);
+    EXPECT_FALSE(none.ended);
+
+    auto frame = [](std::uint32_t type, std::string body, std::string ex) {
+        msg_t m;
+        m.type = type;
+        m.size = static_cast<std::uint32_t>(body.size());
+        m.ex_size = static_cast<std::uint32_t>(ex.size());
+        m.body = reinterpret_cast<unsigned char*>(body.data());
+        m.ex = reinterpret_cast<unsigned char*>(ex.data());
+        return tksEncodeFrame(m);
+    };
+    const std::vector<unsigned char> first = frame(1001, "head", "payload");
+    std::vector<unsigned char> rest = frame(2000, "", "");
+    rest.insert(rest.begin(), first.back());
+    RelayConnection::Frame f;
+    for (std::size_t i = 0; i + 1 < first.size(); ++i) {
+        ASSERT_EQ(::write(fds[1], &first[i], 1), 1);
+        ASSERT_EQ(conn.receive().bytes, 1u);
+        ASSERT_EQ(conn.nextFrame(f), RelayConnection::FrameStatus::Partial) << "byte " << i;
+    }
+    ASSERT_EQ(::write(fds[1], rest.data(), rest.size()), static_cast<ssize_t>(rest.size()));
+    ASSERT_EQ(conn.receive().bytes, rest.size());
+    ASSERT_EQ(conn.nextFrame(f), RelayConnection::FrameStatus::Ready);
+    EXPECT_EQ(f.header.type, 1001u);
+    EXPECT_EQ(std::string(reinterpret_cast<const char*>(f.body), f.header.size), "head");
+    EXPECT_EQ(std::string(reinterpret_cast<const char*>(f.ex), f.header.ex_size), "payload");
+    ASSERT_EQ(conn.nextFrame(f), RelayConnection::FrameStatus::Ready);
+    EXPECT_EQ(f.header.type, 2000u);
+    EXPECT_EQ(conn.nextFrame(f), RelayConnection::FrameStatus::Partial);
+    ::close(fds[0]);
+    ::close(fds[1]);
 }
 
 }  // namespace
