@@ -903,9 +903,7 @@ TEST_F(RelayTest, QueuedOutputOfAllClientsIsCappedByCuttingTheWorstReader) {
             c[i]->send(batch);
             asked += 1024;
             ++batches[i];
-            for (int w = 0; w < 500 && statsCounter(*server, "requests") < asked; ++w) {
-                std::this_thread::sleep_for(std::chrono::milliseconds(2));
-            }
+            eventually([&] { return statsCounter(*server, "requests") >= asked; });
         }
     };
     pipeline(0, [&] { return statsCounter(*server, "queued") >= 9 * kMiB / 2; });
@@ -985,11 +983,9 @@ TEST_F(RelayTest, TheTailOfAnOverlongControlLineDoesNotRun) {
         }
     });
     writer.join();
-    std::string got;
-    for (int i = 0; i < 500 && got.find("ok commands") == std::string::npos; ++i) {
-        std::this_thread::sleep_for(std::chrono::milliseconds(10));
-        got = answers.text();
-    }
+    EXPECT_TRUE(
+        eventually([&] { return answers.text().find("ok commands") != std::string::npos; }));
+    const std::string got = answers.text();
     EXPECT_EQ(got.substr(0, got.find("ok commands")), "error: control line too long\n");
     EXPECT_EQ(got.find("ok stats"), std::string::npos);
     ::close(p[1]);
