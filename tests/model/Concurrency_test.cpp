@@ -1,7 +1,10 @@
+// Event publishers while events flow on their readers' threads, and the relay restore's tasks.
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <chrono>
 #include <memory>
+#include <stdexcept>
 #include <string>
 #include <thread>
 #include <vector>
@@ -9,7 +12,7 @@
 #include "RecordingObserver.h"
 #include "SimFixture.h"
 #include "model/AllAlarms.h"
-#include "model/TSCCallState.h"
+#include "model/RelayRestore.h"
 #include "model/TrunkState.h"
 #include "model/VX7EventPublisher.h"
 #include "model/VX7EventZLGLogger.h"
@@ -21,14 +24,9 @@ using namespace vx7diag;
 class PublisherConcurrency : public SimFixture {
   protected:
     static void SetUpTestSuite() { UseFarm(""); }
-    static AllAlarms allAlarms;
-    static TrunkState trunkState;
-    static TSCCallState callState;
+    static inline AllAlarms allAlarms;
+    static inline TrunkState trunkState;
 };
-
-AllAlarms PublisherConcurrency::allAlarms;
-TrunkState PublisherConcurrency::trunkState;
-TSCCallState PublisherConcurrency::callState;
 
 // Observers come and go on the console thread while a burst of events is being delivered on the
 // publisher's reader thread: every event that reaches an observer is whole and of its trunk.
@@ -66,20 +64,20 @@ TEST_F(PublisherConcurrency, TwoTrunksOneAspect) {
     ASSERT_TRUE(first.Attach(logger, &allAlarms));
     ASSERT_TRUE(second.Attach(logger, &allAlarms));
     testing::internal::CaptureStdout();
-    Control("ferr 1 1 200");
-    Control("ferr 1 2 200");
+    Control("ferr 1 1 300");
+    Control("ferr 1 2 300");
     auto& r1 = *static_cast<RecordingObserver*>(one.Get());
     auto& r2 = *static_cast<RecordingObserver*>(two.Get());
-    for (int i = 0; i < 300 && (r1.Texts().size() < 200 || r2.Texts().size() < 200); ++i) {
+    for (int i = 0; i < 500 && (r1.Texts().size() < 300 || r2.Texts().size() < 300); ++i) {
         std::this_thread::sleep_for(std::chrono::milliseconds(10));
     }
     testing::internal::GetCapturedStdout();
     EXPECT_EQ(r1.Texts(),
               std::vector<std::string>(
-                  200, "Alarm Event:  board=1 trunk=1 type=Frame Error Saturation state=Active"));
+                  300, "Alarm Event:  board=1 trunk=1 type=Frame Error Saturation state=Active"));
     EXPECT_EQ(r2.Texts(),
               std::vector<std::string>(
-                  200, "Alarm Event:  board=1 trunk=2 type=Frame Error Saturation state=Active"));
+                  300, "Alarm Event:  board=1 trunk=2 type=Frame Error Saturation state=Active"));
 }
 
 // A view that goes while its line is busy: the publisher is destroyed with events in flight,
@@ -101,6 +99,59 @@ TEST_F(PublisherConcurrency, PublisherDestroyedWhileEventsFlow) {
     EXPECT_EQ(static_cast<RecordingObserver*>(watcher.Get())->WaitFor("Trunk State"),
               "Trunk State board=1 trunk=2 state=Out Of Service reason=Diagnostic");
     Control("line 1 2 in 0");
+}
+
+using namespace std::chrono_literals;
+
+bool WaitFor(const std::atomic<int>& value, int atLeast) {
+    const auto deadline = std::chrono::steady_clock::now() + 5s;
+    while (value.load() < atLeast) {
+        if (std::chrono::steady_clock::now() > deadline) {
+            return false;
+        }
+        std::this_thread::sleep_for(1ms);
+    }
+    return true;
+}
+
+// A view's task captures the view: once the view has removed it, it must neither be running
+// (the view is about to be freed) nor run again.
+TEST(RelayRestore, RemovedTaskHasFinishedAndNeverRunsAgain) {
+    std::atomic<int> begun{0};
+    std::atomic<int> ended{0};
+    int id = RelayRestore::Add([&] {
+        ++begun;
+        std::this_thread::sleep_for(200ms);
+        ++ended;
+    });
+    RelayRestore::RunAll();
+    ASSERT_TRUE(WaitFor(begun, 1));
+    RelayRestore::Remove(id);
+    EXPECT_EQ(1, ended.load());
+
+    std::atomic<int> other{0};
+    int later = RelayRestore::Add([&] { ++other; });
+    RelayRestore::RunAll();
+    ASSERT_TRUE(WaitFor(other, 1));
+    EXPECT_EQ(1, begun.load());
+    RelayRestore::Remove(later);
+}
+
+TEST(RelayRestore, TasksRunInTheOrderTheyCameAndAFailingOneStopsNoOther) {
+    std::vector<std::string> order;
+    std::atomic<int> done{0};
+    int first = RelayRestore::Add([&] { order.push_back("first"); });
+    int failing = RelayRestore::Add([] { throw std::runtime_error("board gone"); });
+    int last = RelayRestore::Add([&] {
+        order.push_back("last");
+        ++done;
+    });
+    RelayRestore::RunAll();
+    ASSERT_TRUE(WaitFor(done, 1));
+    EXPECT_EQ(std::vector<std::string>({"first", "last"}), order);
+    for (int id : {first, failing, last}) {
+        RelayRestore::Remove(id);
+    }
 }
 
 }  // namespace
