@@ -9,6 +9,7 @@
 #include <atomic>
 #include <chrono>
 #include <mutex>
+#include <optional>
 #include <sstream>
 #include <stdexcept>
 #include <thread>
@@ -47,6 +48,17 @@ std::string text(const tolk::virtualObject& o) {
     return os.str();
 }
 
+// What `call` raised as E, or nothing.
+template <class E, class F>
+std::optional<E> raised(F call) {
+    try {
+        call();
+    } catch (const E& e) {
+        return e;
+    }
+    return std::nullopt;
+}
+
 // A board that answers every block alike.
 FakeBoard::Rule always(std::vector<Answer> answers) {
     return [answers](const Sent&) { return answers; };
@@ -73,17 +85,15 @@ TEST(MsgQueueRequest, ErrorOrOtherReplyRaisesErrorMsgHoldingItAtOnce) {
         FakeBoard board(always({{reply, {0, 0, 0x12, 0x14}}}));
         MsgQueue q(kAny, MsgQueue::DefaultMaxRetMsgSize, MsgQueue::DefaultDepth);
         auto t0 = Clock::now();
-        try {
-            delete q.request(command(0x1214), 5000, awaited, 0);
-            FAIL() << "no exception";
-        } catch (const MsgQueue::ErrorMsg& e) {
-            ASSERT_NE(e.msg, nullptr);
-            EXPECT_EQ(e.msg->getMsgType(), reply);
-            EXPECT_TRUE(e.msg->getSrcAddr() == kBoard);
-            EXPECT_EQ(e.queue, &q);
-            EXPECT_THAT(text(e), StartsWith("MsgQueue::ErrorMsg MsgBody: {MsgType: " +
-                                            std::string(reply ? "0x800001" : "0") + " Source: "));
-        }
+        auto e = raised<MsgQueue::ErrorMsg>(
+            [&] { delete q.request(command(0x1214), 5000, awaited, 0); });
+        ASSERT_TRUE(e);
+        ASSERT_NE(e->msg, nullptr);
+        EXPECT_EQ(e->msg->getMsgType(), reply);
+        EXPECT_TRUE(e->msg->getSrcAddr() == kBoard);
+        EXPECT_EQ(e->queue, &q);
+        EXPECT_THAT(text(*e), StartsWith("MsgQueue::ErrorMsg MsgBody: {MsgType: " +
+                                         std::string(reply ? "0x800001" : "0") + " Source: "));
         // Not after the time-out.
         EXPECT_LT(Clock::now() - t0, milliseconds(2500));
     }
@@ -93,13 +103,10 @@ TEST(MsgQueueRequest, SilenceRaisesTimeoutWithItsText) {
     FakeBoard board;
     MsgQueue q(kAny, 512, 5);
     auto t0 = Clock::now();
-    try {
-        q.request(command(0x1214), 200, 0x1215, 0);
-        FAIL();
-    } catch (const MsgQueue::Timeout& e) {
-        EXPECT_EQ(text(e), "MsgQueue::Timeout MsgType: 0x1215 Timeout: 200ms)");
-        EXPECT_EQ(e.timeoutMs, 200u);
-    }
+    auto e = raised<MsgQueue::Timeout>([&] { q.request(command(0x1214), 200, 0x1215, 0); });
+    ASSERT_TRUE(e);
+    EXPECT_EQ(text(*e), "MsgQueue::Timeout MsgType: 0x1215 Timeout: 200ms)");
+    EXPECT_EQ(e->timeoutMs, 200u);
     EXPECT_GE(Clock::now() - t0, milliseconds(190));
     // Without an awaited type silence is success.
     EXPECT_EQ(q.request(command(0x1208), 50, 0, 0), nullptr);
@@ -226,19 +233,16 @@ TEST(AddressableRequest, RefusalBecomesUnexpectedMsgWithItsBodyAttached) {
     Proxy p(q, 5000, 1000);
     CompAttr_t cmd(1, 1);
     auto t0 = Clock::now();
-    try {
-        p.request(0x08, &cmd, 0x09, nullptr);
-        FAIL();
-    } catch (const Addressable::UnexpectedMsg& e) {
-        EXPECT_EQ(e.cmdType, 0x08u);
-        EXPECT_EQ(e.addressable, &p);
-        ASSERT_NE(e.msg, nullptr);
-        EXPECT_NE(dynamic_cast<CompAttr_t*>(e.msg->getBodyDef()), nullptr);
-        std::string t = text(e);
-        EXPECT_THAT(t, StartsWith("Addressable::UnexpectedMsg ObjSource: {TgtDesc: "));
-        EXPECT_THAT(t, HasSubstr(" CmdMsgType 0x8 RespMsg: {MsgType: 0 Source: "));
-        EXPECT_THAT(t, HasSubstr(" Body: {key 0x8 value 0x3}}"));
-    }
+    auto e = raised<Addressable::UnexpectedMsg>([&] { p.request(0x08, &cmd, 0x09, nullptr); });
+    ASSERT_TRUE(e);
+    EXPECT_EQ(e->cmdType, 0x08u);
+    EXPECT_EQ(e->addressable, &p);
+    ASSERT_NE(e->msg, nullptr);
+    EXPECT_NE(dynamic_cast<CompAttr_t*>(e->msg->getBodyDef()), nullptr);
+    std::string t = text(*e);
+    EXPECT_THAT(t, StartsWith("Addressable::UnexpectedMsg ObjSource: {TgtDesc: "));
+    EXPECT_THAT(t, HasSubstr(" CmdMsgType 0x8 RespMsg: {MsgType: 0 Source: "));
+    EXPECT_THAT(t, HasSubstr(" Body: {key 0x8 value 0x3}}"));
     EXPECT_LT(Clock::now() - t0, milliseconds(2500));
 }
 
@@ -268,16 +272,13 @@ TEST(AddressableRequest, SilenceRaisesTimeoutWithTypesAndTime) {
     isa::RefPtr<MsgQueue> q = newQueue();
     Proxy p(q, 150, 1000);
     CompAttr_t cmd(1, 1);
-    try {
-        p.request(0x1214, &cmd, 0x1215, nullptr, 4242);
-        FAIL();
-    } catch (const Addressable::Timeout& e) {
-        std::ostringstream expect;
-        expect << "Addressable::Timeout ObjSource: " << p
-               << " CmdMsgType: 0x1214 RetMsgType: 0x1215 Trans: 4242 Timeout: 150ms";
-        EXPECT_EQ(text(e), expect.str());
-        EXPECT_EQ(e.trans, 4242u);
-    }
+    auto e = raised<Addressable::Timeout>([&] { p.request(0x1214, &cmd, 0x1215, nullptr, 4242); });
+    ASSERT_TRUE(e);
+    std::ostringstream expect;
+    expect << "Addressable::Timeout ObjSource: " << p
+           << " CmdMsgType: 0x1214 RetMsgType: 0x1215 Trans: 4242 Timeout: 150ms";
+    EXPECT_EQ(text(*e), expect.str());
+    EXPECT_EQ(e->trans, 4242u);
     // The proxy stays usable.
     EXPECT_THROW(p.request(0x1214, &cmd, 0x1215, nullptr), tolk::Exception);
 }
@@ -333,20 +334,14 @@ TEST(AddressableConstruction, EmptyQueueMakesAPrivateOneAndCopiesShareIt) {
 TEST(AddressableLookup, BaseRaisesUndefinedBodies) {
     isa::RefPtr<MsgQueue> q = newQueue();
     Addressable a(kBoard, q);
-    try {
-        a.MsgBodyLookup(0x2B);
-        FAIL();
-    } catch (const Addressable::UndefinedMsgBody& e) {
-        EXPECT_EQ(e.type, 0x2Bu);
-        EXPECT_EQ(text(e), "tolk::Addressable::UndefinedMsgBody");
-    }
-    try {
-        a.superEvtBodyLookup(0x1230);
-        FAIL();
-    } catch (const Addressable::UndefinedEvtBody& e) {
-        EXPECT_EQ(e.group, 0x1230u);
-        EXPECT_EQ(text(e), "tolk::Addressable::UndefinedEvtBody");
-    }
+    auto msg = raised<Addressable::UndefinedMsgBody>([&] { delete a.MsgBodyLookup(0x2B); });
+    ASSERT_TRUE(msg);
+    EXPECT_EQ(msg->type, 0x2Bu);
+    EXPECT_EQ(text(*msg), "tolk::Addressable::UndefinedMsgBody");
+    auto evt = raised<Addressable::UndefinedEvtBody>([&] { delete a.superEvtBodyLookup(0x1230); });
+    ASSERT_TRUE(evt);
+    EXPECT_EQ(evt->group, 0x1230u);
+    EXPECT_EQ(text(*evt), "tolk::Addressable::UndefinedEvtBody");
 }
 
 // ---- the dispatcher ----
@@ -600,13 +595,10 @@ TEST_F(Dispatcher, MsgWaitReturnsTheMessageAndTimesOutWithoutOne) {
     ASSERT_NE(m, nullptr);
     EXPECT_EQ(m->getMsgType(), 0x5Cu);
     delete m;
-    try {
-        comp.asyncWaitMsg(0x5D, nullptr, 50);
-        FAIL();
-    } catch (const EvtCallback::MsgWait::Timeout& t) {
-        EXPECT_EQ(t.number, 0x5Du);
-        EXPECT_EQ(t.timeoutMs, 50u);
-    }
+    auto t = raised<EvtCallback::MsgWait::Timeout>([&] { comp.asyncWaitMsg(0x5D, nullptr, 50); });
+    ASSERT_TRUE(t);
+    EXPECT_EQ(t->number, 0x5Du);
+    EXPECT_EQ(t->timeoutMs, 50u);
     // The entry is gone once the wait has fired: the next 0x5C is unregistered.
     comp.asyncUnregisteredMsgType(unregistered, 0);
     send(0x5C);
