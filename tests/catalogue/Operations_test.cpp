@@ -14,7 +14,6 @@
 #include <map>
 #include <memory>
 #include <set>
-#include <sstream>
 #include <thread>
 #include <typeinfo>
 
@@ -104,12 +103,6 @@ Bytes text(const std::string& s, std::size_t n) {
     Bytes b(s.begin(), s.end());
     b.resize(n, 0);
     return b;
-}
-
-std::string textOf(const tolk::virtualObject& o) {
-    std::ostringstream os;
-    o.toStream(&os);
-    return os.str();
 }
 
 // What the services and components of a board answer: the shared completions of the
@@ -496,35 +489,6 @@ TEST(Operations, TheOneWayTwinsDropTheirCompletionsQuietly) {
     expectQuietTwin<TSC>(0x121F, 0x1220, [](TSC& t) { t.StartSetChanState(2); });
     expectQuietTwin<LCON>(0x1610, 0x1611, [](LCON& l) { l.StartSetLineState(1); });
     expectQuietTwin<CAS>(0x1415, 0x1416, [](CAS& c) { c.StartDial(1, tolk::string("9")); });
-}
-
-TEST(Operations, RefusalAndSilenceRaiseWithTheTypes) {
-    FakeBoard board([](const Sent& s) {
-        if (s.type == 0x120A || s.type == 0x12) {
-            return std::vector<Answer>{{0, words({s.type, 7})}};
-        }
-        return std::vector<Answer>{};
-    });
-    auto queue = newQueue();
-    TmpInstance found(kTarget, queue);
-    Quick<TSC> tsc(static_cast<const Instance&>(found));
-    Quick<StdResource> res(kTarget, queue);
-    EXPECT_THROW(tsc.DropCall(1), Addressable::UnexpectedMsg);
-    try {
-        res.GetParm(0x1001, nullptr);
-        FAIL() << "no exception";
-    } catch (const Addressable::UnexpectedMsg& e) {
-        EXPECT_EQ(e.cmdType, 0x12u);
-        ASSERT_NE(e.msg, nullptr);
-        EXPECT_NE(dynamic_cast<StdResource::MsgError_t*>(e.msg->getBodyDef()), nullptr);
-    }
-    try {
-        res.ComTest(nullptr);
-        FAIL() << "no exception";
-    } catch (const Addressable::Timeout& e) {
-        std::string t = textOf(e);
-        EXPECT_NE(t.find(" CmdMsgType: 0x2 RetMsgType: 0x3"), std::string::npos) << t;
-    }
 }
 
 TEST(Operations, TheAsynchronousCallControlWaitsOneMillisecondForARefusal) {
