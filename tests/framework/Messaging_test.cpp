@@ -382,15 +382,14 @@ struct Seen {
     std::string who;
     unsigned int number;
     std::string body;
-    Msg* msg;
 };
 
 std::mutex seenLock;
 std::vector<Seen> seen;
 
-void record(const std::string& who, unsigned int n, const std::string& body, Msg* m) {
+void record(const std::string& who, unsigned int n, const std::string& body = "") {
     std::lock_guard<std::mutex> g(seenLock);
-    seen.push_back({who, n, body, m});
+    seen.push_back({who, n, body});
 }
 
 std::size_t seenCount() {
@@ -405,11 +404,11 @@ void waitSeen(std::size_t n) {
 }
 
 void msgA(Addressable*, Msg* m) {
-    record("A", m->getMsgType(), "", m);
+    record("A", m->getMsgType());
     delete m;
 }
 void msgB(Addressable*, Msg* m) {
-    record("B", m->getMsgType(), "", m);
+    record("B", m->getMsgType());
     delete m;
 }
 void bodyFn(Addressable*, unsigned int n, MsgBody* b) {
@@ -417,11 +416,11 @@ void bodyFn(Addressable*, unsigned int n, MsgBody* b) {
                        : dynamic_cast<tolk::MsgEvtDetected_t*>(b) ? "evt"
                        : dynamic_cast<CountedEvt*>(b)             ? "counted"
                                                                   : "?";
-    record("body", n, kind + text(*b), nullptr);
+    record("body", n, kind + text(*b));
     delete b;
 }
 void unregistered(Addressable*, Msg* m) {
-    record("unregistered", m->getMsgType(), "", m);
+    record("unregistered", m->getMsgType());
     delete m;
 }
 void throwing(Addressable*, Msg* m) {
@@ -437,7 +436,7 @@ void throwingOther(Addressable*, Msg* m) {
 class Holder : public EvtCallback::Callback {
   public:
     void onMsg(Addressable*, Msg* m) {
-        record("member", m->getMsgType(), "", m);
+        record("member", m->getMsgType());
         delete m;
     }
 };
