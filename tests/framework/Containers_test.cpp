@@ -103,35 +103,28 @@ staticList<int> filled(unsigned int n) {
     return l;
 }
 
-struct ReallocCase {
-    unsigned int start;
-    unsigned int to;
-    bool keepsArray;
-    unsigned int capacityAfter;
-};
-
-class StaticListRealloc : public ::testing::TestWithParam<ReallocCase> {};
-
-TEST_P(StaticListRealloc, KeepsOrReplacesTheArrayByTheHalfCapacityRule) {
-    const ReallocCase& c = GetParam();
-    staticList<int> l = filled(c.start);
-    const int* before = l.data();
-    l.realloc(c.to);
-    EXPECT_EQ(l.length(), c.to);
-    EXPECT_EQ(l.getCapacity(), c.capacityAfter);
-    EXPECT_EQ(l.data() == before, c.keepsArray);
-    for (unsigned int i = 0; i < std::min(c.start, c.to); ++i) {
-        EXPECT_EQ(*l[i], static_cast<int>(100 + i)) << "element " << i;
+// From length `start` to `to`: the array is kept while the new length lies between half the
+// capacity and the capacity, else replaced by one of exactly the new length.
+TEST(StaticList, ReallocKeepsOrReplacesTheArrayByTheHalfCapacityRule) {
+    const struct {
+        unsigned int start, to;
+        bool keepsArray;
+        unsigned int capacityAfter;
+    } rows[] = {{1, 0, true, 1},  {4, 0, false, 0}, {10, 5, true, 10}, {10, 4, false, 4},
+                {3, 7, false, 7}, {4, 4, true, 4},  {9, 4, true, 9},   {9, 3, false, 3}};
+    for (const auto& c : rows) {
+        SCOPED_TRACE(testing::Message() << c.start << " to " << c.to);
+        staticList<int> l = filled(c.start);
+        const int* before = l.data();
+        l.realloc(c.to);
+        EXPECT_EQ(l.length(), c.to);
+        EXPECT_EQ(l.getCapacity(), c.capacityAfter);
+        EXPECT_EQ(l.data() == before, c.keepsArray);
+        for (unsigned int i = 0; i < std::min(c.start, c.to); ++i) {
+            EXPECT_EQ(*l[i], static_cast<int>(100 + i)) << "element " << i;
+        }
     }
 }
-
-INSTANTIATE_TEST_SUITE_P(Rule, StaticListRealloc,
-                         ::testing::Values(ReallocCase{1, 0, true, 1}, ReallocCase{4, 0, false, 0},
-                                           ReallocCase{10, 5, true, 10},
-                                           ReallocCase{10, 4, false, 4},
-                                           ReallocCase{3, 7, false, 7}, ReallocCase{4, 4, true, 4},
-                                           ReallocCase{9, 4, true, 9},
-                                           ReallocCase{9, 3, false, 3}));
 
 TEST(StaticList, ShrinkInPlaceKeepsTheArrayButANewArrayCopiesOnlyTheLength) {
     staticList<int> l = filled(10);

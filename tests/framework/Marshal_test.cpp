@@ -1,3 +1,7 @@
+// Messages and the marshalling of their bodies: the header and its print, a body's fields as
+// the library's field calls move them (chunks, widths, first-field rule), and reads of short or
+// hostile blocks that stay inside them.
+
 #include "framework/Marshal.h"
 
 #include <gtest/gtest.h>
@@ -14,9 +18,12 @@
 #include "framework/Msg.h"
 #include "framework/MsgDefault_t.h"
 #include "framework/MsgEvtDetected_t.h"
+#include "framework/tolk.h"
+#include "transport/TKSMsgRef.h"
 
 namespace {
 
+using tolk::CompDesc_t;
 using tolk::Msg;
 using tolk::staticList;
 using Bytes = std::vector<unsigned char>;
@@ -24,6 +31,12 @@ using Bytes = std::vector<unsigned char>;
 Bytes body(Msg& m) {
     const unsigned char* b = tkMsgBody(m.getMsgRef());
     return Bytes(b, b + m.getSize());
+}
+
+std::string text(const tolk::virtualObject& o) {
+    std::ostringstream os;
+    os << o;
+    return os.str();
 }
 
 std::string hex(const Bytes& b) {
@@ -38,12 +51,6 @@ void fillBody(Msg& m, const Bytes& bytes) {
     ASSERT_EQ(m.getSize(), bytes.size());
     std::memcpy(tkMsgBody(m.getMsgRef()), bytes.data(), bytes.size());
 }
-
-#define EXPECT_BYTES(msg, ...)                   \
-    do {                                         \
-        Bytes golden_ = __VA_ARGS__;             \
-        EXPECT_EQ(hex(body(msg)), hex(golden_)); \
-    } while (0)
 
 class MarshalTest : public ::testing::Test {
   protected:
@@ -68,7 +75,7 @@ TEST_F(MarshalTest, FirstFieldAtOffsetZeroReturnsItsWidth) {
     OneUInt b;
     b.v = 0xA1B2C3D4;
     EXPECT_EQ(m.write(&b, 0), 4u);
-    EXPECT_BYTES(m, {0xA1, 0xB2, 0xC3, 0xD4});
+    EXPECT_EQ(hex(body(m)), hex({0xA1, 0xB2, 0xC3, 0xD4}));
     OneUInt r;
     EXPECT_EQ(m.read(&r, 0), 4u);
     EXPECT_EQ(r.v, 0xA1B2C3D4u);
@@ -76,7 +83,7 @@ TEST_F(MarshalTest, FirstFieldAtOffsetZeroReturnsItsWidth) {
     Msg later(6);
     unsigned short s = 0x0102;
     EXPECT_EQ(tolk::putField(&later, 4, 0x280000, &s), 6u);
-    EXPECT_BYTES(later, {0, 0, 0, 0, 0x01, 0x02});
+    EXPECT_EQ(hex(body(later)), hex({0, 0, 0, 0, 0x01, 0x02}));
 }
 
 TEST_F(MarshalTest, FirstFieldFixedArrayAddsElementWidthTimesCount) {
@@ -100,50 +107,40 @@ TEST(MarshalWidth, TypeCodes) {
     EXPECT_EQ(tolk::descWidth(0x27F000), 1u);
 }
 
-struct ChunkCase {
-    unsigned int n;
-    std::vector<unsigned int> descs;
-    std::vector<unsigned int> offsets;
-};
-
-class ListChunks : public MarshalTest, public ::testing::WithParamInterface<ChunkCase> {};
-
-TEST_P(ListChunks, BytesMoveInChunksOfAtMost255) {
-    const ChunkCase& c = GetParam();
-    staticList<unsigned char> l;
-    l.realloc(c.n);
-    for (unsigned int i = 0; i < c.n; ++i) {
-        *l[i] = static_cast<unsigned char>(i * 7);
-    }
-    Msg m(4 + c.n);
-    EXPECT_EQ(tolk::putList(&m, 4, 4, l, false), 4 + c.n);
-    ASSERT_EQ(fieldCalls().size(), c.descs.size());
-    for (std::size_t i = 0; i < c.descs.size(); ++i) {
-        EXPECT_TRUE(fieldCalls()[i].put);
-        EXPECT_EQ(fieldCalls()[i].descs, std::vector<unsigned int>{c.descs[i]}) << i;
-        EXPECT_EQ(fieldCalls()[i].offsetIn, c.offsets[i]) << i;
-    }
-    Bytes b = body(m);
-    for (unsigned int i = 0; i < c.n; ++i) {
-        ASSERT_EQ(b[4 + i], static_cast<unsigned char>(i * 7)) << i;
-    }
-    fieldCalls().clear();
-    staticList<unsigned char> r;
-    EXPECT_EQ(tolk::getList(&m, 4, 4, r, c.n, false), 4 + c.n);
-    ASSERT_EQ(r.length(), c.n);
-    EXPECT_EQ(fieldCalls().size(), c.descs.size());
-    for (unsigned int i = 0; i < c.n; ++i) {
-        ASSERT_EQ(*r[i], static_cast<unsigned char>(i * 7)) << i;
+TEST_F(MarshalTest, ByteListsMoveInChunksOfAtMost255) {
+    // Elements, then the descriptor and the offset of each chunk's field call.
+    const struct {
+        unsigned int n;
+        std::vector<unsigned int> descs, offsets;
+    } rows[] = {{1, {0x200000}, {4}},
+                {255, {0x27F000}, {4}},
+                {256, {0x200000, 0x27F000}, {4, 5}},
+                {510, {0x27F000, 0x27F000}, {4, 259}},
+                {511, {0x200000, 0x27F000, 0x27F000}, {4, 5, 260}},
+                {300, {0x216000, 0x27F000}, {4, 49}}};
+    for (const auto& c : rows) {
+        SCOPED_TRACE(c.n);
+        fieldCalls().clear();
+        staticList<unsigned char> l;
+        l.realloc(c.n);
+        for (unsigned int i = 0; i < c.n; ++i) {
+            *l[i] = static_cast<unsigned char>(i * 7);
+        }
+        Msg m(4 + c.n);
+        EXPECT_EQ(tolk::putList(&m, 4, 4, l, false), 4 + c.n);
+        ASSERT_EQ(fieldCalls().size(), c.descs.size());
+        for (std::size_t i = 0; i < c.descs.size(); ++i) {
+            EXPECT_EQ(fieldCalls()[i], (FieldCall{true, c.offsets[i], {c.descs[i]}})) << i;
+        }
+        Bytes b = body(m);
+        EXPECT_EQ(Bytes(b.begin() + 4, b.end()), Bytes(l.data(), l.data() + c.n));
+        fieldCalls().clear();
+        staticList<unsigned char> r;
+        EXPECT_EQ(tolk::getList(&m, 4, 4, r, c.n, false), 4 + c.n);
+        EXPECT_EQ(fieldCalls().size(), c.descs.size());
+        EXPECT_EQ(Bytes(r.data(), r.data() + r.length()), Bytes(l.data(), l.data() + c.n));
     }
 }
-
-INSTANTIATE_TEST_SUITE_P(
-    Sizes, ListChunks,
-    ::testing::Values(ChunkCase{1, {0x200000}, {4}}, ChunkCase{255, {0x27F000}, {4}},
-                      ChunkCase{256, {0x200000, 0x27F000}, {4, 5}},
-                      ChunkCase{510, {0x27F000, 0x27F000}, {4, 259}},
-                      ChunkCase{511, {0x200000, 0x27F000, 0x27F000}, {4, 5, 260}},
-                      ChunkCase{300, {0x216000, 0x27F000}, {4, 49}}));
 
 TEST_F(MarshalTest, WordListsUseTheirFullChunkDescriptors) {
     staticList<unsigned int> w;
@@ -211,7 +208,7 @@ TEST_F(MarshalTest, CompDescIsSixBytesWithFourByteFieldsInOneCall) {
     Msg m(6);
     EXPECT_EQ(d.GetByteSize(), 6u);
     EXPECT_EQ(m.write(&d, 0), 6u);
-    EXPECT_BYTES(m, {0x12, 0x34, 0x02, 0x03, 0x12, 0x05});
+    EXPECT_EQ(hex(body(m)), hex({0x12, 0x34, 0x02, 0x03, 0x12, 0x05}));
     ASSERT_EQ(fieldCalls().size(), 2u);
     EXPECT_EQ(fieldCalls()[0].descs, std::vector<unsigned int>{0x280000});
     EXPECT_EQ(fieldCalls()[1].descs,
@@ -243,7 +240,7 @@ TEST_F(MarshalTest, MsgDefaultReadsAllThatIsLeftAndWritesItsList) {
     tolk::MsgDefault_t mine(bytes);
     Msg out(mine.GetByteSize());
     EXPECT_EQ(out.write(&mine, 0), 3u);
-    EXPECT_BYTES(out, {1, 2, 3});
+    EXPECT_EQ(hex(body(out)), hex({1, 2, 3}));
     tolk::MsgDefault_t copy(mine);
     *bytes[0] = 99;
     EXPECT_EQ(*copy.bytes()[0], 1);
@@ -279,8 +276,8 @@ TEST_F(MarshalTest, CountedAndTrailingBodyListsRoundTrip) {
     *s.attrs[1] = tolk::CompAttr_t(3, -1);
     Msg m(s.GetByteSize());
     EXPECT_EQ(m.write(&s, 0), 21u);
-    EXPECT_BYTES(m, {0x02, 0xBE, 0xEF, 0x00, 0x01, 0, 0,    0,    1,    0,   0,
-                     0,    2,    0,    0,    0,    3, 0xFF, 0xFF, 0xFF, 0xFF});
+    EXPECT_EQ(hex(body(m)), hex({0x02, 0xBE, 0xEF, 0x00, 0x01, 0, 0,    0,    1,    0,   0,
+                                 0,    2,    0,    0,    0,    3, 0xFF, 0xFF, 0xFF, 0xFF}));
     Shaped r;
     EXPECT_EQ(m.read(&r, 0), 21u);
     EXPECT_EQ(r.count, 2);
@@ -316,51 +313,156 @@ TEST_F(MarshalTest, TrailingBodyListWithShortTailStopsAtTheEnd) {
 
 // Every prefix of a good body, read as a message of its own: what is there decodes as sent,
 // what is missing reads as zeros, and nothing is read outside the block (ASan).
-struct PrefixCase {
-    const char* name;
-    tolk::MsgBody* (*make)();
-    Bytes whole;
-    std::size_t fixedSize;  // bytes the body always writes back; 0: as many as it read
-};
-
-class BodyPrefixes : public ::testing::TestWithParam<PrefixCase> {};
-
-TEST_P(BodyPrefixes, ReadAsSentOrAsZeros) {
-    const PrefixCase& c = GetParam();
-    for (std::size_t k = 0; k < c.whole.size(); ++k) {
-        Msg in(static_cast<unsigned int>(k));
-        if (k != 0) {
-            std::memcpy(tkMsgBody(in.getMsgRef()), c.whole.data(), k);
+TEST(BodyPrefixes, ReadAsSentOrAsZeros) {
+    const struct {
+        tolk::MsgBody* (*make)();
+        Bytes whole;
+        std::size_t fixedSize;  // bytes the body always writes back; 0: as many as it read
+    } rows[] = {{[]() -> tolk::MsgBody* { return new CompDesc_t(); }, {0x12, 0x34, 5, 6, 7, 8}, 6},
+                {[]() -> tolk::MsgBody* { return new tolk::CompAttr_t(); },
+                 {0, 0, 0x10, 0x01, 0xFF, 0xFF, 0xFF, 0xFE},
+                 8},
+                {[]() -> tolk::MsgBody* { return new tolk::MsgEvtDetected_t(); },
+                 {0, 0, 0x12, 0x30, 9, 8, 7},
+                 4},
+                {[]() -> tolk::MsgBody* { return new tolk::MsgDefault_t(); }, {1, 2, 3, 4, 5}, 0}};
+    for (const auto& c : rows) {
+        for (std::size_t k = 0; k < c.whole.size(); ++k) {
+            SCOPED_TRACE(testing::Message() << hex(c.whole) << "cut to " << k);
+            Msg in(static_cast<unsigned int>(k));
+            if (k != 0) {
+                std::memcpy(tkMsgBody(in.getMsgRef()), c.whole.data(), k);
+            }
+            std::unique_ptr<tolk::MsgBody> b(c.make());
+            in.read(b.get(), 0);
+            Msg out(b->GetByteSize());
+            out.write(b.get(), 0);
+            Bytes expected(c.whole.begin(), c.whole.begin() + static_cast<long>(k));
+            expected.resize(std::max(k, c.fixedSize), 0);
+            EXPECT_EQ(hex(body(out)), hex(expected));
         }
-        std::unique_ptr<tolk::MsgBody> b(c.make());
-        in.read(b.get(), 0);
-        Msg out(b->GetByteSize());
-        out.write(b.get(), 0);
-        Bytes expected(c.whole.begin(), c.whole.begin() + static_cast<long>(k));
-        expected.resize(std::max(k, c.fixedSize), 0);
-        EXPECT_EQ(hex(body(out)), hex(expected)) << "prefix of " << k << " bytes";
     }
 }
 
-INSTANTIATE_TEST_SUITE_P(
-    FrameworkBodies, BodyPrefixes,
-    ::testing::Values(
-        PrefixCase{"CompDesc",
-                   [] { return static_cast<tolk::MsgBody*>(new tolk::CompDesc_t()); },
-                   {0x12, 0x34, 5, 6, 7, 8},
-                   6},
-        PrefixCase{"CompAttr",
-                   [] { return static_cast<tolk::MsgBody*>(new tolk::CompAttr_t()); },
-                   {0, 0, 0x10, 0x01, 0xFF, 0xFF, 0xFF, 0xFE},
-                   8},
-        PrefixCase{"EvtDetected",
-                   [] { return static_cast<tolk::MsgBody*>(new tolk::MsgEvtDetected_t()); },
-                   {0, 0, 0x12, 0x30, 9, 8, 7},
-                   4},
-        PrefixCase{"Bytes",
-                   [] { return static_cast<tolk::MsgBody*>(new tolk::MsgDefault_t()); },
-                   {1, 2, 3, 4, 5},
-                   0}),
-    [](const ::testing::TestParamInfo<PrefixCase>& i) { return std::string(i.param.name); });
+// ---- messages ----
+
+Msg* sample() {
+    Msg* m = new Msg(3u);
+    tolk::CompDesc_t src(5, 1, 1, 0, 0);
+    tolk::CompDesc_t tgt(0x10, 2, 3, 18, 4);
+    m->setMsgType(0x1214);
+    m->setSrcAddr(src);
+    m->setTgtAddr(tgt);
+    m->setTrans(10001);
+    unsigned char* b = tkMsgBody(m->getMsgRef());
+    b[0] = 1;
+    b[1] = 0x20;
+    b[2] = 255;
+    return m;
+}
+
+TEST(Msg, PrintsHeaderAndBodyAsBytes) {
+    std::unique_ptr<Msg> m(sample());
+    std::ostringstream os;
+    os << 12 << " ";
+    os << *m;
+    os << " " << 12;
+    EXPECT_EQ(os.str(),
+              "12 {MsgType: 0x1214 Source: {Node 0 Board 0x1 Processor 0x1 Component 0 Instance "
+              "0x5} Target: {Node 0x4 Board 0x2 Processor 0x3 Component 0x12 Instance 0x10} Size: "
+              "3 Trans: 10001 Body: {ByteData {0x1 0x20 0xff }}} 12");
+}
+
+TEST(Msg, PrintingLeavesAByteDefinitionThatTheSecondPrintRefills) {
+    std::unique_ptr<Msg> m(sample());
+    EXPECT_EQ(m->getBodyDef(), nullptr);
+    std::string first = text(*m);
+    auto* def = dynamic_cast<tolk::MsgDefault_t*>(m->getBodyDef());
+    ASSERT_NE(def, nullptr);
+    EXPECT_EQ(def->GetByteSize(), 3u);
+    tkMsgBody(m->getMsgRef())[0] = 7;
+    std::string second = text(*m);
+    EXPECT_EQ(m->getBodyDef(), def);
+    EXPECT_EQ(def->GetByteSize(), 3u);
+    EXPECT_EQ(*def->bytes()[0], 7);
+    EXPECT_NE(first, second);
+    EXPECT_NE(second.find("{ByteData {0x7 0x20 0xff }}"), std::string::npos);
+}
+
+TEST(Msg, CopyIsDeepAndHasNoDefinitionAndReallocKeepsTheHeader) {
+    std::unique_ptr<Msg> m(sample());
+    text(*m);
+    Msg c(*m);
+    EXPECT_EQ(c.getBodyDef(), nullptr);
+    EXPECT_NE(c.getMsgRef(), m->getMsgRef());
+    EXPECT_EQ(text(c), text(*m));
+    tkMsgBody(c.getMsgRef())[0] = 9;
+    EXPECT_EQ(tkMsgBody(m->getMsgRef())[0], 1);
+    c.realloc(10);
+    EXPECT_EQ(c.getSize(), 10u);
+    EXPECT_EQ(c.getMsgType(), 0x1214u);
+}
+
+TEST(Msg, AdoptsABlockAndAnEmptiedSlotFreesNothing) {
+    TKSMsgRef ref(4u);
+    ref.setMsgType(0x77);
+    {
+        Msg m(&ref);
+        EXPECT_EQ(m.getMsgType(), 0x77u);
+        EXPECT_EQ(m.getSize(), 4u);
+    }
+    // The block is gone with the Msg (ASan would report a leak otherwise); a Msg whose slot was
+    // emptied leaves its block to whoever took it.
+    TKSMsgRef kept;
+    {
+        Msg m(2u);
+        kept = *m.getTKMsgRef();
+        *m.getTKMsgRef() = TKSMsgRef();
+    }
+    EXPECT_EQ(kept.getSize(), 2u);
+    kept.free();
+}
+
+TEST(UniqueIds, CountUpFromTheirOwnBase) {
+    unsigned int a = tolk::getUniqueTransId();
+    unsigned int b = tolk::getUniqueTransId();
+    EXPECT_GE(a, 10000u);
+    EXPECT_EQ(b, a + 1);
+    unsigned int o = tolk::getUniqueObjId();
+    EXPECT_GE(o, 1000u);
+    EXPECT_EQ(tolk::getUniqueObjId(), o + 1);
+}
+
+const CompDesc_t kBase(0x0102, 3, 4, 5, 6);
+
+TEST(CompDesc, DiffersOnEachSingleField) {
+    for (const CompDesc_t& other :
+         {CompDesc_t(0x0202, 3, 4, 5, 6), CompDesc_t(0x0103, 3, 4, 5, 6),
+          CompDesc_t(0x0102, 9, 4, 5, 6), CompDesc_t(0x0102, 3, 9, 5, 6),
+          CompDesc_t(0x0102, 3, 4, 9, 6), CompDesc_t(0x0102, 3, 4, 5, 9)}) {
+        EXPECT_FALSE(kBase == other) << other;
+        EXPECT_TRUE(kBase != other) << other;
+    }
+    CompDesc_t c;
+    c = kBase;
+    EXPECT_TRUE(c == kBase);
+    EXPECT_FALSE(c != kBase);
+    EXPECT_TRUE(CompDesc_t(kBase.getTKCompDesc()) == kBase);
+}
+
+TEST(CompDesc, PrintsInTheStreamsBase) {
+    std::ostringstream os;
+    os << CompDesc_t(5, 2, 3, 4, 1);
+    EXPECT_EQ(os.str(), "{Node 1 Board 2 Processor 3 Component 4 Instance 5}");
+    std::ostringstream hx;
+    hx << std::hex << CompDesc_t(0x1F, 0x20, 0, 18, 10);
+    EXPECT_EQ(hx.str(), "{Node a Board 20 Processor 0 Component 12 Instance 1f}");
+}
+
+TEST(CompDesc, ClosedFormPrintsHexJoinedAndRestoresFlags) {
+    std::ostringstream os;
+    os << CompDesc_t(5, 2, 3, 4, 1).getTKCompDesc() << " " << 10 << " " << tolk::CompAttr_t(7, -3);
+    EXPECT_EQ(os.str(), "0x1:0x2:0x3:0x4:0x5 10 {key 7 value -3}");
+}
 
 }  // namespace
