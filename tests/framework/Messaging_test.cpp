@@ -303,16 +303,6 @@ TEST(AddressableRequest, OneWayCommandReturnsAfterTheErrorWaitUnlessRefusedAtOnc
     }
 }
 
-TEST(AddressableRequest, ReplyFromAnotherSourceCountsOnlyWithAnySource) {
-    FakeBoard board([](const Sent& s) { return std::vector<Answer>{{s.type + 1, {}, true}}; });
-    isa::RefPtr<MsgQueue> q = newQueue();
-    Proxy p(q, 150, 1000);
-    CompAttr_t cmd(1, 1);
-    q->unregisteredSource([](MsgQueue&, Msg* m) { delete m; });
-    EXPECT_THROW(p.request(0x10, &cmd, 0x11, nullptr, 0, 0), Addressable::Timeout);
-    EXPECT_NO_THROW(p.request(0x10, &cmd, 0x11, nullptr, 0, 1));
-}
-
 TEST(AddressableConstruction, EmptyQueueMakesAPrivateOneAndCopiesShareIt) {
     isa::RefPtr<MsgQueue> none;
     Addressable a(tolk::CompDesc_t(3, 1, 1, 18, 0), none);
