@@ -6,7 +6,6 @@
 
 #include <cstdint>
 #include <cstring>
-#include <functional>
 #include <memory>
 #include <span>
 #include <sstream>
@@ -90,30 +89,8 @@ const CatalogueEntry* entryOf(const std::string& qualified) {
     return nullptr;
 }
 
-Bytes cat(std::initializer_list<std::function<void(Bytes&)>> parts) {
-    Bytes b;
-    for (const auto& p : parts) {
-        p(b);
-    }
-    return b;
-}
-auto U32(std::uint32_t v) {
-    return [v](Bytes& b) { u32(b, v); };
-}
-auto U16(std::uint16_t v) {
-    return [v](Bytes& b) { u16(b, v); };
-}
-auto raw(std::initializer_list<std::uint8_t> v) {
-    return [v](Bytes& b) { b.insert(b.end(), v); };
-}
-auto str(const char* s, std::size_t fixed) {
-    return [s, fixed](Bytes& b) { chars(b, s, fixed); };
-}
-auto desc(std::uint16_t instance, std::uint8_t board, std::uint8_t proc, std::uint8_t comp) {
-    return [=](Bytes& b) {
-        u16(b, instance);
-        b.insert(b.end(), {board, proc, comp, 0});
-    };
+Bytes desc(std::uint16_t instance, std::uint8_t board, std::uint8_t proc, std::uint8_t comp) {
+    return concat({u16(instance), {board, proc, comp, 0}});
 }
 
 // A body read from `bytes` takes `consumed` of them (all if 0), prints `text` (unless null),
@@ -129,9 +106,9 @@ struct Golden {
 };
 
 Bytes words256() {
-    Bytes b = cat({U32(1), U32(0x3FF800)});  // u32, 256 elements
+    Bytes b = words({1, 0x3FF800});  // u32, 256 elements
     for (unsigned int i = 0; i < 256; ++i) {
-        u32(b, i);
+        b = concat({b, u32(i)});
     }
     return b;
 }
@@ -139,99 +116,91 @@ Bytes words256() {
 const Golden kGolden[] = {
     // Standard messages.
     {"StdResource::MsgAck_t", {}, "{}"},
-    {"StdResource::MsgError_t", cat({U32(0x12), U32(0x55), U32(0x1601), U32(3)}),
+    {"StdResource::MsgError_t", words({0x12, 0x55, 0x1601, 3}),
      "{ErrorMsg 18 ErrorCode 85 Data {Num 5633 Val 3}}"},
-    {"StdResource::MsgError_t", cat({U32(0x13), U32(1), U32(7), U32(8)}),
-     "{ErrorMsg 19 ErrorCode 1 Data {7 8}}"},
-    {"StdResource::MsgError_t", cat({U32(0x1600), U32(2), raw({0xAA, 0xBB, 0xCC})}),
+    {"StdResource::MsgError_t", words({0x13, 1, 7, 8}), "{ErrorMsg 19 ErrorCode 1 Data {7 8}}"},
+    {"StdResource::MsgError_t", concat({words({0x1600, 2}), {0xAA, 0xBB, 0xCC}}),
      "{ErrorMsg 5632 ErrorCode 2 Data {}}", 8},
-    {"StdResource::MsgGetParmCmplt_t", cat({U32(0x1601), U32(4), U32(50)}),
+    {"StdResource::MsgGetParmCmplt_t", words({0x1601, 4, 50}),
      "{Num 5633 Val 4 TextSize 50 Text {}}"},
-    {"StdResource::MsgDetectEvt_t", cat({desc(5, 1, 2, 3), U32(0x1230), U32(0x1230)}),
+    {"StdResource::MsgDetectEvt_t", concat({desc(5, 1, 2, 3), u32(0x1230), u32(0x1230)}),
      "{RetAddr {Node 0 Board 1 Processor 2 Component 3 Instance 5} EvtType 4656 "
      "EvtGroup 4656}"},
-    {"StdResource::MsgGetxParms_t", cat({U32(1), U32(0x10), U32(0x20)}),
-     "{Count 1 Parms {{Parm 16 Val 32}}}"},
-    {"StdResource::MsgGetVParmCmplt_t", cat({U16(1), U32(0x10), U32(0x20)}),
+    {"StdResource::MsgGetxParms_t", words({1, 0x10, 0x20}), "{Count 1 Parms {{Parm 16 Val 32}}}"},
+    {"StdResource::MsgGetVParmCmplt_t", concat({u16(1), u32(0x10), u32(0x20)}),
      "{Count 1 Parms {{Parm 16 Val 32}}}"},
     // Call control.
-    {"TSC::MsgMakeCall_t", cat({str("5551234", 128), str("5551212", 128), raw({1})})},
-    {"TSC::MsgDropCall_t", cat({U32(5), U32(0xE)}), "{CallId 5 Reason 14 KVSet {}}"},
-    {"TSC::MsgSendISDN_t", cat({U32(0), U32(7), U32(2), raw({0xAB, 0xCD})}),
+    {"TSC::MsgMakeCall_t", concat({text("5551234", 128), text("5551212", 128), {1}})},
+    {"TSC::MsgDropCall_t", words({5, 0xE}), "{CallId 5 Reason 14 KVSet {}}"},
+    {"TSC::MsgSendISDN_t", concat({words({0, 7, 2}), {0xAB, 0xCD}}),
      "{CallId 0 MessageType 7 DataLength 2 Data {171 205}}"},
-    {"TSC::MsgAttach_t", cat({raw({1}), U32(18), desc(1, 2, 1, 18)}),
+    {"TSC::MsgAttach_t", concat({{1}, u32(18), desc(1, 2, 1, 18)}),
      "{Count 1 MediaInfo {{ComponentType 18 InstDesc {Node 0 Board 2 Processor 1 Component 18 "
      "Instance 1}}}}"},
-    {"TSC::EvtCallState_t", cat({U32(0x1230), U32(0x1234), U32(77), U32(5), U32(3), U32(0xE)}),
+    {"TSC::EvtCallState_t", words({0x1230, 0x1234, 77, 5, 3, 0xE}),
      "{EvtGroup 4656 Type 4660 Timestamp 77 CallId 5 CallState 3 Reason 14}"},
     {"TSC::EvtCallInfo_t",  // a text type
-     cat({U32(0x1200), U32(0x1204), U32(1), U32(2), U32(3), str("5551212", 128)})},
+     concat({words({0x1200, 0x1204, 1, 2, 3}), text("5551212", 128)})},
     {"TSC::EvtCallInfo_t",  // a number type
-     cat({U32(0x1200), U32(0x1202), U32(1), U32(2), U32(3), U32(0xDEAD)}),
+     words({0x1200, 0x1202, 1, 2, 3, 0xDEAD}),
      "{EvtGroup 4608 Type 4610 Timestamp 1 CallId 2 InfoId 3 Value 57005}"},
     // The run of elements is sized to the 5 bytes left: 2 read, 3 left default.
     {"TSC::EvtISDNCallInfoSet_t",
-     cat({U32(0x121D), U32(0x121D), U32(1), U32(2), U32(2), raw({5, 0xA1, 0x70, 2, 0x41, 0x42})}),
+     concat({words({0x121D, 0x121D, 1, 2, 2}), {5, 0xA1, 0x70, 2, 0x41, 0x42}}),
      "{EvtGroup 4637 Type 4637 Timestamp 1 CallId 2 Count 2 MessageType 5 Data {{IEId 161 "
      "Length {} Value {}} {IEId 112 Length 2 Value {65 66}} {IEId 0 Length 0 Value NULL} {IEId 0 "
      "Length 0 Value NULL} {IEId 0 Length 0 Value NULL}}}",
      0, 32, false},
-    {"TSC::MsgDropCall_t::KVSet_t", cat({U32(0), U32(40)}), "{Key 0 ByteLength 40 Value {}}"},
+    {"TSC::MsgDropCall_t::KVSet_t", words({0, 40}), "{Key 0 ByteLength 40 Value {}}"},
     {"TSC::MsgDropCall_t::KVSet_t",
-     cat({U32(0x1203), U32(0), U32(7), U32(0x380000), U32(99), U32(8), U32(0x201000),
-          raw({1, 2, 3}), U32(0), U32(0)}),
+     concat({words({0x1203, 0, 7, 0x380000, 99, 8, 0x201000}), {1, 2, 3}, words({0, 0})}),
      "{Key 4611 ByteLength 0 Value {{Id 7 Type 3670016 Value 99} {Id 8 Type 2101248 Value {1 2 "
      "3}}}}",
      0, 8 + 12 + 8 + 12 + 8},
-    {"TSC::MsgDropCall_t::KVSet_t", cat({U32(0x1203), U32(0), U32(0), U32(0)}),
-     "{Key 4611 ByteLength 0 Value {}}"},
+    {"TSC::MsgDropCall_t::KVSet_t", words({0x1203, 0, 0, 0}), "{Key 4611 ByteLength 0 Value {}}"},
     // No terminator: the records stop at the end of the message; written back, one is added.
-    {"TSC::MsgDropCall_t::KVSet_t",
-     cat({U32(0x1203), U32(0), U32(5), U32(0x380000), U32(1), U32(5), U32(0x380000), U32(1)}),
+    {"TSC::MsgDropCall_t::KVSet_t", words({0x1203, 0, 5, 0x380000, 1, 5, 0x380000, 1}),
      "{Key 4611 ByteLength 0 Value {{Id 5 Type 3670016 Value 1} {Id 5 Type 3670016 Value 1}}}", 0,
      40, false},
-    {"TSC::MsgDropCall_t::KVSet_t", cat({U32(0x1201), U32(0xFFFFFFFF), raw({9, 8, 7})}),
+    {"TSC::MsgDropCall_t::KVSet_t", concat({words({0x1201, 0xFFFFFFFF}), {9, 8, 7}}),
      "{Key 4609 ByteLength 4294967295 Value {9 8 7}}"},
     {"TSC::MsgGetCallInfoCmplt_t::CallInfo_t",
-     cat({U32(5), raw({1}), U32(0), U16(3), raw({'a', 'b', 'c'})}),
+     concat({u32(5), {1}, u32(0), u16(3), {'a', 'b', 'c'}}),
      "{InfoId 5 State 1 Type 0 Length 3 Value {a b c}}"},
     // A shaped value counts four bytes an element in the size, whatever its width.
     {"TSC::MsgGetCallInfoCmplt_t::CallInfo_t",
-     cat({U32(4), raw({0}), U32(0x280800), U16(0), U16(0x1234), U16(0x5678)}),
+     concat({u32(4), {0}, u32(0x280800), u16(0), u16(0x1234), u16(0x5678)}),
      "{InfoId 4 State 0 Type 2623488 Length 0 Value {4660 22136}}", 0, 19},
     // Line control.
-    {"LCON::Std_MsgSetVParm_t::Parms_t", cat({U32(0x1601), U32(0x380000), U32(4)}),
+    {"LCON::Std_MsgSetVParm_t::Parms_t", words({0x1601, 0x380000, 4}),
      "{Parm 5633 FieldDef 3670016 Val 4}"},
-    {"LCON::Std_MsgSetVParm_t::Parms_t",
-     cat({U32(7), U32(0x203800), raw({1, 2, 3, 4, 5, 6, 7, 8})}),
+    {"LCON::Std_MsgSetVParm_t::Parms_t", concat({words({7, 0x203800}), {1, 2, 3, 4, 5, 6, 7, 8}}),
      "{Parm 7 FieldDef 2111488 Val {1 2 3 4 5 6 7 8}}"},
     {"LCON::Std_MsgGetVParmCmplt_t::Parms_t", words256()},
-    {"LCON::MsgGetMetricsCmplt_t",
-     cat({U32(0x1616), U32(2), U32(900), U32(30), U32(0), U32(10), U32(20), U32(1), U32(11),
-          U32(21)}),
+    {"LCON::MsgGetMetricsCmplt_t", words({0x1616, 2, 900, 30, 0, 10, 20, 1, 11, 21}),
      "{Type 5654 Count 2 IntervalInfo {IntervalTotal 900 CurrentIntervalTimer 30} Metrics "
      "{{MetricsId 0 CurrentValue 10 PreviousValue 20} {MetricsId 1 CurrentValue 11 "
      "PreviousValue 21}}}"},
-    {"LCON::MsgGetMetricsCmplt_t", cat({U32(3), U32(2), U32(0), U32(10), U32(1), U32(11)}),
+    {"LCON::MsgGetMetricsCmplt_t", words({3, 2, 0, 10, 1, 11}),
      "{Type 3 Count 2 IntervalInfo {} Metrics {{MetricsId 0 CurrentValue 10} {MetricsId 1 "
      "CurrentValue 11}}}"},
-    {"LCON::Evt_0x1611_t", cat({U32(0x1611), U32(2), U32(9)}), "{Label 5649 Type 2 Reason 9}"},
-    {"LCON::Evt_0x1600_t", cat({U32(0x1600), U32(3), raw({1})}), "{Label 5632 Type 3 State 1}"},
+    {"LCON::Evt_0x1611_t", words({0x1611, 2, 9}), "{Label 5649 Type 2 Reason 9}"},
+    {"LCON::Evt_0x1600_t", concat({words({0x1600, 3}), {1}}), "{Label 5632 Type 3 State 1}"},
     // Resource manager, clusters, signalling.
     {"ResourceMgr::CompMultipleResult_t::comps_t",
-     cat({desc(3, 1, 1, 18), U32(0), U32(18), U32(0xFFFFFFFF), U32(0)}),
+     concat({desc(3, 1, 1, 18), u32(0), u32(18), u32(0xFFFFFFFF), u32(0)}),
      "{compDesc {Node 0 Board 1 Processor 1 Component 18 Instance 3} attrs {{key 0 value 18}}}"},
     {"ResourceMgr::CompMultipleResult_t::comps_t",
-     cat({desc(3, 1, 1, 18), U32(0xFFFFFFFF), U32(0)}),
+     concat({desc(3, 1, 1, 18), u32(0xFFFFFFFF), u32(0)}),
      "{compDesc {Node 0 Board 1 Processor 1 Component 18 Instance 3} attrs {}}"},
     {"Cluster::ClusterSlotAssign_t",
-     cat({desc(1, 1, 1, 0), U32(0x4201), raw({2, 1, 0x7F}), U16(3), U16(0x104)}),
+     concat({desc(1, 1, 1, 0), u32(0x4201), {2, 1, 0x7F}, u16(3), u16(0x104)}),
      "{ClustDesc {Node 0 Board 1 Processor 1 Component 0 Instance 1} portId 16897 width 2 "
      "encoding 1 idlePattern 127 slotIds {3 260}}"},
-    {"CAS::MsgGenerateSignal_t", cat({U32(1), U16(0), raw({0})}),
+    {"CAS::MsgGenerateSignal_t", concat({u32(1), u16(0), {0}}),
      "{SignalId 1 Count 0 Format 0 SignalList {}}"},
     // Count travels as it stands; format 2 makes the list characters.
-    {"CAS::MsgGenerateSignal_t", cat({U32(1), U16(9), raw({2, 'A', 'B'})}),
+    {"CAS::MsgGenerateSignal_t", concat({u32(1), u16(9), {2, 'A', 'B'}}),
      "{SignalId 1 Count 9 Format 2 SignalList {A B}}"},
 };
 
@@ -277,14 +246,13 @@ TEST(ReferenceBodies, WriteTheCallersValuesAndReadIntoThem) {
     Canaried r = encodeCanaried(redirect);
     EXPECT_EQ(r.size, 132u);
     EXPECT_TRUE(r.canaryKept);
-    EXPECT_TRUE(SameBytes(
-        r.bytes, cat({U32(9), [&](Bytes& b) { b.insert(b.end(), s.begin(), s.begin() + 128); }})));
+    EXPECT_TRUE(SameBytes(r.bytes, concat({u32(9), Bytes(s.begin(), s.begin() + 128)})));
     staticList<char> proto;
     proto.realloc(2);
     *proto[0] = 'P';
     *proto[1] = 0;
     tolk::LCON_Bodies::MsgTSPSetProtocol_t setProto(proto);
-    EXPECT_TRUE(SameBytes(encodeCanaried(setProto).bytes, cat({str("P", 32)})));
+    EXPECT_TRUE(SameBytes(encodeCanaried(setProto).bytes, text("P", 32)));
 
     // Counted lists send their real length, and the caller's count takes it.
     unsigned char width = 0, enc = 1, idle = 0x7F;
@@ -297,16 +265,16 @@ TEST(ReferenceBodies, WriteTheCallersValuesAndReadIntoThem) {
     tolk::Cluster_Bodies::ClusterSlotAssign_t assign(cl, port, width, enc, idle, slots);
     EXPECT_TRUE(
         SameBytes(encodeCanaried(assign).bytes,
-                  cat({desc(1, 1, 1, 0), U32(0x4201), raw({2, 1, 0x7F}), U16(3), U16(0x104)})));
+                  concat({desc(1, 1, 1, 0), u32(0x4201), {2, 1, 0x7F}, u16(3), u16(0x104)})));
     EXPECT_EQ(width, 2);
 
     using Std = tolk::StdResource_Bodies;
     unsigned int count = 0xFFFFFFFF;
     staticList<Std::MsgGetxParms_t::Parms_t> parms;
     Std::MsgGetxParms_t get(count, parms);
-    EXPECT_TRUE(SameBytes(encodeCanaried(get).bytes, cat({U32(0)})));
+    EXPECT_TRUE(SameBytes(encodeCanaried(get).bytes, words({0})));
     EXPECT_EQ(count, 0u);
-    auto m = msgOf(cat({U32(1), U32(0x10), U32(0x20)}));
+    auto m = msgOf(words({1, 0x10, 0x20}));
     (void)get.readMsg(m.get(), 0);
     EXPECT_EQ(count, 1u);
     ASSERT_EQ(parms.length(), 1u);
@@ -322,7 +290,7 @@ TEST(ReferenceBodies, WriteTheCallersValuesAndReadIntoThem) {
     *sig[1] = 'B';
     auto w = reinterpret_cast<tolk::cat::ValueWord>(&sig);
     tolk::CAS_Bodies::MsgGenerateSignal_t gen(id, sigCount, format, w);
-    EXPECT_TRUE(SameBytes(encodeCanaried(gen).bytes, cat({U32(9), U16(9), raw({2, 'A', 'B'})})));
+    EXPECT_TRUE(SameBytes(encodeCanaried(gen).bytes, concat({u32(9), u16(9), {2, 'A', 'B'}})));
 
     unsigned int errMsg = 0x1214, code = 4;
     tolk::cat::ValueWord none = 0;
@@ -336,17 +304,16 @@ TEST(ReferenceBodies, KeyValueListEndsInExactlyOneTerminator) {
     KV kv;
     kv.Key = 0x1203;
     Canaried none = encodeCanaried(kv);
-    EXPECT_TRUE(SameBytes(none.bytes, cat({U32(0x1203), U32(0), U32(0), U32(0)})))
+    EXPECT_TRUE(SameBytes(none.bytes, words({0x1203, 0, 0, 0})))
         << "no list at all still ends in a terminator";
-    auto m = msgOf(cat({U32(0x1203), U32(0), U32(7), U32(0x380000), U32(99), U32(0), U32(0)}));
+    auto m = msgOf(words({0x1203, 0, 7, 0x380000, 99, 0, 0}));
     (void)kv.readMsg(m.get(), 0);
     auto* l = reinterpret_cast<staticList<KV::Value_Key_0x1203_t>*>(kv.Value);
     ASSERT_EQ(l->length(), 1u);
     l->realloc(2);  // a terminator of the caller's own
     Canaried c = encodeCanaried(kv);
-    EXPECT_TRUE(
-        SameBytes(Bytes(c.bytes.begin(), c.bytes.begin() + c.written),
-                  cat({U32(0x1203), U32(0), U32(7), U32(0x380000), U32(99), U32(0), U32(0)})));
+    EXPECT_TRUE(SameBytes(Bytes(c.bytes.begin(), c.bytes.begin() + c.written),
+                          words({0x1203, 0, 7, 0x380000, 99, 0, 0})));
 }
 
 // ---- every body of the index ----

@@ -18,6 +18,7 @@
 #include <typeinfo>
 
 #include "FakeBoard.h"
+#include "Golden.h"
 #include "catalogue/cas/CAS.h"
 #include "catalogue/chp/CHP.h"
 #include "catalogue/cluster/Cluster.h"
@@ -35,6 +36,12 @@
 
 namespace {
 
+using golden::Bytes;
+using golden::concat;
+using golden::text;
+using golden::u16;
+using golden::u32;
+using golden::words;
 using tolk::Addressable;
 using tolk::CAS;
 using tolk::CHP;
@@ -49,7 +56,6 @@ using tolk::staticList;
 using tolk::StdResource;
 using tolk::TmpInstance;
 using tolk::TSC;
-using Bytes = std::vector<std::uint8_t>;
 
 // A channel component on board 2, node 0; its services stand at fixed instances there.
 const tolk::CompDesc_t kTarget(3, 2, 1, 18, 0);
@@ -62,33 +68,6 @@ const tolk::CompDesc_t kInst(0x44, 2, 1, 22, 0);
 const tolk::CompDesc_t kLine(1, 2, 1, 22, 0);
 const tolk::CompDesc_t kSignals(3, 2, 1, 20, 0);
 
-Bytes concat(std::initializer_list<Bytes> parts) {
-    Bytes out;
-    for (const Bytes& p : parts) {
-        out.insert(out.end(), p.begin(), p.end());
-    }
-    return out;
-}
-
-// Big-endian, as on the wire.
-Bytes u32(unsigned int v) {
-    return {static_cast<std::uint8_t>(v >> 24), static_cast<std::uint8_t>(v >> 16),
-            static_cast<std::uint8_t>(v >> 8), static_cast<std::uint8_t>(v)};
-}
-
-Bytes words(std::initializer_list<unsigned int> values) {
-    Bytes b;
-    for (unsigned int v : values) {
-        b.insert(b.end(), {static_cast<std::uint8_t>(v >> 24), static_cast<std::uint8_t>(v >> 16),
-                           static_cast<std::uint8_t>(v >> 8), static_cast<std::uint8_t>(v)});
-    }
-    return b;
-}
-
-Bytes u16(unsigned int v) {
-    return {static_cast<std::uint8_t>(v >> 8), static_cast<std::uint8_t>(v)};
-}
-
 Bytes desc(const tolk::CompDesc_t& d) {
     return {static_cast<std::uint8_t>(d.instance >> 8),
             static_cast<std::uint8_t>(d.instance),
@@ -96,13 +75,6 @@ Bytes desc(const tolk::CompDesc_t& d) {
             d.processor,
             d.component,
             d.node};
-}
-
-// A character field of n bytes holding s.
-Bytes text(const std::string& s, std::size_t n) {
-    Bytes b(s.begin(), s.end());
-    b.resize(n, 0);
-    return b;
 }
 
 // What the services and components of a board answer: the shared completions of the

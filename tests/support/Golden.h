@@ -8,7 +8,7 @@
 
 #include <cstdint>
 #include <cstdio>
-#include <cstring>
+#include <initializer_list>
 #include <string>
 #include <vector>
 
@@ -41,26 +41,33 @@ inline ::testing::AssertionResult SameBytes(const Bytes& actual, const Bytes& ex
            << "\n  expected: " << hex(expected);
 }
 
-inline void u32(Bytes& b, std::uint32_t v) {
-    b.push_back(static_cast<std::uint8_t>(v >> 24));
-    b.push_back(static_cast<std::uint8_t>(v >> 16));
-    b.push_back(static_cast<std::uint8_t>(v >> 8));
-    b.push_back(static_cast<std::uint8_t>(v));
+// A big-endian word and half-word, a run of words, byte strings joined in order, and a
+// character field of `fixed` bytes holding s.
+inline Bytes u32(std::uint32_t v) {
+    return {static_cast<std::uint8_t>(v >> 24), static_cast<std::uint8_t>(v >> 16),
+            static_cast<std::uint8_t>(v >> 8), static_cast<std::uint8_t>(v)};
 }
-inline void u16(Bytes& b, std::uint16_t v) {
-    b.push_back(static_cast<std::uint8_t>(v >> 8));
-    b.push_back(static_cast<std::uint8_t>(v));
+inline Bytes u16(std::uint16_t v) {
+    return {static_cast<std::uint8_t>(v >> 8), static_cast<std::uint8_t>(v)};
 }
-inline void u8(Bytes& b, std::uint8_t v) {
-    b.push_back(v);
+inline Bytes concat(std::initializer_list<Bytes> parts) {
+    Bytes out;
+    for (const Bytes& p : parts) {
+        out.insert(out.end(), p.begin(), p.end());
+    }
+    return out;
 }
-inline void zeros(Bytes& b, std::size_t n) {
-    b.insert(b.end(), n, 0);
+inline Bytes words(std::initializer_list<std::uint32_t> values) {
+    Bytes out;
+    for (std::uint32_t v : values) {
+        out = concat({out, u32(v)});
+    }
+    return out;
 }
-inline void chars(Bytes& b, const char* s, std::size_t fixed) {
-    std::size_t n = std::strlen(s);
-    b.insert(b.end(), s, s + n);
-    zeros(b, fixed - n);
+inline Bytes text(const std::string& s, std::size_t fixed) {
+    Bytes b(s.begin(), s.end());
+    b.resize(fixed, 0);
+    return b;
 }
 
 // What `write` put into a buffer of `size` bytes. A canary byte sits right behind the buffer:

@@ -18,13 +18,7 @@ using golden::Bytes;
 // A frame header as a relay writes it: type, 0, size, extra size, and the sender's own pointer
 // (which a reader ignores).
 inline Bytes frameHeader(std::uint32_t type, std::uint32_t size, std::uint32_t exSize) {
-    Bytes b;
-    golden::u32(b, type);
-    golden::u32(b, 0);
-    golden::u32(b, size);
-    golden::u32(b, exSize);
-    golden::u32(b, 0xDEADBEEF);
-    return b;
+    return golden::words({type, 0, size, exSize, 0xDEADBEEF});
 }
 
 class ScriptedRelay {

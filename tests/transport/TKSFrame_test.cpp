@@ -126,8 +126,7 @@ TEST(TKSFrame, OpenAndAssignedBodiesAreGolden) {
 }
 
 TEST(TKSFrame, CloseFramesAreHeadersOnly) {
-    Bytes close = {0, 0, 0x07, 0xD0};
-    golden::zeros(close, 16);
+    Bytes close = golden::words({0x7D0, 0, 0, 0, 0});
     msg_t m;
     m.type = TKS_FRAME_CLOSE;
     EXPECT_TRUE(golden::SameBytes(tksEncodeFrame(m), close));
@@ -201,7 +200,7 @@ TEST(TKSFrameRead, MalformedBodyIsNotTurnedIntoABlock) {
     for (const auto& [size, exSize, count] : cases) {
         Bytes body(std::min<std::uint32_t>(size, 52), 0);
         if (size >= 56) {
-            golden::u32(body, count);
+            body = golden::concat({body, golden::u32(count)});
             body.resize(size, 0);
         }
         EXPECT_EQ(nullptr, tksBlockFromFrame(MessageFrame(body, exSize).m))
