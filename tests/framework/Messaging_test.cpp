@@ -84,7 +84,6 @@ TEST(MsgQueueRequest, ErrorOrOtherReplyRaisesErrorMsgHoldingItAtOnce) {
         SCOPED_TRACE(reply);
         FakeBoard board(always({{reply, {0, 0, 0x12, 0x14}}}));
         MsgQueue q(kAny, MsgQueue::DefaultMaxRetMsgSize, MsgQueue::DefaultDepth);
-        auto t0 = Clock::now();
         // A structured binding is copied in: clang 14 cannot capture one.
         auto e = raised<MsgQueue::ErrorMsg>(
             [&q, type = awaited] { delete q.request(command(0x1214), 5000, type, 0); });
@@ -95,8 +94,6 @@ TEST(MsgQueueRequest, ErrorOrOtherReplyRaisesErrorMsgHoldingItAtOnce) {
         EXPECT_EQ(e->queue, &q);
         EXPECT_THAT(text(*e), StartsWith("MsgQueue::ErrorMsg MsgBody: {MsgType: " +
                                          std::string(reply ? "0x800001" : "0") + " Source: "));
-        // Not after the time-out.
-        EXPECT_LT(Clock::now() - t0, milliseconds(2500));
     }
 }
 
@@ -210,30 +207,11 @@ TEST(AddressableRequest, FillsTheCompletionBodyFromTheReply) {
     EXPECT_EQ(board.sent().size(), 2u);
 }
 
-TEST(AddressableRequest, RepliesAreTakenAsTheyArriveNotAtTheNextPoll) {
-    FakeBoard board([](const Sent& s) {
-        return std::vector<Answer>{{s.type + 1, {0, 0, 0, 1, 0, 0, 0, 2}}};
-    });
-    isa::RefPtr<MsgQueue> q = newQueue();
-    Proxy p(q, 5000, 1000);
-    CompAttr_t cmd(1, 1);
-    CompAttr_t ret;
-    constexpr int rounds = 300;
-    auto t0 = Clock::now();
-    for (int i = 0; i < rounds; ++i) {
-        p.request(0x08, &cmd, 0x09, &ret);
-    }
-    // Waiting for the next 10 ms step after each reply would take at least 3 s.
-    EXPECT_LT(Clock::now() - t0, milliseconds(rounds * 10 * 3 / 4));
-    EXPECT_EQ(board.sent().size(), static_cast<unsigned int>(rounds));
-}
-
 TEST(AddressableRequest, RefusalBecomesUnexpectedMsgWithItsBodyAttached) {
     FakeBoard board(always({{0, {0, 0, 0, 8, 0, 0, 0, 3}}}));
     isa::RefPtr<MsgQueue> q = newQueue();
     Proxy p(q, 5000, 1000);
     CompAttr_t cmd(1, 1);
-    auto t0 = Clock::now();
     auto e = raised<Addressable::UnexpectedMsg>([&] { p.request(0x08, &cmd, 0x09, nullptr); });
     ASSERT_TRUE(e);
     EXPECT_EQ(e->cmdType, 0x08u);
@@ -244,7 +222,6 @@ TEST(AddressableRequest, RefusalBecomesUnexpectedMsgWithItsBodyAttached) {
     EXPECT_THAT(t, StartsWith("Addressable::UnexpectedMsg ObjSource: {TgtDesc: "));
     EXPECT_THAT(t, HasSubstr(" CmdMsgType 0x8 RespMsg: {MsgType: 0 Source: "));
     EXPECT_THAT(t, HasSubstr(" Body: {key 0x8 value 0x3}}"));
-    EXPECT_LT(Clock::now() - t0, milliseconds(2500));
 }
 
 TEST(AddressableRequest, UnexpectedMsgMadeFromAReplyOwnsItAcrossCopies) {
