@@ -468,9 +468,6 @@ TEST_F(EmulationTest, EachRequestIsAnsweredAsABoardWould) {
                                 kErrNoSuchCall),
         ask<Tsc::MsgSetChanState_t>("ChannelStateOfNoMeaning", tscOf(1, 1, 20), 0x1220,
                                     kErrBadParameter, [](auto& b) { b.State = 99; }),
-        ask<Tsc::MsgSetChanState_t>("ChannelBackInService", tscOf(1, 1, 20), 0x1220, 0,
-                                    [](auto& b) { b.State = 256; }),
-        ask<Tsc::MsgResetLineDevice_t>("ResetLineDevice", tscOf(1, 1, 21), 0x1247, 0),
         ask<Tsc::MsgAttach_t>("AttachOnAFixedBoard", tscOf(1, 1, 20), 0x1235, kErrNotSupported),
         ask<Tsc::MsgDetach_t>("DetachWhatIsNotAttached", tscOf(2, 1, 20), 0x1237, kErrBadState),
         ask<Lcon::MsgStopAlarm_t>("StopAnAlarmNotSent", farm::lconAddress(1, 1), 0, kErrBadState,
@@ -696,36 +693,6 @@ TEST_F(RelayTest, AClientsRequestIsAnsweredAndCounted) {
     a.request(0x120F, &getChan, 0x1210, &st);
     EXPECT_EQ(st.ChanState, 1u);
     EXPECT_EQ(server->control("stats").rfind("ok stats requests=1 answers=1", 0), 0u);
-}
-
-TEST_F(RelayTest, FarEndCallBetweenTwoChannelsOfTwoClients) {
-    Addressable caller(cd(farm::channelComponentAddress(1, 1, 1, farm::kTSC)));
-    Addressable called(cd(farm::channelComponentAddress(1, 1, 23, farm::kTSC)));
-    subscribe(caller, 0x1230);
-    subscribe(called, 0x1230);
-    Tsc::MsgMakeCall_t mk;
-    testsupport::setText(mk.DestAddr, "5551234");
-    testsupport::setText(mk.OrigAddr, "5551212");
-    Tsc::MsgMakeCallCmplt_t done;
-    caller.request(0x1214, &mk, 0x1215, &done);
-
-    std::uint16_t calledInst = called.getTgtDesc().instance;
-    std::uint16_t callerInst = caller.getTgtDesc().instance;
-    Event offered;
-    ASSERT_TRUE(BoardEvents::get().waitUntil(
-        [&](const Event& e) {
-            return e.source == calledInst && e.words.size() == 6 && e.words[4] == 11;  // Offered
-        },
-        &offered));
-    std::uint32_t farCall = offered.words[3];
-    EXPECT_NE(farCall, done.CallId);
-    Tsc::MsgAnswerCall_t ans;
-    ans.CallId = farCall;
-    called.request(0x1201, &ans);
-    EXPECT_TRUE(BoardEvents::get().waitUntil([&](const Event& e) {
-        const auto& w = e.words;
-        return e.source == callerInst && w.size() == 6 && w[3] == done.CallId && w[4] == 2;
-    }));
 }
 
 TEST_F(RelayTest, OversizeAndUnknownFramesAreRefused) {
