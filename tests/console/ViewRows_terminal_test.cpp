@@ -85,17 +85,10 @@ class ViewsTest : public ::testing::Test {
     CommandRunner commands;
 };
 
+// Without a farm set, the emulation plays the default one. How the system view and the
+// views' heads are drawn is the system view's test and the view managers'.
 TEST_F(ViewsTest, EveryCommandWithoutItsViewAndTheTrunkCommands) {
     EXPECT_EQ(Trimmed(session, 0), std::string(46, ' ') + "SYSTEM VIEW - vx7-demo");
-    EXPECT_EQ(Trimmed(session, 2), "  brd 1: (VX7/T1-2):  (L1 c=24 CAS) (L2 c=24 CAS)");
-    EXPECT_EQ(Trimmed(session, 3), "  brd 2: (VX7/PRI-1):  (L1 c=23 CCS)");
-    EXPECT_EQ(Trimmed(session, 4), "  brd 3: (VX7/AN-8):  (L1 c=4 CAS) (L2 c=4 CAS)");
-    EXPECT_EQ(Trimmed(session, 5), "");
-    EXPECT_EQ(PhoneRow(0),
-              "  B.L.C  CallId     ChanState                   CallState              Reason");
-    EXPECT_EQ(TrunkRow(0),
-              "  B.L    TrunkState        Reason          Sig   LBK   Red   Yel   CRC   AIS   "
-              "DChan  BPVS   FERR");
 
     // The view is looked for before the address is checked.
     RunAll("ERROR - unable to find phone view",
@@ -105,12 +98,11 @@ TEST_F(ViewsTest, EveryCommandWithoutItsViewAndTheTrunkCommands) {
     RunAll("ERROR - unable to find trunk view",
            {"trunk_ins 1 2", "trunk_oos 1 2", "disablelbk 1 2", "linelbk 1 2", "payloadlbk 1 2",
             "startrai 1 2", "stoprai 1 2"});
-    // Out of range, or no such line or board.
-    RunAll("ERROR - unable to create phone view",
-           {"phone 1 65 1", "phone 1 1 32", "phone 7 1 1", "phone -1 1 1"});
     // A command with the wrong number of fields reaches nothing and says nothing.
     RunAll("", {"phone 1 1", "trunk 1 1 1", "origaddr 1 1 5", "answer"});
+    // Which keys a view refuses is the view managers' rule.
     RunAll({
+        {"phone 7 1 1", "ERROR - unable to create phone view"},
         {"delphone 1 1 5", "ERROR - unable to delete phone view"},
         {"deltrunk 1 2", "ERROR - unable to delete trunk view"},
         {"trunk 1 3", "ERROR - unable to create trunk view"},
@@ -121,10 +113,6 @@ TEST_F(ViewsTest, EveryCommandWithoutItsViewAndTheTrunkCommands) {
     EXPECT_EQ(commands.Output("trunk 1 1"), "trunk view creaed successfully");
     ASSERT_TRUE(WaitTrunk(1, 8, "InService"));
     EXPECT_EQ(TrunkRow(1).substr(0, 5), "  1.1");
-    // A line with its signal and D channel good: both reversed columns show "X".
-    EXPECT_EQ(session.TextAt(TRUNK_ROW0 + 1, WINDOW_COL0 + 42, 1), "X");
-    EXPECT_EQ(session.TextAt(TRUNK_ROW0 + 1, WINDOW_COL0 + 78, 1), "X");
-    EXPECT_EQ(session.TextAt(TRUNK_ROW0 + 1, BPV_COL, 8), "0      0");
     RunAll({
         {"trunk 1 1", "ERROR - unable to create trunk view"},
         {"linelbk 1 1", "enabling line loopback completed"},
@@ -152,16 +140,13 @@ TEST_F(ViewsTest, ACallThePhoneCommandsAndTheRowsOfTheViews) {
     EXPECT_EQ(PhoneRow(2).substr(0, 8), "  1.1.23");
 
     // The default addresses call 1.1.23 from 1.1.1; answer and drop print nothing on success.
+    // How a call goes on is the emulation's; how its states are drawn, the observers'.
     EXPECT_EQ(commands.Output("makecall 1 1 1"), "makecall started successfully");
     ASSERT_TRUE(WaitPhone(2, 47, "Offered"));
-    ASSERT_TRUE(WaitPhone(1, 47, "Alerting"));
-    EXPECT_EQ(session.TextAt(PHONE_ROW0 + 2, WINDOW_COL0 + 70, 12), "IncomingCall");
     EXPECT_EQ(commands.Output("answer 1 1 23"), "");
     ASSERT_TRUE(WaitPhone(1, 47, "Connected"));
-    ASSERT_TRUE(WaitPhone(2, 47, "Connected"));
     EXPECT_EQ(commands.Output("drop 1 1 1"), "");
     ASSERT_TRUE(WaitPhone(2, 47, "Disconnected"));
-    ASSERT_TRUE(WaitPhone(1, 70, "Normal"));
 
     ASSERT_TRUE(commands.Run("phone 1 2 3"));
     RunAll({
@@ -178,23 +163,9 @@ TEST_F(ViewsTest, ACallThePhoneCommandsAndTheRowsOfTheViews) {
     // "Active" is followed by two tabs, which carry the blanks past the field's end.
     ASSERT_TRUE(WaitPhone(3, 19, "Active      "));
 
-    // Seven more views make ten; row 10 of the window lies below its last row, so the tenth
-    // view works unseen.
-    for (int chan = 2; chan <= 8; ++chan) {
-        ASSERT_EQ(commands.Output("phone 1 1 " + std::to_string(chan)),
-                  "phone view creaed successfully");
-    }
-    EXPECT_EQ(PhoneRow(9).substr(0, 7), "  1.1.7");
-    EXPECT_EQ(Trimmed(session, PHONE_ROW0 + 10), "");
-    RunAll({
-        {"reset 1 1 8", "channel reset completed"},
-        {"phone 1 1 11", "ERROR - unable to create phone view"},
-        {"delphone 1 1 23", "successfully deleted phone view"},
-    });
+    // Which row a view takes, and the limit of ten, are the view managers' rules.
+    EXPECT_EQ(commands.Output("delphone 1 1 23"), "successfully deleted phone view");
     EXPECT_EQ(PhoneRow(2), "");
-    EXPECT_EQ(PhoneRow(0).substr(0, 7), "  B.L.C");
-    EXPECT_EQ(commands.Output("phone 1 2 7"), "phone view creaed successfully");
-    EXPECT_EQ(PhoneRow(2).substr(0, 7), "  1.2.7");
 }
 
 // Boards in ascending order of their numbers, 32 included, whatever the farm's order; a board

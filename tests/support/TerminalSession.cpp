@@ -138,13 +138,8 @@ TerminalSession::TerminalSession(TerminalOptions options)
     for (const auto& [name, value] : options.env) {
         command += " " + ShellQuote(name + "=" + value);
     }
-#ifdef LINEPROBE_BINARY
-    if (options.binary.empty()) {
-        options.binary = LINEPROBE_BINARY;
-    }
-#endif
     command += " sh -c 'echo $$ > \"$0\"; exec \"$@\"' " + ShellQuote((root_ / "pid").string());
-    command += " " + ShellQuote(options.binary);
+    command += " " + ShellQuote(LINEPROBE_BINARY);
     for (const std::string& arg : options.args) {
         command += " " + ShellQuote(arg);
     }

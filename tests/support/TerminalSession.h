@@ -20,8 +20,6 @@ inline constexpr std::chrono::milliseconds DEFAULT_WAIT{15000};
 struct TerminalOptions {
     int rows = 40;
     int cols = 100;
-    // The program; LINEPROBE_BINARY (set by the build) when empty.
-    std::string binary;
     std::vector<std::string> args;
     std::vector<std::pair<std::string, std::string>> env;
     std::vector<std::string> unsetEnv;

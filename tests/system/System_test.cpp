@@ -193,6 +193,9 @@ TEST(Soak, TenPhoneAndTenTrunkViewsUnderAnEventStorm) {
     }
     ASSERT_TRUE(session.WaitForTextAt(TRUNK_ROW0 + 9, WINDOW_COL0 + 8, "InService"))
         << session.Dump();
+    // The windows are ten rows high with their heads: the tenth view works unseen.
+    EXPECT_EQ(Trimmed(session, PHONE_ROW0 + 10), "") << session.Dump();
+    EXPECT_EQ(Trimmed(session, TRUNK_ROW0 + 10), "") << session.Dump();
 
     std::vector<TrunkExpect> trunks(VIEWS);
     std::vector<CallExpect> phones(VIEWS, CallExpect::Null);
@@ -333,7 +336,7 @@ TEST(Soak, TenPhoneAndTenTrunkViewsUnderAnEventStorm) {
 // type the model sends, then stays silent to each, then drops every connection. Commands
 // are typed in each state. The process must live, each failure must be written to the logs
 // with what failed, no command may hold the prompt longer than its requests' time-outs
-// allow, and once the relay is back a lineprobe started again must get working views.
+// allow, and once the relay is back a new view must follow its board.
 //
 // The short form refuses and silences all types at once, types every command under the
 // refusal and a few under the silence and after the drop (each of those waits out a reply
@@ -579,24 +582,9 @@ TEST_F(FaultRun, RefusedSilentAndDroppedRelay) {
         }
     }
 
-    // A lineprobe started again gets working views from the relay that dropped it. Its phone
-    // is another channel: the commands after the drop worked, and left channel 1.1.1 with a
-    // call and out of service.
-    TerminalSession again(ThroughRelay(sim, FAULT_FARM));
-    ASSERT_TRUE(again.WaitForTextAt(PROMPT_ROW, PROMPT_COL, PROMPT)) << again.Dump();
-    CommandRunner commandsAgain(again);
-    ASSERT_TRUE(commandsAgain.Run("trunk 1 1", std::chrono::seconds(30)).returned) << again.Dump();
-    ASSERT_TRUE(commandsAgain.Run("phone 1 1 3", std::chrono::seconds(30)).returned)
-        << again.Dump();
-    ASSERT_TRUE(again.WaitForTextAt(TRUNK_ROW0 + 1, WINDOW_COL0 + 8, "InService")) << again.Dump();
-    Control("call 1 1 3 5557777");
-    EXPECT_TRUE(again.WaitForTextAt(PHONE_ROW0 + 1, WINDOW_COL0 + 47, "Offered")) << again.Dump();
-    Control("alarm 1 1 red on");
-    EXPECT_TRUE(again.WaitForTextAt(TRUNK_ROW0 + 1, WINDOW_COL0 + 54, "X")) << again.Dump();
-
     std::printf(
         "fault run (%s): slowest command %lld ms: %s; after the drop a new view in the "
-        "same lineprobe %s; a new lineprobe works\n",
+        "same lineprobe %s\n",
         full ? "full" : "short", static_cast<long long>(slowest.count()), slowestWhat.c_str(),
         sameSessionWorks ? "works" : "does not follow its board");
     RecordProperty("same_session_after_drop", sameSessionWorks ? "works" : "dead");
