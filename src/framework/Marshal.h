@@ -15,11 +15,6 @@ namespace tolk {
 // A run moves in chunks of at most this many elements, one short of what a descriptor counts.
 inline constexpr unsigned int MaxChunk = wire::kMaxCount - 1;
 
-// Element width in bytes of a descriptor's type code.
-inline constexpr unsigned int descWidth(unsigned int desc) {
-    return wire::width(wire::typeOf(desc));
-}
-
 // A body's first field: moved alone, and if the offset is still 0 afterwards its width in bytes
 // (element width times count) is added.
 unsigned int putFirst(Msg* m, unsigned int off, unsigned int desc, const void* p);
