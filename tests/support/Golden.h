@@ -60,7 +60,8 @@ inline Bytes concat(std::initializer_list<Bytes> parts) {
 inline Bytes words(std::initializer_list<std::uint32_t> values) {
     Bytes out;
     for (std::uint32_t v : values) {
-        out = concat({out, u32(v)});
+        const Bytes w = u32(v);
+        out.insert(out.end(), w.begin(), w.end());
     }
     return out;
 }
