@@ -7,6 +7,7 @@
 #include "framework/Marshal.h"
 #include "framework/MsgDefault_t.h"
 #include "framework/MsgEvtDetected_t.h"
+#include "transport/TKSWholeLine.h"
 
 namespace tolk {
 
@@ -176,16 +177,16 @@ void EvtCallback::start(void*, callbackInfo* info) {
             }
         }
     } catch (const Exception& e) {
-        std::cerr << "EvtCallback_Class"
-                  << "(" << 138 << ") "
-                  << "TOLK Exception caught from callback handler thread" << std::endl
-                  << e << std::endl;
+        TKSWholeLine() << "EvtCallback_Class"
+                       << "(" << 138 << ") "
+                       << "TOLK Exception caught from callback handler thread" << std::endl
+                       << e << std::endl;
         delete info;
         throw;
     } catch (...) {
-        std::cerr << "EvtCallback_Class"
-                  << "(" << 147 << ") "
-                  << "general Exception caught from callback handler thread" << std::endl;
+        TKSWholeLine() << "EvtCallback_Class"
+                       << "(" << 147 << ") "
+                       << "general Exception caught from callback handler thread" << std::endl;
         delete info;
         throw;
     }
@@ -230,14 +231,14 @@ void EvtCallback::dispatch(Msg* msg, unsigned int type, unsigned int group, Call
             }
         }
     } catch (const Exception& e) {
-        std::cerr << "EvtCallback_Class"
-                  << "(" << 321 << ") "
-                  << "tolk internal error" << std::endl
-                  << e << std::endl;
+        TKSWholeLine() << "EvtCallback_Class"
+                       << "(" << 321 << ") "
+                       << "tolk internal error" << std::endl
+                       << e << std::endl;
     } catch (...) {
-        std::cerr << "EvtCallback_Class"
-                  << "(" << 330 << ") "
-                  << "tolk internal error" << std::endl;
+        TKSWholeLine() << "EvtCallback_Class"
+                       << "(" << 330 << ") "
+                       << "tolk internal error" << std::endl;
     }
     if (!handedOver) {
         delete msg;
@@ -393,15 +394,15 @@ void EvtCallback_unregisteredMsgHandler(Addressable* a, Msg* m) {
         m->setBodyDef(a->MsgBodyLookup(type));
     } catch (...) {
     }
-    std::cerr << "\n"
-              << "********************************************" << std::endl
-              << "Unregistered MsgType " << type << std::endl
-              << "For " << *a << std::endl
-              << *m << std::endl
-              << "You may specify your own handler for unregisted messages using" << std::endl
-              << "Addressable::asyncUnregisteredMsgType" << std::endl
-              << "********************************************" << std::endl
-              << std::endl;
+    TKSWholeLine() << "\n"
+                   << "********************************************" << std::endl
+                   << "Unregistered MsgType " << type << std::endl
+                   << "For " << *a << std::endl
+                   << *m << std::endl
+                   << "You may specify your own handler for unregisted messages using" << std::endl
+                   << "Addressable::asyncUnregisteredMsgType" << std::endl
+                   << "********************************************" << std::endl
+                   << std::endl;
     delete m;
 }
 
@@ -411,14 +412,14 @@ void EvtCallback_unregisteredEvtHandler(Addressable* a, Msg* m) {
         m->setBodyDef(a->EvtBodyLookup(group));
     } catch (...) {
     }
-    std::cerr << "********************************************" << std::endl
-              << "Unregistered EventGroup " << group << std::endl
-              << "For " << *a << std::endl
-              << *m << std::endl
-              << "You may specify your own handler for unregisted events using" << std::endl
-              << "Addressable::asyncUnregisteredEvtGroup" << std::endl
-              << "********************************************" << std::endl
-              << std::endl;
+    TKSWholeLine() << "********************************************" << std::endl
+                   << "Unregistered EventGroup " << group << std::endl
+                   << "For " << *a << std::endl
+                   << *m << std::endl
+                   << "You may specify your own handler for unregisted events using" << std::endl
+                   << "Addressable::asyncUnregisteredEvtGroup" << std::endl
+                   << "********************************************" << std::endl
+                   << std::endl;
     delete m;
 }
 

@@ -6,6 +6,7 @@
 #include "framework/AsyncMsgReceiver.h"
 #include "transport/TKSMsgQueue.h"
 #include "transport/TKSMsgRef.h"
+#include "transport/TKSWholeLine.h"
 
 namespace tolk {
 
@@ -132,27 +133,28 @@ int MsgQueue::MsgRouter(TKSMsgRef& ref) {
             receiver->receive(msg);
         }
     } catch (const Exception& e) {
-        std::cerr << "MsgQueue::MsgRouter: exception from the receiver for source " << source
-                  << ", message dropped" << std::endl
-                  << e << std::endl;
+        TKSWholeLine() << "MsgQueue::MsgRouter: exception from the receiver for source " << source
+                       << ", message dropped" << std::endl
+                       << e << std::endl;
     } catch (...) {
-        std::cerr << "MsgQueue::MsgRouter: unknown exception from the receiver for source "
-                  << source << ", message dropped" << std::endl;
+        TKSWholeLine() << "MsgQueue::MsgRouter: unknown exception from the receiver for source "
+                       << source << ", message dropped" << std::endl;
     }
     return 1;
 }
 
 void MsgQueue_unregisteredSourceHandler(MsgQueue& q, Msg* m) {
-    std::cerr << std::endl
-              << "********************************************" << std::endl
-              << "Unregistered Source sent to MsgQueue " << q << std::endl
-              << "MsgType " << m->getMsgType() << std::endl
-              << *m << std::endl
-              << "You may specify your own handler for messages from unregistered sources using"
-              << std::endl
-              << "MsgQueue::unregisteredSource" << std::endl
-              << "********************************************" << std::endl
-              << std::endl;
+    TKSWholeLine()
+        << std::endl
+        << "********************************************" << std::endl
+        << "Unregistered Source sent to MsgQueue " << q << std::endl
+        << "MsgType " << m->getMsgType() << std::endl
+        << *m << std::endl
+        << "You may specify your own handler for messages from unregistered sources using"
+        << std::endl
+        << "MsgQueue::unregisteredSource" << std::endl
+        << "********************************************" << std::endl
+        << std::endl;
     delete m;
 }
 

@@ -5,6 +5,7 @@
 
 #include "model/VX7EventPublication.h"
 #include "model/VX7EventPublisher.h"
+#include "transport/TKSWholeLine.h"
 
 namespace vx7diag {
 
@@ -79,7 +80,7 @@ class EventPublication : public VX7EventPublication {
         try {
             publisher->Notify(*self);
         } catch (...) {
-            std::cerr << "event observer failed; event dropped" << std::endl;
+            TKSWholeLine() << "event observer failed; event dropped" << std::endl;
         }
         self->Unlock();
     }

@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "transport/TKSMsgQueue.h"
+#include "transport/TKSWholeLine.h"
 
 namespace vx7diag {
 
@@ -78,10 +79,12 @@ class Restorer {
                 try {
                     task();
                 } catch (const std::exception& e) {
-                    std::cerr << "restoring a view after the relay came back failed: " << e.what()
-                              << std::endl;
+                    TKSWholeLine()
+                        << "restoring a view after the relay came back failed: " << e.what()
+                        << std::endl;
                 } catch (...) {
-                    std::cerr << "restoring a view after the relay came back failed" << std::endl;
+                    TKSWholeLine()
+                        << "restoring a view after the relay came back failed" << std::endl;
                 }
             }
         }

@@ -8,6 +8,8 @@
 #include <iostream>
 #include <thread>
 
+#include "transport/TKSWholeLine.h"
+
 TKSMutex::TKSMutex() = default;
 TKSMutex::~TKSMutex() = default;
 
@@ -88,8 +90,8 @@ int TKSThread::control::popCleanup(int execute) {
                 (static_cast<TKSRunnable*>(e->obj)->*(e->member))(e->arg);
             }
         } catch (...) {
-            std::cerr << "ERROR: in ~TKSThread::control::popCleanup, cleanup threw exception"
-                      << std::endl;
+            TKSWholeLine() << "ERROR: in ~TKSThread::control::popCleanup, cleanup threw exception"
+                           << std::endl;
             delete e;
             throw;
         }
@@ -212,7 +214,7 @@ void* TKSThread::frame(void* self) {
     } catch (...) {
         // Nothing stands above a thread body; ending the process for it would take every other
         // thread down too. The thread ends, and the failure is on record.
-        std::cerr << "ERROR: exception left a thread body; the thread has ended" << std::endl;
+        TKSWholeLine() << "ERROR: exception left a thread body; the thread has ended" << std::endl;
     }
     bool del = t->selfDelete.load() != 0;
     t->result = r;
@@ -244,7 +246,7 @@ void* abandonedFrame(void* p) {
             callMember(a.obj, a.member, nullptr, a.arg);
         }
     } catch (...) {
-        std::cerr << "ERROR: exception left a thread body; the thread has ended" << std::endl;
+        TKSWholeLine() << "ERROR: exception left a thread body; the thread has ended" << std::endl;
     }
     return nullptr;
 }
@@ -289,7 +291,7 @@ void tks_sleep(unsigned int seconds) {
 }
 
 void tksAssertFail(const char* expr, const char* file, int line) {
-    std::cerr << file << ":" << line << ": Assertion `" << expr << "' failed." << std::endl;
+    TKSWholeLine() << file << ":" << line << ": Assertion `" << expr << "' failed." << std::endl;
     std::abort();
 }
 

@@ -12,6 +12,7 @@
 #include "catalogue/generated/values.h"
 #include "transport/TKSLocalMsgQueue.h"
 #include "transport/TKSRemoteMsgQueue.h"
+#include "transport/TKSWholeLine.h"
 
 namespace {
 
@@ -40,8 +41,8 @@ class RelayMonitor {
         since = std::chrono::steady_clock::now();
         const std::string line = "relay connection to " + relay + " lost at " + timeOfDay() + " (" +
                                  why + "); requests fail at once until it is back";
-        std::cout << line << std::endl;
-        std::cerr << line << std::endl;
+        TKSWholeLine(std::cout) << line << std::endl;
+        TKSWholeLine() << line << std::endl;
         tell(true, relay);
     }
     // `restored` false: the queue went away while cut off, so it no longer waits for the relay.
@@ -57,8 +58,8 @@ class RelayMonitor {
             std::snprintf(took, sizeof took, "%.1f", seconds);
             const std::string line = "relay connection to " + relay + " back at " + timeOfDay() +
                                      ", after " + took + " s";
-            std::cout << line << std::endl;
-            std::cerr << line << std::endl;
+            TKSWholeLine(std::cout) << line << std::endl;
+            TKSWholeLine() << line << std::endl;
         }
         tell(false, relay);
     }
@@ -85,7 +86,7 @@ class RelayMonitor {
             try {
                 listener(cut, relay);
             } catch (...) {
-                std::cerr << "ERROR: TKSMsgQueue: a relay state listener failed" << std::endl;
+                TKSWholeLine() << "ERROR: TKSMsgQueue: a relay state listener failed" << std::endl;
             }
         }
     }
@@ -190,8 +191,8 @@ TKSMsgRef TKSMsgQueue::request(TKSMsgRef& msg, unsigned int timeoutMs, unsigned 
     // Nothing can arrive while the connection is down: the request fails at once, as a request
     // without an answer would, rather than making its caller wait for a relay known to be gone.
     auto notSent = [&](const char* why) {
-        std::cerr << "TKSMsgQueue: request of type 0x" << std::hex << type << std::dec
-                  << " not sent: " << why << std::endl;
+        TKSWholeLine() << "TKSMsgQueue: request of type 0x" << std::hex << type << std::dec
+                       << " not sent: " << why << std::endl;
         tkMsgFree(block);
         return timeoutMs == 0 ? TKSMsgRef(0u) : TKSMsgRef();
     };
@@ -244,8 +245,8 @@ TKSMsgRef TKSMsgQueue::request(TKSMsgRef& msg, unsigned int timeoutMs, unsigned 
     waiting = false;
     if (waitLost) {
         waitLost = false;
-        std::cerr << "TKSMsgQueue: request of type 0x" << std::hex << type << std::dec
-                  << " ended without its answer: " << down << std::endl;
+        TKSWholeLine() << "TKSMsgQueue: request of type 0x" << std::hex << type << std::dec
+                       << " ended without its answer: " << down << std::endl;
     }
     // A reply stored at the very moment of the time-out is taken, not left behind.
     TKMsg32Bit* reply = replySlot;
@@ -362,15 +363,17 @@ void TKSMsgQueue::deliverAsync(TKMsg32Bit* block) {
         }
         return;
     } catch (const std::exception& e) {
-        std::cerr << "ERROR: TKSMsgQueue: message callback failed on message type 0x" << std::hex
-                  << type << std::dec << ": " << e.what() << "; the queue goes on" << std::endl;
+        TKSWholeLine() << "ERROR: TKSMsgQueue: message callback failed on message type 0x"
+                       << std::hex << type << std::dec << ": " << e.what() << "; the queue goes on"
+                       << std::endl;
     } catch (const TKSException&) {
-        std::cerr << "ERROR: TKSMsgQueue: message callback failed on message type 0x" << std::hex
-                  << type << std::dec << " with a transport exception; the queue goes on"
-                  << std::endl;
+        TKSWholeLine() << "ERROR: TKSMsgQueue: message callback failed on message type 0x"
+                       << std::hex << type << std::dec
+                       << " with a transport exception; the queue goes on" << std::endl;
     } catch (...) {
-        std::cerr << "ERROR: TKSMsgQueue: message callback failed on message type 0x" << std::hex
-                  << type << std::dec << " with an exception; the queue goes on" << std::endl;
+        TKSWholeLine() << "ERROR: TKSMsgQueue: message callback failed on message type 0x"
+                       << std::hex << type << std::dec << " with an exception; the queue goes on"
+                       << std::endl;
     }
     std::lock_guard<std::mutex> lk(waitLock);
     ++failures;
@@ -412,12 +415,15 @@ void* TKSMsgQueue::readNroute(void*, void*) {
             status = transport->msgRead(&block);
         } catch (const TKSRemoteService_ComFailure& f) {
             // The name is the relay as the user gave it, with its port when one was given.
-            std::cerr << "ERROR: TKSMsgQueue: lost the relay connection to " << f.getHostName();
-            if (std::strchr(f.getHostName(), ':') == nullptr) {
-                std::cerr << " port " << f.getPort();
+            {
+                TKSWholeLine report;
+                report << "ERROR: TKSMsgQueue: lost the relay connection to " << f.getHostName();
+                if (std::strchr(f.getHostName(), ':') == nullptr) {
+                    report << " port " << f.getPort();
+                }
+                report << "; this queue receives nothing more and its requests will time out"
+                       << std::endl;
             }
-            std::cerr << "; this queue receives nothing more and its requests will time out"
-                      << std::endl;
             {
                 std::lock_guard<std::mutex> lk(waitLock);
                 failed = true;
@@ -427,9 +433,9 @@ void* TKSMsgQueue::readNroute(void*, void*) {
         } catch (...) {
             // No other failure is expected from a transport; if one comes the reader must still
             // be there for the shutdown, or the destructor would wait for it for ever.
-            std::cerr << "ERROR: TKSMsgQueue: the transport failed while reading; this queue "
-                         "receives nothing more and its requests will time out"
-                      << std::endl;
+            TKSWholeLine() << "ERROR: TKSMsgQueue: the transport failed while reading; this queue "
+                              "receives nothing more and its requests will time out"
+                           << std::endl;
             {
                 std::lock_guard<std::mutex> lk(waitLock);
                 failed = true;

@@ -12,6 +12,7 @@
 
 #include "transport/TKSFrame.h"
 #include "transport/TKSSock.h"
+#include "transport/TKSWholeLine.h"
 
 namespace {
 
@@ -304,7 +305,8 @@ int TKSRemoteMsgQueue::msgRead(TKMsg32Bit** out) {
         if (closeSent.load()) {
             return closedByRelay();
         }
-        std::cerr << "Error communicating with remote message queue on " << hostName << std::endl;
+        TKSWholeLine() << "Error communicating with remote message queue on " << hostName
+                       << std::endl;
         // A broken connection fails every read at once: no use counting those. A frame that
         // was refused leaves the stream in step; only a run of them gives the connection up.
         if (socket->isFailed()) {
@@ -316,15 +318,15 @@ int TKSRemoteMsgQueue::msgRead(TKMsg32Bit** out) {
         return TKS_NOT_MOVED;
     }
     if (m.type != TKS_FRAME_MESSAGE) {
-        std::cerr << "Discarding a frame of unknown type " << m.type << " from " << hostName
-                  << std::endl;
+        TKSWholeLine() << "Discarding a frame of unknown type " << m.type << " from " << hostName
+                       << std::endl;
         free_msg(m);
         return TKS_NOT_MOVED;
     }
     TKMsg32Bit* block = tksBlockFromFrame(m);
     free_msg(m);
     if (block == nullptr) {
-        std::cerr << "Discarding a malformed message frame from " << hostName << std::endl;
+        TKSWholeLine() << "Discarding a malformed message frame from " << hostName << std::endl;
         return TKS_NOT_MOVED;
     }
     retries = 10;

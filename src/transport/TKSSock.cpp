@@ -16,6 +16,8 @@
 #include <string>
 #include <vector>
 
+#include "transport/TKSWholeLine.h"
+
 class SockByteSource : public TKSByteSource {
   public:
     explicit SockByteSource(sock& s) : s(s) {}
@@ -229,7 +231,8 @@ int sock::close() {
     l.l_onoff = 1;
     l.l_linger = 0;
     if (setsockopt(fd, SOL_SOCKET, SO_LINGER, &l, sizeof l) != 0) {
-        std::cerr << "Unable to flush socket data, socket may remain open on " << fd << std::endl;
+        TKSWholeLine() << "Unable to flush socket data, socket may remain open on " << fd
+                       << std::endl;
     }
     int r = ::close(fd);
     fd = -1;
@@ -433,7 +436,7 @@ int sock::get_msg(msg_t& m) {
         case TKS_READ_OK:
             return SOCK_OK;
         case TKS_READ_NO_MEMORY:
-            std::cerr << "Unable to allocate memory in get_msg" << std::endl;
+            TKSWholeLine() << "Unable to allocate memory in get_msg" << std::endl;
             return SOCK_FAILED;
         default:
             return SOCK_FAILED;

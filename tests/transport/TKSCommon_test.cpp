@@ -1,7 +1,10 @@
+#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include <atomic>
 #include <chrono>
+#include <iostream>
+#include <sstream>
 #include <stdexcept>
 #include <string>
 #include <thread>
@@ -9,6 +12,7 @@
 
 #include "transport/IsaSync.h"
 #include "transport/TKSCommon.h"
+#include "transport/TKSWholeLine.h"
 
 namespace {
 
@@ -203,6 +207,30 @@ TEST(TKSThread, ExceptionFromABodyEndsOnlyThatThread) {
     std::string err = testing::internal::GetCapturedStderr();
     EXPECT_NE(std::string::npos, err.find("exception left a thread body"));
     EXPECT_EQ(TKSThread::NOT_RUNNING, t.getStatus());
+}
+
+TEST(TKSWholeLine, ReportsOfThreadsWritingAtOnceArriveWholeAndKeepTheirManipulators) {
+    testing::internal::CaptureStderr();
+    auto report = [](char who) {
+        for (int i = 0; i < 400; ++i) {
+            TKSWholeLine() << "report " << who << " of type 0x" << std::hex << 0x1214 << std::dec
+                           << " number " << i << std::endl;
+        }
+    };
+    std::thread a(report, 'a');
+    std::thread b(report, 'b');
+    a.join();
+    b.join();
+    std::cerr << 255 << std::endl;
+    std::istringstream err(testing::internal::GetCapturedStderr());
+    int whole = 0;
+    std::string line;
+    while (std::getline(err, line) && line != "255") {
+        ASSERT_THAT(line, testing::MatchesRegex("report [ab] of type 0x1214 number [0-9]+"));
+        ++whole;
+    }
+    EXPECT_EQ(800, whole);
+    EXPECT_EQ("255", line) << "std::hex of a report reached std::cerr";
 }
 
 TEST(TKSThread, DestructorStopsARunningThread) {
