@@ -189,15 +189,6 @@ TEST(EventPublications, SubscribedEventTypes) {
     EXPECT_TRUE(Types(TrunkState()).empty());
 }
 
-TEST(EventPublications, ComponentMakesTheObjectTheCallbackTarget) {
-    TrunkState first;
-    TrunkState second;
-    second.Component();
-    EXPECT_EQ(TrunkState::g_this.load(), &second);
-    first.Component();
-    EXPECT_EQ(TrunkState::g_this.load(), &first);
-}
-
 // Events with what their texts show filled in.
 tolk::LCON::Evt_0x1611_t* LineEvent(unsigned int type, unsigned int reason) {
     auto* e = new tolk::LCON::Evt_0x1611_t();
