@@ -82,22 +82,6 @@ class SubjectTest : public ::testing::Test {
     Subject subject;
 };
 
-// Copies of one RefPtr are one observer: it is added and told once; each observer hears only
-// of its own aspect, in the order of the notifications; the set keeps an observer alive.
-TEST_F(SubjectTest, EachObserverIsToldOnceOfItsOwnAspect) {
-    isa::RefPtr<Observer> copy = first;
-    EXPECT_TRUE(subject.Attach(first, &callAspect));
-    EXPECT_FALSE(subject.Attach(first, &callAspect));
-    EXPECT_FALSE(subject.Attach(copy, &callAspect));
-    {
-        isa::RefPtr<Observer> only(new Recorder("only", &log));
-        subject.Attach(only, &chanAspect);
-    }
-    subject.Notify(chanAspect);
-    subject.Notify(callAspect);
-    EXPECT_THAT(log, ElementsAre("only:chan", "first:call"));
-}
-
 // Detach answers how many observers the aspect keeps, -1 when it has none to detach from.
 TEST_F(SubjectTest, DetachCountsWhatIsLeftOfTheAspect) {
     EXPECT_EQ(subject.Detach(first, callAspect), -1);
