@@ -758,15 +758,6 @@ TEST(ClusterAnswers, AreReadIntoTheCallersArgumentsAndPortOperationsWantTheirTar
     EXPECT_THROW(c.Deactivate(1), Addressable::Timeout);
 }
 
-TEST(ResourceMgrAnswers, ARefusedFreeRaisesInsideTheErrorWait) {
-    FakeBoard refusing(refuseEverything);
-    auto queue = newQueue();
-    Quick<Addressable> owner(kTarget, queue);
-    ResourceMgr mgr(&owner);
-    StdResource res(kOther, queue);
-    EXPECT_THROW(mgr.free(&res), Addressable::UnexpectedMsg);
-}
-
 // ---- which class reads which number ----
 
 template <class T>

@@ -82,22 +82,6 @@ class SubjectTest : public ::testing::Test {
     Subject subject;
 };
 
-// Copies of one RefPtr are one observer: it is added and told once; each observer hears only
-// of its own aspect, in the order of the notifications; the set keeps an observer alive.
-TEST_F(SubjectTest, EachObserverIsToldOnceOfItsOwnAspect) {
-    isa::RefPtr<Observer> copy = first;
-    EXPECT_TRUE(subject.Attach(first, &callAspect));
-    EXPECT_FALSE(subject.Attach(first, &callAspect));
-    EXPECT_FALSE(subject.Attach(copy, &callAspect));
-    {
-        isa::RefPtr<Observer> only(new Recorder("only", &log));
-        subject.Attach(only, &chanAspect);
-    }
-    subject.Notify(chanAspect);
-    subject.Notify(callAspect);
-    EXPECT_THAT(log, ElementsAre("only:chan", "first:call"));
-}
-
 // Detach answers how many observers the aspect keeps, -1 when it has none to detach from.
 TEST_F(SubjectTest, DetachCountsWhatIsLeftOfTheAspect) {
     EXPECT_EQ(subject.Detach(first, callAspect), -1);
@@ -187,15 +171,6 @@ TEST(EventPublications, SubscribedEventTypes) {
     EXPECT_EQ(Types(TSCCallInfo()), Range(0x1200, 0x121A));
     EXPECT_EQ(Types(TSCCallState()), Range(0x1230, 0x1241));
     EXPECT_TRUE(Types(TrunkState()).empty());
-}
-
-TEST(EventPublications, ComponentMakesTheObjectTheCallbackTarget) {
-    TrunkState first;
-    TrunkState second;
-    second.Component();
-    EXPECT_EQ(TrunkState::g_this.load(), &second);
-    first.Component();
-    EXPECT_EQ(TrunkState::g_this.load(), &first);
 }
 
 // Events with what their texts show filled in.

@@ -799,18 +799,6 @@ TEST_F(RelayTest, OutOfDescriptorsAWaitingConnectionIsRefusedAndTheOthersServed)
     EXPECT_TRUE(later.opened());
 }
 
-TEST_F(RelayTest, CloseIsAcknowledged) {
-    RawClient c(port);
-    ASSERT_TRUE(c.opened());
-    msg_t m;
-    m.type = TKS_FRAME_CLOSE;
-    c.send(tksEncodeFrame(m));
-    EXPECT_EQ(c.nextType(), TKS_FRAME_CLOSE_ACK);
-    ::close(c.fd);
-    c.fd = -1;
-    EXPECT_TRUE(waitConnections(0));
-}
-
 TEST_F(RelayTest, IdleConnectionsDoNotLockOutAClientThatOpens) {
     RelayOptions o = defaults();
     o.maxConnections = 8;

@@ -63,19 +63,6 @@ class ModelTest : public testing::Test {
     }
 };
 
-TEST_F(ModelTest, CallOutsideTheFarmDialsProceedsAlertsConnects) {
-    std::uint32_t id = dial(1, "9999");
-    EXPECT_NE(id, 0u);
-    std::vector<Seen> want = {{1, call::Dialing, 0},
-                              {1, call::Proceeding, 0},
-                              {1, call::Alerting, 0},
-                              {1, call::Connected, 0}};
-    EXPECT_EQ(callStates(ev), want);
-    for (const Event& e : ev) {
-        EXPECT_EQ(e.a, id);
-    }
-}
-
 TEST_F(ModelTest, CallToAFarmNumberRingsThatChannelAndAnswerConnectsBoth) {
     std::uint32_t id = dial(1, "1003");
     std::vector<Seen> want = {{1, call::Dialing, 0},
