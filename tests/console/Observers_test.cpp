@@ -33,6 +33,7 @@ TEST(ObserverTexts, PaddedToTheirFieldUpToTheEndOfTheirTableAndPastIt) {
         {ConsoleCallStateText, 0, "Null                 "},
         {ConsoleCallStateText, 21, "DialTone             "},
         {ConsoleCallStateText, 22, "?22                  "},
+        {ConsoleCallStateText, 1000, "?1000                "},
         {ConsoleChanStateText, 0, "                          "},
         {ConsoleChanStateText, 1, "Active\t\t           "},
         {ConsoleChanStateText, 14, "OutOfServiceRemote        "},
@@ -153,14 +154,6 @@ TEST_F(PhoneObserverTest, ChanStateDrawsOnlyItsFieldAndZeroesBlankTheirFields) {
     EXPECT_EQ(view.At(PHONE_ROW, 70, 26), std::string(26, ' '));
     EXPECT_EQ(view.At(PHONE_ROW, 19, 26), std::string(26, ' '));
     EXPECT_EQ(view.At(PHONE_ROW, 47, 21), "Idle                 ");
-}
-
-TEST_F(PhoneObserverTest, ValuesPastTheTablesDrawWithoutReadingPastThem) {
-    CallState(7, 1000, 52);
-    ChanState(15);
-    EXPECT_EQ(view.At(PHONE_ROW, 47, 5), "?1000");
-    EXPECT_EQ(view.At(PHONE_ROW, 70, 3), "?52");
-    EXPECT_EQ(view.At(PHONE_ROW, 19, 3), "?15");
 }
 
 TEST_F(PhoneObserverTest, CurrentStateDrawsInItsOrderWithoutRefreshOrCallId) {
