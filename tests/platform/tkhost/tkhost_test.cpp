@@ -131,6 +131,18 @@ TEST(TkVarField, WritePastTheEndIsRefusedWhole) {
     EXPECT_TRUE(BytesAt(b.body(), {0, 0, 0xBB, 0xBB, 0xBB, 0xBB}));
 }
 
+// An open queue bound to the host address the switch gives it, whatever address was asked for;
+// closed with the object.
+struct BoundQueue {
+    TKQueueHandle q = tkQueueOpen();
+    TKCompDesc addr = compDesc(1, 2, 3, 4, 5);
+    BoundQueue() {
+        EXPECT_NE(TK_ERR_NO_DESCRIPTORS, q);
+        EXPECT_EQ(TK_OK, tkQueueBind(q, &addr));
+    }
+    ~BoundQueue() { tkQueueClose(q); }
+};
+
 class TkSwitch : public ::testing::Test {
   protected:
     void SetUp() override {
@@ -141,18 +153,6 @@ class TkSwitch : public ::testing::Test {
     void TearDown() override {
         tkSwitchDetachBoards();
         tkSwitchSetQueueLimit(0);
-        for (auto [q, d] : opened) {
-            tkQueueUnbind(q, d);
-            tkQueueClose(q);
-        }
-    }
-    TKCompDesc openBound(TKQueueHandle& q) {
-        q = tkQueueOpen();
-        EXPECT_NE(TK_ERR_NO_DESCRIPTORS, q);
-        TKCompDesc d = compDesc(1, 2, 3, 4, 5);
-        EXPECT_EQ(TK_OK, tkQueueBind(q, &d));
-        opened.emplace_back(q, d);
-        return d;
     }
     static TKMsg32Bit* blockTo(TKCompDesc tgt, unsigned int type) {
         TKMsg32Bit* m = nullptr;
@@ -161,7 +161,6 @@ class TkSwitch : public ::testing::Test {
         m->type = type;
         return m;
     }
-    std::vector<std::pair<TKQueueHandle, TKCompDesc>> opened;
 };
 
 struct Captured {
@@ -173,10 +172,10 @@ void capture(void* ctx, TKMsg32Bit* m) {
 }
 
 TEST_F(TkSwitch, BindGivesDistinctHostAddresses) {
-    TKQueueHandle a, b;
-    TKCompDesc da = openBound(a);
-    TKCompDesc db = openBound(b);
-    EXPECT_NE(a, b);
+    BoundQueue a, b;
+    const TKCompDesc da = a.addr;
+    const TKCompDesc db = b.addr;
+    EXPECT_NE(a.q, b.q);
     EXPECT_NE(0, da.instance);
     EXPECT_NE(da.instance, db.instance);
     EXPECT_EQ(0xFF, da.board);
@@ -185,12 +184,13 @@ TEST_F(TkSwitch, BindGivesDistinctHostAddresses) {
     EXPECT_TRUE(tkSwitchIsBound(da));
     EXPECT_FALSE(tkSwitchIsHostAddress(compDesc(5, 1, 1, 0, 0)));
     TKCompDesc again = da;
-    EXPECT_EQ(TK_ERR_ALREADY_BOUND, tkQueueBind(a, &again));
+    EXPECT_EQ(TK_ERR_ALREADY_BOUND, tkQueueBind(a.q, &again));
 }
 
 TEST_F(TkSwitch, TargetMustMatchAllFiveFields) {
-    TKQueueHandle a;
-    TKCompDesc da = openBound(a);
+    BoundQueue bound;
+    const TKQueueHandle a = bound.q;
+    const TKCompDesc da = bound.addr;
     // Boards attached and detached again take none of the near misses.
     Captured cap;
     tkSwitchAttachBoards(capture, &cap);
@@ -233,13 +233,6 @@ TEST_F(TkSwitch, CloseFreesPendingBlocksAndUnbinds) {
 }
 
 // Blocking reads, woken from other threads.
-
-struct BoundQueue {
-    TKQueueHandle q = tkQueueOpen();
-    TKCompDesc addr{};
-    BoundQueue() { EXPECT_EQ(TK_OK, tkQueueBind(q, &addr)); }
-    ~BoundQueue() { tkQueueClose(q); }
-};
 
 TEST(TkSwitchBlocking, CloseOrUnbindWakesABlockedReader) {
     for (bool close : {true, false}) {
