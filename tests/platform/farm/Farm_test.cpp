@@ -358,7 +358,7 @@ TEST(FarmParser, RejectsWithOneLineNamingThePlace) {
     }
 }
 
-TEST(FarmParser, ReadsEveryFieldOfABoard) {
+TEST(FarmParser, ReadsEveryFieldOfABoardAndAcceptsTheLimits) {
     std::string error;
     auto f = parseFarm(kHead +
                            "routing = \"flexible\"\n"
@@ -388,17 +388,15 @@ TEST(FarmParser, ReadsEveryFieldOfABoard) {
     EXPECT_EQ(f->channelForNumber("0123"), (ChannelRef{1, 1, 24}));
     EXPECT_FALSE(f->channelForNumber("0124"));
     EXPECT_EQ(f->numbers.size(), 24u);
-}
 
-TEST(FarmParser, AcceptsNoBoardsSixtyFourTrunksAndGivesAFlexibleBoardAllSevenMedia) {
-    std::string error;
+    // No boards, 64 trunks, and a flexible board that names no media gets all seven.
     auto none = parseFarm("system_name = \"empty\"\n", "t.toml", error);
     ASSERT_TRUE(none) << error;
     EXPECT_TRUE(none->boards.empty());
-    auto f = parseFarm(kHead + trunks(64, kCasTrunk), "t.toml", error);
-    ASSERT_TRUE(f) << error;
-    EXPECT_EQ(f->boards[0].trunks.size(), 64u);
-    EXPECT_EQ(f->boards[0].trunks.back().number, 64);
+    auto most = parseFarm(kHead + trunks(64, kCasTrunk), "t.toml", error);
+    ASSERT_TRUE(most) << error;
+    EXPECT_EQ(most->boards[0].trunks.size(), 64u);
+    EXPECT_EQ(most->boards[0].trunks.back().number, 64);
     auto flexible = parseFarm(kHead + "routing = \"flexible\"\n", "t.toml", error);
     ASSERT_TRUE(flexible) << error;
     EXPECT_EQ(flexible->boards[0].media.size(), 7u);
