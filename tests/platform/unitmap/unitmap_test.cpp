@@ -64,10 +64,11 @@ class DeviceMap : public ::testing::Test {
         return std::vector<UM_AUID>(found, found + count);
     }
 
-    static std::vector<UM_AUID> findType(UM_AUID parent, unsigned type, uint32_t room) {
+    static std::vector<UM_AUID> findType(UM_AUID parent, unsigned type, uint32_t room,
+                                         uint32_t size = 4) {
         unsigned value = type;
         um_attribute search;
-        um_initAttributeStruct(&search, "TYPE", &value, 4, 0, 0);
+        um_initAttributeStruct(&search, "TYPE", &value, size, 0, 0);
         std::vector<UM_AUID> found(room);
         uint32_t count = room;
         EXPECT_EQ(um_findAUs(parent, 1, &search, &count, found.data()), UM_SUCCESS);
@@ -135,58 +136,31 @@ const char* const kVoiceAttributes[] = {"SIGDETADDR",    "CLUSTERADDR", "SIGBUFA
                                         "SIGBUFADDR_MF", "TONEGENADDR", "CALLANALYSISADDR",
                                         "R2MFPADDR",     "CALLERIDADDR"};
 
-struct VoiceAu {
-    int status = -1;
-    uint32_t statuses[8] = {};
-    Bytes values[8] = {};
-};
-
-// The board manager's voice walk: groups of TYPE 501, up to 4 voice AUs of TYPE 502 in each,
-// the eight address attributes of each voice AU.
-std::vector<VoiceAu> voiceWalk(UM_AUID board) {
-    std::vector<VoiceAu> out;
-    unsigned groupType = 501, voiceType = 502;
-    um_attribute search;
-    um_initAttributeStruct(&search, "TYPE", &groupType, 5, 0, 0);
-    UM_AUID groups[256];
-    uint32_t groupCount = 256;
-    EXPECT_EQ(um_findAUs(board, 1, &search, &groupCount, groups), UM_SUCCESS);
-    uint32_t room = 4;
-    for (uint32_t g = 0; g < groupCount; ++g) {
-        um_initAttributeStruct(&search, "TYPE", &voiceType, 5, 0, 0);
-        UM_AUID voices[4];
-        EXPECT_EQ(um_findAUs(groups[g], 1, &search, &room, voices), UM_SUCCESS);
-        for (uint32_t v = 0; v < room; ++v) {
-            VoiceAu au;
-            um_attribute attrs[8];
-            for (int i = 0; i < 8; ++i) {
-                au.values[i].fill(0xAA);
-                um_initAttributeStruct(&attrs[i], kVoiceAttributes[i], au.values[i].data(), 8, 0,
-                                       0);
-            }
-            au.status = um_getAttributes(voices[v], 8, attrs);
-            for (int i = 0; i < 8; ++i) {
-                au.statuses[i] = attrs[i].status;
-            }
-            out.push_back(au);
-        }
-    }
-    return out;
-}
-
 TEST_F(DeviceMap, BoardWithAllMediaAnswersWhole) {
     const std::string path = ::testing::TempDir() + "allmedia_farm.toml";
     std::ofstream(path) << "system_name = \"m\"\n[[board]]\nlogical_id = 9\nname = \"n\"\n"
                            "serial = \"s\"\nrouting = \"flexible\"\n[[board.trunk]]\n"
                            "channels = 2\ntype = 1\nsignaling = \"CAS\"\n";
     use(path);
-    auto voices = voiceWalk(findBoard(9).at(0));
-    ASSERT_EQ(voices.size(), 2u);
-    EXPECT_EQ(voices[1].status, UM_SUCCESS);
-    for (uint32_t status : voices[1].statuses) {
-        EXPECT_EQ(status, 0u);
+    // The board manager's voice walk: groups of TYPE 501, up to 4 voice AUs of TYPE 502 in each,
+    // searched for with a TYPE of 5 bytes, and the eight address attributes of a voice AU.
+    std::vector<UM_AUID> voices;
+    for (UM_AUID group : findType(findBoard(9).at(0), 501, 256, 5)) {
+        const std::vector<UM_AUID> found = findType(group, 502, 4, 5);
+        voices.insert(voices.end(), found.begin(), found.end());
     }
-    EXPECT_EQ(voices[1].values[6], addr(2, 9, 66));
+    ASSERT_EQ(voices.size(), 2u);
+    Bytes values[8];
+    um_attribute attrs[8];
+    for (int i = 0; i < 8; ++i) {
+        values[i].fill(0xAA);
+        um_initAttributeStruct(&attrs[i], kVoiceAttributes[i], values[i].data(), 8, 0, 0);
+    }
+    EXPECT_EQ(um_getAttributes(voices[1], 8, attrs), UM_SUCCESS);
+    for (const um_attribute& a : attrs) {
+        EXPECT_EQ(a.status, 0u);
+    }
+    EXPECT_EQ(values[6], addr(2, 9, 66));
 }
 
 TEST_F(DeviceMap, PartialAnswerMarksEachAttributeAndAllFailingGivesTheFirstFailure) {
