@@ -42,14 +42,6 @@ TerminalOptions BuiltinFarm(const std::string& farm = "") {
     return options;
 }
 
-TerminalOptions ThroughRelay(const SimServer& sim) {
-    TerminalOptions options;
-    options.env.emplace_back("REMOTE_TKHOST", sim.Address());
-    // The device map reads the farm in lineprobe's own process.
-    options.env.emplace_back("VX7_FARM", FARM);
-    return options;
-}
-
 struct Expect {
     const char* line;
     const char* result;
@@ -219,9 +211,12 @@ class RelayTest : protected Relay, public ViewsTest {
         : Relay(simArgs), ViewsTest(WithPager(sim)) {}
 
     static TerminalOptions WithPager(const SimServer& sim) {
-        TerminalOptions options = ThroughRelay(sim);
-        options.env.emplace_back("CORVO_ORVANE_DIR", "inst/");
-        options.env.emplace_back("LESSHISTFILE", "-");
+        TerminalOptions options;
+        // The device map reads the farm in lineprobe's own process.
+        options.env = {{"REMOTE_TKHOST", sim.Address()},
+                       {"VX7_FARM", FARM},
+                       {"CORVO_ORVANE_DIR", "inst/"},
+                       {"LESSHISTFILE", "-"}};
         options.File("inst/bin/lineprobe_help.txt", "HELP PAGE\n");
         return options;
     }
