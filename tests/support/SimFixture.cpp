@@ -10,16 +10,12 @@
 #error "LINEPROBE_FARMS_DIR must name the farms folder"
 #endif
 
-std::string SimFixture::FarmPath(const std::string& farmFile) {
-    return std::string(LINEPROBE_FARMS_DIR) + "/" + farmFile;
-}
-
 void SimFixture::UseFarm(const std::string& farmFile) {
     sim::stopBuiltinEmulation();
     if (farmFile.empty()) {
         unsetenv(farm::kFarmEnvironment);
     } else {
-        setenv(farm::kFarmEnvironment, FarmPath(farmFile).c_str(), 1);
+        setenv(farm::kFarmEnvironment, (LINEPROBE_FARMS_DIR "/" + farmFile).c_str(), 1);
     }
     farm::resetActiveFarm();
     std::string error;

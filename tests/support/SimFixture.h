@@ -11,7 +11,6 @@ class SimFixture : public ::testing::Test {
   public:
     // Empty for the built-in default farm, else a file under farms/.
     static void UseFarm(const std::string& farmFile);
-    static std::string FarmPath(const std::string& farmFile);
 
   protected:
     void TearDown() override;
