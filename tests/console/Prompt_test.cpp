@@ -315,10 +315,7 @@ TEST(HelpCmd, PagerCommandJoinsDirectoryBinAndFileWithinTwoHundredFiftyFiveChara
     // "less " (5) + directory + "bin/" (4) + "lineprobe_help.txt" (18) = 27 + directory.
     const std::string fits = "/" + std::string(226, 'd') + "/";     // 228: line of 255
     const std::string tooLong = "/" + std::string(227, 'd') + "/";  // 229: line of 256
-    const std::optional<std::string> longest =
-        HelpCmd::BuildPagerCommand(fits, "lineprobe_help.txt");
-    ASSERT_TRUE(longest.has_value());
-    EXPECT_EQ(longest->size(), 255u);
+    EXPECT_EQ(HelpCmd::BuildPagerCommand(fits, "lineprobe_help.txt").value_or("").size(), 255u);
     EXPECT_FALSE(HelpCmd::BuildPagerCommand(tooLong, "lineprobe_help.txt").has_value());
     EXPECT_FALSE(HelpCmd::BuildPagerCommand(std::string(5000, 'x'), "lineprobe_help.txt"));
 }
@@ -349,6 +346,7 @@ TEST(ProcessCmdLineArgs, PrintsAndStops) {
         {{"-v", "-h", "-v"}, count, 0},
     };
     for (const OptionCase& c : cases) {
+        SCOPED_TRACE(c.args[0] + " (" + std::to_string(c.args.size()) + " arguments)");
         std::vector<std::string> args = c.args;
         std::vector<char*> argv;
         for (std::string& arg : args) {
@@ -359,8 +357,8 @@ TEST(ProcessCmdLineArgs, PrintsAndStops) {
 
         const int stoppedAt = ProcessCmdLineArgs(static_cast<int>(args.size()), argv.data());
 
-        EXPECT_EQ(out.Text(), c.output) << c.args[0] << " (" << c.args.size() << " arguments)";
-        EXPECT_EQ(stoppedAt, c.stoppedAt) << c.args[0] << " (" << c.args.size() << " arguments)";
+        EXPECT_EQ(out.Text(), c.output);
+        EXPECT_EQ(stoppedAt, c.stoppedAt);
     }
 }
 
