@@ -186,30 +186,25 @@ TEST_F(DeviceMap, PartialAnswerMarksEachAttributeAndAllFailingGivesTheFirstFailu
 }
 
 TEST_F(DeviceMap, ValuesNeedTheirRoom) {
-    UM_AUID board = findBoard(1).at(0);
-    // "VX7/T1-2" needs 9 bytes with its terminator; 8 are refused and left as they were.
-    char name[10];
-    std::memset(name, '#', sizeof name);
+    const UM_AUID board = findBoard(1).at(0);
+    const UM_AUID line = findType(board, 503, 1).at(0);
+    // One byte short of each value's room ("VX7/T1-2" needs 9 with its terminator): refused,
+    // and the buffer left as it was.
+    const std::tuple<UM_AUID, const char*, uint32_t> tooSmall[] = {
+        {board, "NAME", 8}, {board, "NUM_TRUNKS", 3}, {line, "LINEADMINADDR", 7}};
+    char buf[10];
     um_attribute a;
-    um_initAttributeStruct(&a, "NAME", name, 8, 0, 0);
-    EXPECT_EQ(um_getAttributes(board, 1, &a), UM_ERR_BUFFER_TOO_SMALL);
-    EXPECT_EQ(a.status, static_cast<uint32_t>(UM_ERR_BUFFER_TOO_SMALL));
-    EXPECT_EQ(std::string(name, 10), std::string(10, '#'));
-    um_initAttributeStruct(&a, "NAME", name, 9, 0, 0);
+    for (auto [au, name, size] : tooSmall) {
+        SCOPED_TRACE(name);
+        std::memset(buf, '#', sizeof buf);
+        um_initAttributeStruct(&a, name, buf, size, 0, 0);
+        EXPECT_EQ(um_getAttributes(au, 1, &a), UM_ERR_BUFFER_TOO_SMALL);
+        EXPECT_EQ(a.status, static_cast<uint32_t>(UM_ERR_BUFFER_TOO_SMALL));
+        EXPECT_EQ(std::string(buf, 10), std::string(10, '#'));
+    }
+    um_initAttributeStruct(&a, "NAME", buf, 9, 0, 0);
     EXPECT_EQ(um_getAttributes(board, 1, &a), UM_SUCCESS);
-    EXPECT_EQ(std::string(name, 10), std::string("VX7/T1-2\0#", 10));
-
-    unsigned char three[4] = {1, 2, 3, 4};
-    um_initAttributeStruct(&a, "NUM_TRUNKS", three, 3, 0, 0);
-    EXPECT_EQ(um_getAttributes(board, 1, &a), UM_ERR_BUFFER_TOO_SMALL);
-    EXPECT_EQ(three[3], 4);
-
-    UM_AUID line = findType(board, 503, 1).at(0);
-    unsigned char seven[9];
-    std::memset(seven, 0x77, sizeof seven);
-    um_initAttributeStruct(&a, "LINEADMINADDR", seven, 7, 0, 0);
-    EXPECT_EQ(um_getAttributes(line, 1, &a), UM_ERR_BUFFER_TOO_SMALL);
-    EXPECT_EQ(seven[0], 0x77);
+    EXPECT_EQ(std::string(buf, 10), std::string("VX7/T1-2\0#", 10));
 }
 
 TEST_F(DeviceMap, UnknownHandlesAndBadArguments) {
