@@ -493,9 +493,6 @@ class Publisher : public DefaultFarm {
 
     isa::RefPtr<Observer> first{new RecordingObserver};
     isa::RefPtr<Observer> second{new RecordingObserver};
-    RecordingObserver& Recorder(isa::RefPtr<Observer>& o) {
-        return *static_cast<RecordingObserver*>(o.Get());
-    }
 };
 
 // The components and clusters the publisher holds, named in one line.
@@ -588,7 +585,7 @@ TEST_F(Publisher, CallStateEventsCarryTheChannel) {
     caller.SetDestAddr("5551222");
     unsigned int callId = caller.MakeCall("5551219", "5551222");
     ASSERT_NE(callId, 0u);
-    EXPECT_THAT(Recorder(first).WaitFor("Call State timestamp="),
+    EXPECT_THAT(static_cast<RecordingObserver*>(first.Get())->WaitFor("Call State timestamp="),
                 HasSubstr(" board=1 trunk=1 channel=8 state="));
     caller.DropCall(callId);
     caller.ReleaseCall(callId);
