@@ -266,39 +266,36 @@ TEST_F(DefaultFarm, SilentBoardGivesThePhoneItsFailureValueAndThePhoneStaysUsabl
 // Each operation whose request the board refuses gives its own failure value and prints the
 // refusal; a refused call puts its banner before the exception.
 TEST_F(DefaultFarm, RefusedPhoneOperationsGiveTheirFailureValues) {
-    const char* unexpected = "Addressable::UnexpectedMsg";
     const struct {
         unsigned int type;
         std::function<int(Phone&)> op;
         int failure;
-        const char* said;
+        const char* said = "Addressable::UnexpectedMsg";
     } rows[] = {
         {0x1214, [](Phone& p) { return int(p.MakeCall("5551217", "5551218")); }, 0,
          "MAKECALL FAILED\n===============\nAddressable::UnexpectedMsg"},
-        {0x120D, [](Phone& p) { return int(p.GetCallState(3)); }, 0, unexpected},
-        {0x120F, [](Phone& p) { return int(p.GetChanState()); }, 0, unexpected},
-        {0x121F, [](Phone& p) { return p.SetChanState(4); }, -1, unexpected},
-        {0x1201, [](Phone& p) { return p.AnswerCall(3); }, 0, unexpected},
-        {0x1201, [](Phone& p) { return p.AnswerCall(3, 2); }, 0, unexpected},
-        {0x1200, [](Phone& p) { return p.AcceptCall(3); }, 0, unexpected},
-        {0x1246, [](Phone& p) { return p.Reset(0x100); }, 0, unexpected},
-        {0x120A, [](Phone& p) { return p.DropCall(3); }, 1, unexpected},
-        {0x121C, [](Phone& p) { return p.ReleaseCall(3); }, 1, unexpected},
-        {0x121D, [](Phone& p) { return p.RejectCall(3, 2); }, 1, unexpected},
-        {0x1224, [](Phone& p) { return p.DialDigits("123", 3); }, 1, unexpected},
-        {0x1211, [](Phone& p) { return p.HoldCall(3); }, 1, unexpected},
-        {0x121E, [](Phone& p) { return p.RetrieveCall(3); }, 1, unexpected},
-        {0x1202, [](Phone& p) { return p.BlindTransfer(3, "5551300", "5551212", 0); }, 1,
-         unexpected},
-        {0x1212, [](Phone& p) { return int(p.InitTransfer(3, "5551300", "5551212", 0)); }, 0,
-         unexpected},
-        {0x1207, [](Phone& p) { return p.CompleteTransfer(3, 4); }, 1, unexpected},
-        {0x1203, [](Phone& p) { return p.CancelTransfer(3); }, 1, unexpected},
+        {0x120D, [](Phone& p) { return int(p.GetCallState(3)); }, 0},
+        {0x120F, [](Phone& p) { return int(p.GetChanState()); }, 0},
+        {0x121F, [](Phone& p) { return p.SetChanState(4); }, -1},
+        {0x1201, [](Phone& p) { return p.AnswerCall(3); }, 0},
+        {0x1201, [](Phone& p) { return p.AnswerCall(3, 2); }, 0},
+        {0x1200, [](Phone& p) { return p.AcceptCall(3); }, 0},
+        {0x1246, [](Phone& p) { return p.Reset(0x100); }, 0},
+        {0x120A, [](Phone& p) { return p.DropCall(3); }, 1},
+        {0x121C, [](Phone& p) { return p.ReleaseCall(3); }, 1},
+        {0x121D, [](Phone& p) { return p.RejectCall(3, 2); }, 1},
+        {0x1224, [](Phone& p) { return p.DialDigits("123", 3); }, 1},
+        {0x1211, [](Phone& p) { return p.HoldCall(3); }, 1},
+        {0x121E, [](Phone& p) { return p.RetrieveCall(3); }, 1},
+        {0x1202, [](Phone& p) { return p.BlindTransfer(3, "5551300", "5551212", 0); }, 1},
+        {0x1212, [](Phone& p) { return int(p.InitTransfer(3, "5551300", "5551212", 0)); }, 0},
+        {0x1207, [](Phone& p) { return p.CompleteTransfer(3, 4); }, 1},
+        {0x1203, [](Phone& p) { return p.CancelTransfer(3); }, 1},
         {0x1222,
          [](Phone& p) {
              return p.SendISDN(3, 5, std::vector<char>{1, 2, 3});
          },
-         1, unexpected},
+         1},
     };
     Phone phone(fixedBoard.get(), 2, 1);
     for (const auto& r : rows) {
