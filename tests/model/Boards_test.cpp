@@ -28,6 +28,7 @@ namespace {
 using testing::HasSubstr;
 using testing::Not;
 using testing::StartsWith;
+using testing::ThrowsMessage;
 using testsupport::LogCapture;
 using namespace vx7diag;
 
@@ -190,24 +191,16 @@ TEST_F(FlexibleFarm, VoiceChannelsAcrossTrunks) {
 
 // ---- phones ----
 
-std::string OutOfRangeText(BoardManager* manager, unsigned int trunk, unsigned int channel) {
-    try {
-        Phone phone(manager, trunk, channel);
-    } catch (const std::out_of_range& e) {
-        return e.what();
-    } catch (...) {
-    }
-    return "";
-}
-
 TEST_F(DefaultFarm, PhoneRangeChecksComeFirstTrunkBeforeChannel) {
     BoardManager* fixed = fixedBoard.get();
-    EXPECT_EQ(OutOfRangeText(fixed, 65, 1), "Phone::Phone() trunk is out of range");
-    EXPECT_EQ(OutOfRangeText(fixed, 1, 32), "Phone::Phaone() channel is out of range");
-    EXPECT_EQ(OutOfRangeText(fixed, 65, 32), "Phone::Phone() trunk is out of range");
-    EXPECT_EQ(OutOfRangeText(nullptr, 65, 1), "Phone::Phone() trunk is out of range");
-    // The limits themselves pass the check; the board then has no such channel.
-    EXPECT_EQ(OutOfRangeText(fixed, 64, 31), "");
+    const auto trunk = ThrowsMessage<std::out_of_range>("Phone::Phone() trunk is out of range");
+    EXPECT_THAT([&] { Phone(fixed, 65, 1); }, trunk);
+    EXPECT_THAT([&] { Phone(fixed, 1, 32); },
+                ThrowsMessage<std::out_of_range>("Phone::Phaone() channel is out of range"));
+    EXPECT_THAT([&] { Phone(fixed, 65, 32); }, trunk);
+    EXPECT_THAT([] { Phone(nullptr, 65, 1); }, trunk);
+    // The limits themselves pass the check (a BoardFailure is no std::out_of_range); the board
+    // then has no such channel.
     EXPECT_THROW(Phone(fixed, 64, 31), BoardFailure);
     EXPECT_THROW(Phone(flexibleBoard.get(), 1, 24), BoardFailure);
     BoardManager absent(9);
