@@ -170,6 +170,7 @@ struct Objects {
     Quick<LCON, 20> lcon{static_cast<const Instance&>(line)};
     Quick<CAS, 20> cas{static_cast<const Instance&>(signals)};
     Quick<Cluster, 20> cluster{kCluster, queue};
+    Quick<StdResource, 20> otherRes{kOther, queue};
     tolk::CompDesc_t host = queue->getHostDesc();
     tolk::CompDesc_t other = kOther;
     staticList<CompAttr_t> attrs = listOf({CompAttr_t(7, 9)});
@@ -184,7 +185,8 @@ struct Objects {
 };
 
 // Own: the resource's id. Host: its id too, and the body opens with the queue's host address.
-enum class Id { Fresh, Own, Host };
+// Other: the id of the resource whose events an operation with a target names.
+enum class Id { Fresh, Own, Host, Other };
 
 struct Row {
     const char* name;
@@ -227,6 +229,18 @@ const Row kRows[] = {
      0x18, words({2, 0x1230, 0x1230, 0x1231, 0x1230}), 0x19, false, Id::Host},
     {"CancelEvt", [](Objects& o) { o.res.CancelEvt(0x1200, nullptr); },
      0x1A, u32(0x1200), 0x1B, false, Id::Own},
+    // With a target: its address is where events go, and its id the transaction.
+    {"DetectEvt for a target", [](Objects& o) { o.res.DetectEvt(0x1201, 0x1200, &o.otherRes); },
+     0x16, concat({desc(kOther), words({0x1201, 0x1200})}), 0x17, false, Id::Other},
+    {"DetectxEvts for a target", [](Objects& o) { auto t = listOf({0x1260u}); o.res.DetectxEvts(t, 0, &o.otherRes); },
+     0x18, concat({desc(kOther), words({1, 0x1260, 0x1260})}), 0x19, false, Id::Other},
+    {"CancelEvt for a target", [](Objects& o) { o.res.CancelEvt(0x1200, &o.otherRes); },
+     0x1A, u32(0x1200), 0x1B, false, Id::Other},
+    {"CancelxEvts for a target", [](Objects& o) { auto t = listOf({0x1260u}); o.res.CancelxEvts(t, &o.otherRes); },
+     0x1C, words({1, 0x1260}), 0x1D, false, Id::Other},
+    {"CancelAllEvts for a target", [](Objects& o) { o.res.CancelAllEvts(&o.otherRes); }, 0x1E, {}, 0x1F, false, Id::Other},
+    {"DetectEvtSet for a target", [](Objects& o) { auto t = listOf({0x1260u}); o.tsc.DetectEvtSet(0x1230, t, 0, &o.otherRes); },
+     0x16, concat({desc(kOther), words({0x1230, 0x1230, 1, 0x1260})}), 0x17, false, Id::Other},
     {"Error", [](Objects& o) { o.res.Error(0x01, 9); }, 0x00, words({1, 9}), 0, false},
     {"ComTest", [](Objects& o) { o.res.ComTest(o.ret<StdResource::MsgComtestCmplt_t>()); }, 0x02, {}, 0x03, true},
     {"Ack", [](Objects& o) { o.res.Ack(); }, 0x01, {}, 0, false},
@@ -359,7 +373,7 @@ TEST(Operations, EachCallSendsItsGoldenBlockAndWaitsForItsCompletion) {
         if (r.id == Id::Fresh) {
             EXPECT_NE(sent[0].trans, o.res.getId());
         } else {
-            EXPECT_EQ(sent[0].trans, o.res.getId());
+            EXPECT_EQ(sent[0].trans, r.id == Id::Other ? o.otherRes.getId() : o.res.getId());
         }
     }
     // A completion that nobody waited for would surface as an unregistered message.
@@ -405,29 +419,6 @@ TEST(Operations, TextsAreSentAtTheirFieldsLengthAndStayTheCallers) {
     letters.resize(32);
     EXPECT_EQ(board.sent().back().body, letters);
     EXPECT_EQ(name.length(), 40u);
-}
-
-TEST(Operations, EventOperationsWithATargetCarryItsAddressAndId) {
-    FakeBoard board(answers());
-    Objects o;
-    Quick<StdResource, 20> other(kOther, o.queue);
-    auto types = listOf({0x1260u});
-    o.res.DetectEvt(0x1201, 0x1200, &other);
-    o.res.DetectxEvts(types, 0, &other);
-    o.res.CancelEvt(0x1200, &other);
-    o.res.CancelxEvts(types, &other);
-    o.res.CancelAllEvts(&other);
-    o.tsc.DetectEvtSet(0x1230, types, 0, &other);
-    auto s = board.sent();
-    ASSERT_EQ(s.size(), 6u);
-    EXPECT_EQ(s[0].body, concat({desc(kOther), words({0x1201, 0x1200})}));
-    EXPECT_EQ(s[1].body, concat({desc(kOther), words({1, 0x1260, 0x1260})}));
-    EXPECT_EQ(s[5].type, 0x16u);
-    EXPECT_EQ(s[5].body, concat({desc(kOther), words({0x1230, 0x1230, 1, 0x1260})}));
-    for (const Sent& m : s) {
-        EXPECT_EQ(m.trans, other.getId()) << std::hex << m.type;
-        EXPECT_EQ(m.tgt, kTarget);
-    }
 }
 
 // The one-way twins leave their completion to a null handler, which drops it without a word;
@@ -503,14 +494,10 @@ std::vector<Answer> refuseEverything(const Sent& s) {
 }
 
 struct Env {
-    explicit Env(FakeBoard& b) : board(b) {
-        attrs.realloc(1);
-        *attrs.element(0) = CompAttr_t(7, 9);
-    }
     FakeBoard& board;
     isa::RefPtr<tolk::MsgQueue> queue = newQueue();
     Quick<Addressable> owner{kTarget, queue};
-    tolk::staticList<CompAttr_t> attrs;
+    tolk::staticList<CompAttr_t> attrs = listOf({CompAttr_t(7, 9)});
 };
 
 struct Block {
@@ -679,7 +666,7 @@ TEST(Services, SendTheirBlocks) {
             return boardAnswer(s, desc(kOther));
         }));
         {
-            Env env(board);
+            Env env{board};
             c.run(env);
         }
         auto s = board.sent();

@@ -72,18 +72,14 @@ class Recorder : public Observer {
     std::vector<std::string>* log;
 };
 
-class SubjectTest : public ::testing::Test {
-  protected:
+// Detach answers how many observers the aspect keeps, -1 when it has none to detach from.
+TEST(SubjectTest, DetachCountsWhatIsLeftOfTheAspect) {
     std::vector<std::string> log;
     isa::RefPtr<Observer> first{new Recorder("first", &log)};
     isa::RefPtr<Observer> second{new Recorder("second", &log)};
     CallAspect callAspect;
     ChanAspect chanAspect;
     Subject subject;
-};
-
-// Detach answers how many observers the aspect keeps, -1 when it has none to detach from.
-TEST_F(SubjectTest, DetachCountsWhatIsLeftOfTheAspect) {
     EXPECT_EQ(subject.Detach(first, callAspect), -1);
     subject.Attach(first, &chanAspect);
     EXPECT_EQ(subject.Detach(first, callAspect), -1);

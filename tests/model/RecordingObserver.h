@@ -19,14 +19,14 @@ class RecordingObserver : public vx7diag::Observer {
         changed.notify_all();
     }
 
-    // The first text, from the given index on, that starts with `prefix`; empty after `ms`.
-    std::string WaitFor(const std::string& prefix, std::size_t from = 0, int ms = 3000) {
+    // The first text that starts with `prefix`; empty after three seconds.
+    std::string WaitFor(const std::string& prefix) {
         std::unique_lock<std::mutex> lock(mutex);
         std::string found;
-        changed.wait_for(lock, std::chrono::milliseconds(ms), [&] {
-            for (std::size_t i = from; i < texts.size(); ++i) {
-                if (texts[i].rfind(prefix, 0) == 0) {
-                    found = texts[i];
+        changed.wait_for(lock, std::chrono::seconds(3), [&] {
+            for (const std::string& text : texts) {
+                if (text.rfind(prefix, 0) == 0) {
+                    found = text;
                     return true;
                 }
             }

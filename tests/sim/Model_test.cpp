@@ -285,17 +285,12 @@ auto fields(const ControlCommand& c) {
 
 // A line the language takes, and the whole command it must give: a field left at its default
 // in the row must stay at its default.
-struct Good {
-    const char* line;
-    ControlCommand cmd;
-};
-
 TEST(Control, EachGoodLineGivesItsCommand) {
     using K = ControlKind;
     auto alarm = [](std::uint32_t id, bool on) {
         return ControlCommand{.kind = K::Alarm, .board = 1, .trunk = 1, .alarmId = id, .on = on};
     };
-    const Good rows[] = {
+    const std::pair<const char*, ControlCommand> rows[] = {
         {"call 1 2 23 5551212",
          {.kind = K::Call, .board = 1, .trunk = 2, .channel = 23, .from = "5551212"}},
         {"alarm 1 1 red on", alarm(0x1601, true)},
@@ -313,23 +308,18 @@ TEST(Control, EachGoodLineGivesItsCommand) {
         {"line 1 2 out 5", {.kind = K::Line, .board = 1, .trunk = 2, .reason = 5}},
         {"line 1 2 in", {.kind = K::Line, .board = 1, .trunk = 2, .on = true}},
     };
-    for (const Good& g : rows) {
-        SCOPED_TRACE(g.line);
-        ControlParse p = parseControl(g.line);
+    for (const auto& [line, cmd] : rows) {
+        SCOPED_TRACE(line);
+        ControlParse p = parseControl(line);
         ASSERT_TRUE(p.ok) << p.error;
-        EXPECT_TRUE(fields(p.cmd) == fields(g.cmd));
+        EXPECT_TRUE(fields(p.cmd) == fields(cmd));
     }
 }
 
 // A line the language refuses, with the reason it gives; blank and comment lines are no
 // command and no error either.
-struct Bad {
-    const char* line;
-    const char* error;
-};
-
 TEST(Control, EachBadLineIsRefusedWithItsReason) {
-    const Bad rows[] = {
+    const std::pair<const char*, const char*> rows[] = {
         {"", ""},
         {"   ", ""},
         {"# a note", ""},
@@ -351,11 +341,11 @@ TEST(Control, EachBadLineIsRefusedWithItsReason) {
         {"delay 600001", "MS must be a number from 0 to 600000, not \"600001\""},
         {"stats now", "stats takes 0 arguments, got 1"},
     };
-    for (const Bad& b : rows) {
-        SCOPED_TRACE(b.line);
-        ControlParse p = parseControl(b.line);
+    for (const auto& [line, error] : rows) {
+        SCOPED_TRACE(line);
+        ControlParse p = parseControl(line);
         EXPECT_FALSE(p.ok);
-        EXPECT_EQ(p.error, b.error);
+        EXPECT_EQ(p.error, error);
     }
 }
 
