@@ -188,25 +188,6 @@ class Proxy : public Addressable {
     }
 };
 
-TEST(AddressableRequest, FillsTheCompletionBodyFromTheReply) {
-    FakeBoard board([](const Sent& s) {
-        // Echo the command's attribute with the key incremented.
-        Bytes b = s.body;
-        b[3] += 1;
-        return std::vector<Answer>{{s.type + 1, b}};
-    });
-    isa::RefPtr<MsgQueue> q = newQueue();
-    Proxy p(q, 5000, 1000);
-    CompAttr_t cmd(0x41, -7);
-    CompAttr_t ret;
-    p.request(0x08, &cmd, 0x09, &ret);
-    EXPECT_EQ(ret.key, 0x42u);
-    EXPECT_EQ(ret.value, -7);
-    // A null completion body drops the reply and returns normally.
-    p.request(0x08, &cmd, 0x09, nullptr);
-    EXPECT_EQ(board.sent().size(), 2u);
-}
-
 TEST(AddressableRequest, RefusalBecomesUnexpectedMsgWithItsBodyAttached) {
     FakeBoard board(always({{0, {0, 0, 0, 8, 0, 0, 0, 3}}}));
     isa::RefPtr<MsgQueue> q = newQueue();
@@ -299,17 +280,14 @@ TEST(AddressableConstruction, EmptyQueueMakesAPrivateOneAndCopiesShareIt) {
     EXPECT_EQ(text(a), expect.str());
 }
 
-TEST(AddressableLookup, BaseRaisesUndefinedBodies) {
-    isa::RefPtr<MsgQueue> q = newQueue();
-    Addressable a(kBoard, q);
-    auto msg = raised<Addressable::UndefinedMsgBody>([&] { delete a.MsgBodyLookup(0x2B); });
-    ASSERT_TRUE(msg);
-    EXPECT_EQ(msg->type, 0x2Bu);
-    EXPECT_EQ(text(*msg), "tolk::Addressable::UndefinedMsgBody");
-    auto evt = raised<Addressable::UndefinedEvtBody>([&] { delete a.superEvtBodyLookup(0x1230); });
-    ASSERT_TRUE(evt);
-    EXPECT_EQ(evt->group, 0x1230u);
-    EXPECT_EQ(text(*evt), "tolk::Addressable::UndefinedEvtBody");
+// The catalogue's tables see the base lookups raise these; what they carry and print is theirs.
+TEST(AddressableLookup, UndefinedBodiesCarryTheirNumberAndPrintTheirClass) {
+    Addressable::UndefinedMsgBody msg(0x2B);
+    EXPECT_EQ(msg.type, 0x2Bu);
+    EXPECT_EQ(text(msg), "tolk::Addressable::UndefinedMsgBody");
+    Addressable::UndefinedEvtBody evt(0x1230);
+    EXPECT_EQ(evt.group, 0x1230u);
+    EXPECT_EQ(text(evt), "tolk::Addressable::UndefinedEvtBody");
 }
 
 // ---- the dispatcher ----
@@ -365,6 +343,23 @@ std::size_t seenCount() {
     return seen.size();
 }
 
+void clearSeen() {
+    std::lock_guard<std::mutex> g(seenLock);
+    seen.clear();
+}
+
+using Who = std::vector<std::string>;
+
+// Who got each message so far, in order.
+Who seenWho() {
+    std::lock_guard<std::mutex> g(seenLock);
+    Who who;
+    for (const Seen& s : seen) {
+        who.push_back(s.who);
+    }
+    return who;
+}
+
 void waitSeen(std::size_t n) {
     for (int i = 0; i < 400 && seenCount() < n; ++i) {
         std::this_thread::sleep_for(milliseconds(5));
@@ -411,10 +406,7 @@ class Holder : public EvtCallback::Callback {
 
 class Dispatcher : public ::testing::Test {
   protected:
-    Dispatcher() : queue(newQueue()), comp(kBoard, queue) {
-        std::lock_guard<std::mutex> g(seenLock);
-        seen.clear();
-    }
+    Dispatcher() : queue(newQueue()), comp(kBoard, queue) { clearSeen(); }
     void send(unsigned int type, Bytes body = {}) {
         FakeBoard::send(kBoard, queue->getHostDesc(), type, 1, body);
     }
@@ -441,24 +433,7 @@ TEST_F(Dispatcher, CallbacksRunInRegistrationOrderEachWithItsOwnMessage) {
                               static_cast<EvtCallback::MsgMethod>(&Holder::onMsg), 0);
     send(0x51, {1});
     waitSeen(3);
-    ASSERT_EQ(seenCount(), 3u);
-    EXPECT_EQ(seen[0].who, "A");
-    EXPECT_EQ(seen[1].who, "B");
-    EXPECT_EQ(seen[2].who, "member");
-}
-
-TEST_F(Dispatcher, NullEntryDropsTheMessageSilently) {
-    comp.asyncRegisterMsgType(0x1220, static_cast<EvtCallback::MsgFn>(nullptr), 0);
-    comp.asyncUnregisteredMsgType(unregistered, 0);
-    testing::internal::CaptureStderr();
-    send(0x1220);
-    send(0x53);
-    waitSeen(1);
-    std::this_thread::sleep_for(milliseconds(30));
-    EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
-    ASSERT_EQ(seenCount(), 1u);
-    EXPECT_EQ(seen[0].who, "unregistered");
-    EXPECT_EQ(seen[0].number, 0x53u);
+    EXPECT_EQ(seenWho(), (Who{"A", "B", "member"}));
 }
 
 TEST_F(Dispatcher, BodiesGoByTypeAndEventsByGroupWithFallBacks) {
@@ -469,13 +444,12 @@ TEST_F(Dispatcher, BodiesGoByTypeAndEventsByGroupWithFallBacks) {
     send(0x20, evt(0x1299, {5}));
     send(0x20, evt(0x1300));
     waitSeen(3);
-    ASSERT_EQ(seenCount(), 3u);
+    ASSERT_EQ(seenWho(), (Who{"body", "body", "unregistered"}));
     // A type without a body of its own is read as bytes.
     EXPECT_EQ(seen[0].number, 0x52u);
     EXPECT_EQ(seen[0].body, "default{ByteData {7 8 }}");
     EXPECT_EQ(seen[1].number, 0x20u);
     EXPECT_EQ(seen[1].body, "evt{EvtGroup 4761 Data {5}}");
-    EXPECT_EQ(seen[2].who, "unregistered");
 }
 
 TEST_F(Dispatcher, CancellingTheLastCallbackSendsTheTypeToTheUnregisteredHandler) {
@@ -487,9 +461,7 @@ TEST_F(Dispatcher, CancellingTheLastCallbackSendsTheTypeToTheUnregisteredHandler
     comp.asyncCancelMsgType(0x54, msgA, 3);
     send(0x54);
     waitSeen(2);
-    ASSERT_EQ(seenCount(), 2u);
-    EXPECT_EQ(seen[0].who, "A");
-    EXPECT_EQ(seen[1].who, "unregistered");
+    EXPECT_EQ(seenWho(), (Who{"A", "unregistered"}));
 }
 
 TEST_F(Dispatcher, CancelOfAnUnknownNumberRaisesAndLeavesTheLockFree) {
@@ -501,7 +473,7 @@ TEST_F(Dispatcher, CancelOfAnUnknownNumberRaisesAndLeavesTheLockFree) {
     comp.asyncRegisterMsgType(0x57, msgB, 0);
     send(0x57);
     waitSeen(1);
-    EXPECT_EQ(seenCount(), 1u);
+    EXPECT_EQ(seenWho(), Who{"B"});
 }
 
 TEST_F(Dispatcher, UnregisteredMessageOrEventBannerNamesTypeOrGroupAndObject) {
@@ -547,9 +519,8 @@ TEST_F(Dispatcher, ImpossibleCountInAnEventBodyIsReportedNotFatal) {
     EXPECT_EQ(err,
               "EvtCallback_Class(321) tolk internal error\n"
               "list::AllocationError(ReqSize: 4294967295)\n");
-    ASSERT_EQ(seenCount(), 2u);
+    ASSERT_EQ(seenWho(), (Who{"body", "A"}));
     EXPECT_EQ(seen[0].body, "counted{CountedEvt 1}");
-    EXPECT_EQ(seen[1].who, "A");
 }
 
 TEST_F(Dispatcher, MsgWaitReturnsTheMessageAndTimesOutWithoutOne) {
@@ -570,8 +541,7 @@ TEST_F(Dispatcher, MsgWaitReturnsTheMessageAndTimesOutWithoutOne) {
     comp.asyncUnregisteredMsgType(unregistered, 0);
     send(0x5C);
     waitSeen(1);
-    ASSERT_EQ(seenCount(), 1u);
-    EXPECT_EQ(seen[0].who, "unregistered");
+    EXPECT_EQ(seenWho(), Who{"unregistered"});
 }
 
 TEST_F(Dispatcher, EvtWaitFillsTheBody) {
@@ -590,7 +560,7 @@ TEST_F(Dispatcher, FailuresAreReportedOnceAndLaterMessagesStillArrive) {
         unsigned int type;
         void (*registerFailing)(Addressable&);
         std::string report;
-        std::vector<std::string> reached;
+        Who reached;
     } rows[] = {
         {0x5A,
          [](Addressable& a) {
@@ -619,10 +589,7 @@ TEST_F(Dispatcher, FailuresAreReportedOnceAndLaterMessagesStillArrive) {
     };
     for (const auto& c : rows) {
         SCOPED_TRACE(c.report);
-        {
-            std::lock_guard<std::mutex> g(seenLock);
-            seen.clear();
-        }
+        clearSeen();
         Component fresh(kBoard, queue);
         c.registerFailing(fresh);
         fresh.asyncRegisterMsgType(0x5B, msgB, 0);
@@ -631,12 +598,7 @@ TEST_F(Dispatcher, FailuresAreReportedOnceAndLaterMessagesStillArrive) {
         send(0x5B);
         waitSeen(c.reached.size());
         EXPECT_EQ(testing::internal::GetCapturedStderr(), c.report);
-        std::lock_guard<std::mutex> g(seenLock);
-        std::vector<std::string> who;
-        for (const Seen& s : seen) {
-            who.push_back(s.who);
-        }
-        EXPECT_EQ(who, c.reached);
+        EXPECT_EQ(seenWho(), c.reached);
     }
 }
 

@@ -8,25 +8,6 @@
 
 namespace {
 
-TEST(TKSMsgRef, HeaderAccessorsReachTheBlock) {
-    TKSMsgRef r(6u);
-    r.setMsgType(0x1214);
-    r.setTrans(0x123456);
-    r.setSrcAddr(compDesc(1, 2, 3, 4, 5));
-    r.setTgtAddr(compDesc(6, 7, 8, 9, 10));
-    TKMsg32Bit* b = r.getMsgRef();
-    EXPECT_EQ(6u, r.getSize());
-    EXPECT_EQ(0x1214u, b->type);
-    EXPECT_EQ(0x12345600u, b->transTag);
-    EXPECT_EQ(0x123456u, r.getTrans());
-    EXPECT_EQ(compDesc(1, 2, 3, 4, 5), r.getSrcAddr());
-    EXPECT_EQ(compDesc(6, 7, 8, 9, 10), r.getTgtAddr());
-    EXPECT_EQ(4, b->srcComponent);
-    EXPECT_EQ(10, b->tgtNode);
-    r.free();
-    EXPECT_EQ(nullptr, r.getMsgRef());
-}
-
 TEST(TKSMsgRef, CopiesShareTheBlockAndCloneCopiesSizePlus48Bytes) {
     TKSMsgRef a(5u);
     TKSMsgRef b = a;
