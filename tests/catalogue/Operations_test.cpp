@@ -440,11 +440,13 @@ void expectQuietTwin(unsigned int type, unsigned int cmplt, F call) {
     Quick<T> obj(static_cast<const Instance&>(found));
     g_unregistered = 0;
     obj.asyncUnregisteredMsgType(&countUnregistered, 0);
+    testing::internal::CaptureStderr();
     call(obj);
     for (int i = 0; i < 200 && g_unregistered.load() == 0; ++i) {
         std::this_thread::sleep_for(std::chrono::milliseconds(5));
     }
     std::this_thread::sleep_for(std::chrono::milliseconds(20));
+    EXPECT_EQ(testing::internal::GetCapturedStderr(), "") << std::hex << type;
     EXPECT_EQ(g_unregistered.load(), 1u) << std::hex << type;
 }
 
